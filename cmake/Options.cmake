@@ -1,0 +1,24 @@
+# vps_options: the compiler settings that every target of the project links to.
+add_library(vps_options INTERFACE)
+target_compile_options(vps_options INTERFACE
+    -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor -Wold-style-cast -Wcast-qual -Wformat=2
+    -Wimplicit-fallthrough -Werror -Werror=switch-enum
+    # The source file's name without directories stands in every log line.
+    -fmacro-prefix-map=${CMAKE_SOURCE_DIR}/=)
+if(VPS_SANITIZE)
+    target_compile_options(vps_options INTERFACE -fsanitize=${VPS_SANITIZE} -fno-omit-frame-pointer
+                                                 -fno-sanitize-recover=all)
+    target_link_options(vps_options INTERFACE -fsanitize=${VPS_SANITIZE})
+endif()
+
+# vps_add_test(NAME SOURCES ... LIBS ...): one GoogleTest program, each of its cases a CTest test.
+include(GoogleTest)
+function(vps_add_test name)
+    cmake_parse_arguments(ARG "" "TIMEOUT" "SOURCES;LIBS" ${ARGN})
+    add_executable(${name} ${ARG_SOURCES})
+    target_link_libraries(${name} PRIVATE vps_options ${ARG_LIBS} GTest::gmock GTest::gtest_main)
+    if(NOT ARG_TIMEOUT)
+        set(ARG_TIMEOUT 120)
+    endif()
+    gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 PROPERTIES TIMEOUT ${ARG_TIMEOUT})
+endfunction()

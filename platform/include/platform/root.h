@@ -1,0 +1,22 @@
+// root.h: the folder under which the whole device lives.
+// Every absolute path of the system passes through rootedPath(), so that a test, a demo or an unprivileged
+// user has a device of their own in any folder.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+namespace platform {
+
+// The value of VANTOR_PIM_SYNC_ROOT without trailing slashes; empty means the real root. Read at each call.
+// Threads: any, as long as nobody changes the environment.
+std::string rootFolder();
+
+// `absolute` ("/opt/usr/...") with the root put in front.
+std::string rootedPath(std::string_view absolute);
+
+// Makes the folder `absolute` under the root with all its parents. Folders that are there keep their mode.
+// Returns PLATFORM_ERROR_NONE, PLATFORM_ERROR_PERMISSION_DENIED, PLATFORM_ERROR_NO_SPACE or PLATFORM_ERROR_IO.
+[[nodiscard]] int makeFolder(std::string_view absolute, unsigned mode = 0755);
+
+}  // namespace platform

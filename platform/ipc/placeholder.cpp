@@ -1,0 +1,2 @@
+// Replaced by the first source of this folder.
+namespace platform {}

@@ -1,0 +1,240 @@
+#include "common/SyncDatabase.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <thread>
+#include <utility>
+
+#include "common/SyncLog.h"
+#include "platform/database.h"
+#include "platform/root.h"
+
+using sync_result::kFailed;
+using sync_result::kOk;
+
+namespace {
+
+constexpr mode_t kStoreMode = 0660;
+constexpr auto kFirstRetrySleep = std::chrono::microseconds(100'000);
+constexpr auto kRetrySleepLimit = std::chrono::microseconds(500'000);
+
+int createWithMode(const std::string& path) {
+    const int fd = open(path.c_str(), O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW, kStoreMode);
+    if (fd == -1) {
+        SYNC_ERR("open Failed");
+        return kFailed;
+    }
+    // The umask may have taken bits away that the other users of the group need.
+    if (fchmod(fd, kStoreMode) != 0) SYNC_ERR("fchmod(%s) failed, ignoring", path.c_str());
+    close(fd);
+    return kOk;
+}
+
+// Gives the kept statement back in a state that holds no lock and no borrowed text.
+class StatementUse {
+  public:
+    explicit StatementUse(sqlite3_stmt* statement) : mpStatement(statement) {}
+    ~StatementUse() {
+        sqlite3_reset(mpStatement);
+        sqlite3_clear_bindings(mpStatement);
+    }
+    StatementUse(const StatementUse&) = delete;
+    StatementUse& operator=(const StatementUse&) = delete;
+
+  private:
+    sqlite3_stmt* mpStatement;
+};
+
+}  // namespace
+
+int SyncDatabase::Param::bind(sqlite3_stmt* statement, int index) const {
+    if (!mIsText) return sqlite3_bind_int64(statement, index, mInteger);
+    // The caller's text outlives the step, so SQLite need not copy it.
+    return sqlite3_bind_text64(statement, index, mText.data() != nullptr ? mText.data() : "", mText.size(),
+                               SQLITE_STATIC, SQLITE_UTF8);
+}
+
+std::string SyncDatabase::Row::text(int column) const {
+    const void* data = sqlite3_column_blob(mpStatement, column);
+    if (data == nullptr) return {};
+    return {static_cast<const char*>(data), static_cast<size_t>(sqlite3_column_bytes(mpStatement, column))};
+}
+
+bool SyncDatabase::Row::isNull(int column) const {
+    return sqlite3_column_type(mpStatement, column) == SQLITE_NULL;
+}
+
+SyncDatabase::SyncDatabase(std::string path, std::span<const char* const> schema, const char* notOpenedText)
+    : mPath(std::move(path)), mSchema(schema), mNotOpenedText(notOpenedText) {}
+
+SyncDatabase::~SyncDatabase() {
+    mStatements.clear();
+    db_util_close(mpHandle);
+}
+
+int SyncDatabase::openDb() {
+    const std::lock_guard lock(mMutex);
+    const std::string path = platform::rootedPath(mPath);
+    const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (fd != -1) {
+        close(fd);
+    } else if (const int result = makeDb(); result != kOk) {
+        SYNC_ERR("makeDb fail");
+        return result;
+    }
+    if (mpHandle != nullptr) return kOk;
+    if (db_util_open(path.c_str(), &mpHandle, 0) != SQLITE_OK) {
+        SYNC_ERR("db_util_open fail");
+        return kFailed;
+    }
+    return kOk;
+}
+
+int SyncDatabase::makeDb() {
+    const std::string path = platform::rootedPath(mPath);
+    sqlite3* database = nullptr;
+    if (const int code = db_util_open(path.c_str(), &database, 0); code != SQLITE_OK) {
+        SYNC_ERR("db_util_open() Failed(%d)", code);
+        return kFailed;
+    }
+    for (const char* text : mSchema) {
+        char* message = nullptr;
+        if (sqlite3_exec(database, text, nullptr, nullptr, &message) != SQLITE_OK) {
+            SYNC_ERR("remake calendar DB file is Failed : %s", message != nullptr ? message : "");
+            sqlite3_free(message);
+        }
+    }
+    db_util_close(database);
+    if (const int result = createWithMode(path); result != kOk) return result;
+    return createWithMode(path + "-journal");
+}
+
+sqlite3_stmt* SyncDatabase::prepare(std::string_view sql) {
+    const std::string text(sql);
+    if (const auto known = mStatements.find(text); known != mStatements.end()) return known->second.get();
+    sqlite3_stmt* statement = nullptr;
+    if (sqlite3_prepare_v3(mpHandle, text.c_str(), -1, SQLITE_PREPARE_PERSISTENT, &statement, nullptr) != SQLITE_OK) {
+        return nullptr;
+    }
+    mStatements.emplace(text, SqliteStmt(statement));
+    return statement;
+}
+
+int SyncDatabase::step(std::string_view sql, Params params) {
+    const std::lock_guard lock(mMutex);
+    if (mpHandle == nullptr && openDb() != kOk) {
+        SYNC_ERR("Database is not opened");
+        return kNotOpened;
+    }
+    sqlite3_stmt* statement = prepare(sql);
+    if (statement == nullptr) return sqlite3_errcode(mpHandle);
+    const StatementUse use(statement);
+    int index = 0;
+    for (const Param& param : params) {
+        if (const int code = param.bind(statement, ++index); code != SQLITE_OK) return code;
+    }
+    return sqlite3_step(statement);
+}
+
+int SyncDatabase::execRetried(const char* sql) {
+    int code = step(sql, {});
+    for (auto sleep = kFirstRetrySleep; code != SQLITE_DONE && sleep < kRetrySleepLimit; sleep *= 2) {
+        std::this_thread::sleep_for(sleep);
+        code = step(sql, {});
+    }
+    if (code == SQLITE_DONE) return kOk;
+    SYNC_ERR("execDb() Failed(%d)", code);
+    return kFailed;
+}
+
+int SyncDatabase::begin_trans() {
+    mMutex.lock();
+    if (mTransactionDepth > 0) {
+        ++mTransactionDepth;
+        return kOk;
+    }
+    if (execRetried("BEGIN IMMEDIATE TRANSACTION") != kOk) {
+        mMutex.unlock();
+        return kFailed;
+    }
+    mTransactionDepth = 1;
+    return kOk;
+}
+
+int SyncDatabase::end_trans(bool success) {
+    // The thread that began holds the mutex once for each begin; this is its last word at this depth.
+    const std::unique_lock<std::recursive_mutex> lock(mMutex, std::adopt_lock);
+    if (--mTransactionDepth != 0) return kOk;
+    if (success) {
+        if (execRetried("COMMIT TRANSACTION") == kOk) return kOk;
+        (void)step("ROLLBACK TRANSACTION", {});
+        SYNC_ERR("rollback trans");
+        return kFailed;
+    }
+    (void)step("ROLLBACK TRANSACTION", {});
+    return kOk;
+}
+
+int SyncDatabase::write(std::string_view sql, Params params) {
+    const std::lock_guard lock(mMutex);
+    if (mpHandle == nullptr && openDb() != kOk) {
+        SYNC_ERR("Database is not opened");
+        return kFailed;
+    }
+    if (begin_trans() != kOk) {
+        SYNC_ERR("begin trans fail");
+        return kFailed;
+    }
+    const int code = step(sql, params);
+    const bool written = code == SQLITE_DONE || code == SQLITE_ROW;
+    if (!written) SYNC_ERR("execDb() failed: %s", sqlite3_errmsg(mpHandle));
+    const int ended = end_trans(written);
+    return written ? ended : kFailed;
+}
+
+int SyncDatabase::read(std::string_view sql, Params params, bool firstOnly,
+                       const std::function<void(const Row&)>& use) {
+    const std::lock_guard lock(mMutex);
+    if (mpHandle == nullptr) {
+        if (const int result = openDb(); result != kOk) {
+            SYNC_ERR("%s", mNotOpenedText);
+            return result;
+        }
+    }
+    sqlite3_stmt* statement = prepare(sql);
+    if (statement == nullptr) {
+        SYNC_ERR("sqlite3_prepare_v2(%s) failed(%s).", std::string(sql).c_str(), sqlite3_errmsg(mpHandle));
+        return kFailed;
+    }
+    const StatementUse reset(statement);
+    int index = 0;
+    for (const Param& param : params) {
+        if (param.bind(statement, ++index) != SQLITE_OK) return kFailed;
+    }
+    int code = sqlite3_step(statement);
+    bool found = false;
+    while (code == SQLITE_ROW) {
+        found = true;
+        use(Row(statement));
+        if (firstOnly) return kOk;
+        code = sqlite3_step(statement);
+    }
+    if (code != SQLITE_DONE) {
+        SYNC_ERR("sqlite3_step() failed(%d, %s).", code, sqlite3_errmsg(mpHandle));
+        return kFailed;
+    }
+    return found || !firstOnly ? kOk : kFailed;
+}
+
+int SyncDatabase::readRow(std::string_view sql, Params params, const std::function<void(const Row&)>& use) {
+    return read(sql, params, /*firstOnly=*/true, use);
+}
+
+int SyncDatabase::readAll(std::string_view sql, Params params, const std::function<void(const Row&)>& use) {
+    return read(sql, params, /*firstOnly=*/false, use);
+}
+
+int SyncDatabase::changes() const { return sqlite3_changes(mpHandle); }

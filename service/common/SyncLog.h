@@ -1,0 +1,29 @@
+// SyncLog.h: the daemon's one log format. SYNC_ERR is for failures and for every decision worth noting; the exact
+// text is a literal where it is logged, so that it can be found. SYNC_DBG is hidden unless debug is asked for.
+// Never a secret: no token, no key, no body of a token reply.
+#pragma once
+
+#include <cstdlib>
+
+#include "platform/log.h"
+
+inline constexpr const char* kSyncLogTag = "VANTOR_PIM_SYNC_SERVICE";
+
+#define SYNC_ERR(format, ...)                                                                              \
+    dlog_print(DLOG_ERROR, kSyncLogTag, "%s: %s(%d) > \033[31m* Critical * " format "\033[0m", __FILE_NAME__, \
+               __func__, __LINE__ __VA_OPT__(, ) __VA_ARGS__)
+
+#define SYNC_DBG(format, ...)                                                                    \
+    dlog_print(DLOG_DEBUG, kSyncLogTag, "%s: %s(%d) > " format, __FILE_NAME__, __func__, __LINE__ \
+               __VA_OPT__(, ) __VA_ARGS__)
+
+// A broken invariant: logs its text and aborts, in every build type.
+#define SYNC_ASSERT_TEXT(condition, text)         \
+    do {                                          \
+        if (!(condition)) {                       \
+            SYNC_ERR("Assertion %s", text);       \
+            std::abort();                         \
+        }                                         \
+    } while (false)
+
+#define SYNC_ASSERT(condition) SYNC_ASSERT_TEXT(condition, #condition)

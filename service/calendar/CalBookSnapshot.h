@@ -1,0 +1,65 @@
+// CalBookSnapshot: what one book holds before a comparison, read once: metadata rows and the state of the device's records.
+// Owner: one syncEventPage run.   Threads: one worker. Memory: ids, uris, etags and versions, never event bodies.
+#pragma once
+
+#include <map>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+#include <unordered_set>
+#include <utility>
+#include <vector>
+
+#include "calendar/CalMetaDataDBHelper.h"
+
+// The state of an event record on the device.
+struct CalRecordState {
+    int version = 0;        // of its last write (a series: also of its exceptions)
+    int syncedVersion = 0;  // of the sync's own last write, 0 when it never wrote it
+    int originalEventId = 0;
+    std::string uid;
+    std::string etag;  // as stored with the sync's own last write
+    std::string recurrenceId;
+
+    [[nodiscard]] bool isEnginesOwnWrite() const { return syncedVersion != 0 && syncedVersion == version; }
+};
+
+class CalBookSnapshot {
+  public:
+    // Reads the rows and records of `book`.
+    [[nodiscard]] int load(CalMetaDataDBHelper& metaData, const CalBookMetaData& book);
+
+    [[nodiscard]] const CalBookMetaData& book() const { return mBook; }
+
+    // The row of an ordinary event or series, or of an instance by its own uri; NULL when unknown.
+    [[nodiscard]] const CalEventMetaData* rowByUri(const std::string& uri) const;
+    [[nodiscard]] const CalEventMetaData* instanceRow(int seriesEventId, const std::string& recurrenceId) const;
+    // NULL when there is no such record on the device.
+    [[nodiscard]] const CalRecordState* record(int eventId) const;
+    // The id of a record that the sync once wrote for `uri` and that has no row, 0 when none.
+    [[nodiscard]] int orphan(const std::string& uri) const;
+    // All rows, in no order.
+    [[nodiscard]] std::vector<const CalEventMetaData*> rows() const;
+    // Rows that the server knows by a uri of their own: what a complete list may delete.
+    [[nodiscard]] std::vector<const CalEventMetaData*> knownToServer() const;
+
+    // Whether the device's record holds a change that has not been sent: a mark, or a version that nobody but a user wrote.
+    [[nodiscard]] bool hasLocalChange(const CalEventMetaData& row) const;
+
+    // Keeps the snapshot in step with what a page wrote.
+    void put(const CalEventMetaData& row);
+    void forget(const CalEventMetaData& row);
+    void putRecord(int eventId, const CalRecordState& state);
+
+  private:
+    using InstanceKey = std::pair<int, std::string>;
+
+    void index(size_t position);
+
+    CalBookMetaData mBook;
+    std::vector<CalEventMetaData> mRows;            // id 0: forgotten
+    std::unordered_map<std::string, size_t> mByUri;
+    std::map<InstanceKey, size_t> mInstances;
+    std::unordered_map<int, CalRecordState> mRecords;
+    std::unordered_map<std::string, int> mOrphans;
+};

@@ -1,0 +1,98 @@
+// CalDataManager: the bridge between the sync and the device's calendar service: writes the server's calendars and events
+// into it, keeps the sync metadata store in step with every write, and detects local changes by change version.
+// Owner: process-wide, made on first use, never destroyed.   Threads: sync workers and the main loop (change callback);
+// the stores' own locks serialise them. prepareSync() first runs on the main thread, at service construction.
+// Errors: 0 or -1, each failure logged; outputs untouched on failure.
+//
+// Order of every write: the calendar service first, in one transaction, then the metadata rows, in one transaction. A crash
+// in between leaves records without rows, which the next download recognises by server id and synced version.
+#pragma once
+
+#include <list>
+#include <memory>
+#include <mutex>
+#include <string>
+#include <vector>
+
+#include "calendar/CalBookSnapshot.h"
+#include "calendar/CalListInfo.h"
+#include "calendar/CalMetaDataDBHelper.h"
+#include "platform/calendar.h"
+
+class CalDataManager {
+  public:
+    static CalDataManager& getInstance();
+
+    CalDataManager() = default;
+    ~CalDataManager();
+    CalDataManager(const CalDataManager&) = delete;
+    CalDataManager& operator=(const CalDataManager&) = delete;
+
+    // Connects to the calendar service, makes the metadata store, registers the change callback. Later calls return at once.
+    [[nodiscard]] int prepareSync();
+
+    // --- calendars
+    [[nodiscard]] int insertCalendarbook(int accountId, const CalListInfo& entry);
+    // Writes name, colour and access role of known books in one batch, and their rows' etags.
+    [[nodiscard]] int updateCalendarbooks(int accountId, const CalList& entries);
+    // The book with its events, on the device and in the metadata store.
+    [[nodiscard]] int deleteCalendarbook(int accountId, const std::string& uri);
+    [[nodiscard]] int updateCalendarbookUri(int calendarId, const std::string& uri, const std::string& etag);
+    [[nodiscard]] int getCalendarbookUri(int calendarId, std::string* uri);
+    [[nodiscard]] int getCalendarbookId(int accountId, const std::string& uri, int* calendarId);
+    [[nodiscard]] int getCalendarbookEtag(int accountId, const std::string& uri, std::string* etag);
+    [[nodiscard]] int getAllCalendarbookUri(int accountId, std::list<std::string>* uris);
+    [[nodiscard]] int getAllCalendarbookIds(int accountId, std::list<int>* calendarIds);
+    [[nodiscard]] int getAllDirtyCalendarbookIds(int accountId, std::list<int>* calendarIds);
+    [[nodiscard]] int getAllDeletedCalendarbookIds(int accountId, std::list<int>* calendarIds);
+    [[nodiscard]] int clearDirtyCalendarbook(int calendarId);
+    [[nodiscard]] int clearDeletedCalendarbook(int calendarId);
+    // Makes rows and books agree before a comparison: rows of books that were deleted on the device go, a book of the account
+    // without a row (a download that was cut off) gets its row again.
+    [[nodiscard]] int reconcileCalendarbooks(int accountId);
+    [[nodiscard]] int deleteAccount(int accountId);
+
+    // --- events. One item; the sync writes pages through CalEventWriter, which these use.
+    [[nodiscard]] int insertEvent(int accountId, const std::string& bookUri, const CalListInfoPtr& event);
+    [[nodiscard]] int updateEvent(int accountId, const std::string& bookUri, const CalListInfoPtr& event);
+    [[nodiscard]] int deleteEvent(int calendarId, const std::string& uri);
+    [[nodiscard]] int updateEventUri(int eventId, const std::string& uri, const std::string& etag);
+    [[nodiscard]] int getEventUri(int eventId, std::string* uri);
+    [[nodiscard]] int getEventId(int calendarId, const std::string& uri, int* eventId);
+    [[nodiscard]] int getEventEtag(int eventId, std::string* etag);
+    [[nodiscard]] int getEventEtag(int calendarId, const std::string& uri, std::string* etag);
+    [[nodiscard]] int getEvent(int eventId, CalendarRecord* record);
+    [[nodiscard]] int getAllDirtyEventIds(const std::string& bookUri, std::list<int>* eventIds);
+    [[nodiscard]] int getAllDeletedEventIds(const std::string& bookUri, std::list<int>* eventIds);
+    [[nodiscard]] int getAllEventUri(const std::string& bookUri, std::list<std::string>* uris);
+    [[nodiscard]] int clearDirtyEvent(int eventId);
+    [[nodiscard]] int clearDeletedEvent(int eventId);
+    [[nodiscard]] int hasExceptionEvent(int originalEventId);
+    [[nodiscard]] int getAllExceptionEvents(int originalEventId, std::list<std::string>* recurrenceIds);
+    [[nodiscard]] int getExceptionEventUri(int originalEventId, const std::string& recurrenceId, std::string* uri);
+    [[nodiscard]] int getExceptionEventEtag(int originalEventId, const std::string& recurrenceId, std::string* etag);
+    [[nodiscard]] int updateExceptionEventUri(int originalEventId, const std::string& recurrenceId,
+                                              const std::string& uri, const std::string& etag);
+
+    // --- local changes
+    // Whether the calendar service has a change of the book that the sync has not examined, its own writes left out.
+    [[nodiscard]] bool setChanged(int calendarId);
+    // Brings the dirty and deleted marks up to date.
+    [[nodiscard]] int setCalendarbookChanged(int calendarId);
+    [[nodiscard]] int setAccountChanged(int accountId);
+    // Marks that wait, or changes not examined yet.
+    [[nodiscard]] bool hasSomethingToSend(int accountId);
+    [[nodiscard]] int countPending(int accountId, int* dirty, int* deleted);
+    static void changedDBCallback(const char* view, void* userData);
+
+    // The store, prepared.
+    [[nodiscard]] CalMetaDataDBHelper* metaData() { return mpMetaData.get(); }
+
+  private:
+    std::mutex mPrepareMutex;
+    bool mConnected = false;                          // guarded by mPrepareMutex
+    std::unique_ptr<CalMetaDataDBHelper> mpMetaData;  // set once under mPrepareMutex, then constant
+};
+
+// Positions a list on the record whose id property is `id`; PLATFORM_ERROR_NOT_FOUND when there is none.
+[[nodiscard]] int findList(calendar_list_h list, unsigned idProperty, int id);

@@ -1,0 +1,46 @@
+// The request tasks of the calendar download: compose the path, send it, read the reply.
+// Owner: a director.   Threads: one worker.   Errors: SyncResult.h codes, each failure logged; the page is filled on success
+// only. A reply counts as failed when its HTTP status is not 2xx or its body carries an error.
+#pragma once
+
+#include <memory>
+#include <string>
+
+#include "calendar/CalCurl.h"
+#include "calendar/CalJsonParser.h"
+
+// What every task does: one request, one parsed reply.
+class CalRequestTask {
+  public:
+    CalRequestTask(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share);
+
+    // Why the last request failed, for people; empty after a success.
+    [[nodiscard]] const std::string& failure() const { return mFailure; }
+
+  protected:
+    using ListOperation = int (CalJsonParser::*)(CalListPage*) const;
+    [[nodiscard]] int fetch(const std::string& path, const char* unreadableText, ListOperation read, CalListPage* page);
+
+    CalCurl mCurl;
+    CalJsonParser mParser;
+
+  private:
+    std::string mFailure;
+};
+
+class CalDownSyncBookListTask : public CalRequestTask {
+  public:
+    using CalRequestTask::CalRequestTask;
+    [[nodiscard]] int getList(CalListPage* page);
+};
+
+class CalDownSyncEventListTask : public CalRequestTask {
+  public:
+    using CalRequestTask::CalRequestTask;
+    // Ids, etags and titles of all events in one reply.
+    [[nodiscard]] int getList(const std::string& calendarId, CalListPage* page);
+    // The same in pages of 50; an empty token asks for the first.
+    [[nodiscard]] int getListPage(const std::string& calendarId, const std::string& pageToken, CalListPage* page);
+    // Whole events in pages of 50.
+    [[nodiscard]] int getAllPage(const std::string& calendarId, const std::string& pageToken, CalListPage* page);
+};

@@ -4,7 +4,6 @@
 
 #include <map>
 #include <string>
-#include <string_view>
 #include <unordered_map>
 #include <unordered_set>
 #include <utility>
@@ -25,7 +24,7 @@ struct CalRecordState {
 };
 
 class CalBookSnapshot {
-  public:
+public:
     // Reads the rows and records of `book`.
     [[nodiscard]] int load(CalMetaDataDBHelper& metaData, const CalBookMetaData& book);
 
@@ -33,33 +32,37 @@ class CalBookSnapshot {
 
     // The row of an ordinary event or series, or of an instance by its own uri; NULL when unknown.
     [[nodiscard]] const CalEventMetaData* rowByUri(const std::string& uri) const;
-    [[nodiscard]] const CalEventMetaData* instanceRow(int seriesEventId, const std::string& recurrenceId) const;
+    [[nodiscard]] const CalEventMetaData* instanceRow(int seriesEventId,
+                                                      const std::string& recurrenceId) const;
     // NULL when there is no such record on the device.
     [[nodiscard]] const CalRecordState* record(int eventId) const;
     // The id of a record that the sync once wrote for `uri` and that has no row, 0 when none.
     [[nodiscard]] int orphan(const std::string& uri) const;
-    // All rows, in no order.
-    [[nodiscard]] std::vector<const CalEventMetaData*> rows() const;
     // Rows that the server knows by a uri of their own: what a complete list may delete.
     [[nodiscard]] std::vector<const CalEventMetaData*> knownToServer() const;
 
+    // Whether the row's record is gone although nobody deleted it: the next download makes it again.
+    [[nodiscard]] bool isLost(const CalEventMetaData& row) const;
     // Whether the device's record holds a change that has not been sent: a mark, or a version that nobody but a user wrote.
     [[nodiscard]] bool hasLocalChange(const CalEventMetaData& row) const;
 
     // Keeps the snapshot in step with what a page wrote.
     void put(const CalEventMetaData& row);
-    void forget(const CalEventMetaData& row);
-    void putRecord(int eventId, const CalRecordState& state);
+    void putRecord(int eventId, CalRecordState state);
+    // The row of a series takes the version that a write of one of its instances gave to it.
+    void setVersion(int seriesEventId, int version);
 
-  private:
+private:
     using InstanceKey = std::pair<int, std::string>;
 
     void index(size_t position);
 
     CalBookMetaData mBook;
-    std::vector<CalEventMetaData> mRows;            // id 0: forgotten
+    std::vector<CalEventMetaData> mRows;
     std::unordered_map<std::string, size_t> mByUri;
+    std::unordered_map<int, size_t> mByEventId;  // ordinary events
     std::map<InstanceKey, size_t> mInstances;
     std::unordered_map<int, CalRecordState> mRecords;
-    std::unordered_map<std::string, int> mOrphans;
+    std::unordered_map<std::string, int> mOrphans;  // by server id
+    std::unordered_set<int> mDeletedByUser;         // not examined yet
 };

@@ -10,21 +10,24 @@
 #include "common/SyncCurl.h"
 
 class CalCurl {
-  public:
+public:
     CalCurl(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share = nullptr);
 
     // `response` may be NULL for each; otherwise it is replaced by the reply's body.
     [[nodiscard]] int insert(const std::string& calendarId, const std::string& body, std::string* response);
-    [[nodiscard]] int update(const std::string& calendarId, const std::string& eventId, const std::string& body,
+    [[nodiscard]] int update(const std::string& calendarId, const std::string& eventId,
+                             const std::string& body, std::string* response);
+    [[nodiscard]] int remove(const std::string& calendarId, const std::string& eventId,
                              std::string* response);
-    [[nodiscard]] int remove(const std::string& calendarId, const std::string& eventId, std::string* response);
-    [[nodiscard]] int getEtagUri(const std::string& calendarId, const std::string& eventId, std::string* response);
+    [[nodiscard]] int getEtagUri(const std::string& calendarId, const std::string& eventId,
+                                 std::string* response);
 
     [[nodiscard]] int insertTodo(const std::string& listId, const std::string& body, std::string* response);
-    [[nodiscard]] int updateTodo(const std::string& listId, const std::string& taskId, const std::string& body,
-                                 std::string* response);
+    [[nodiscard]] int updateTodo(const std::string& listId, const std::string& taskId,
+                                 const std::string& body, std::string* response);
     [[nodiscard]] int removeTodo(const std::string& listId, const std::string& taskId, std::string* response);
-    [[nodiscard]] int getTodoEtagUri(const std::string& listId, const std::string& taskId, std::string* response);
+    [[nodiscard]] int getTodoEtagUri(const std::string& listId, const std::string& taskId,
+                                     std::string* response);
 
     // `path` is composed by the caller and appended to the server base. get() asks for a gzip reply.
     [[nodiscard]] int get(const std::string& path, std::string* response);
@@ -33,7 +36,7 @@ class CalCurl {
     // HTTP status of the last attempt, 0 when there was no reply.
     [[nodiscard]] long lastHttpStatus() const { return mHttpStatus; }
 
-  private:
+private:
     enum class Decision { kStop, kRetry };
 
     [[nodiscard]] int performCurl(const std::string& url, const char* method, const std::string* body,

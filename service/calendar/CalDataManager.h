@@ -20,7 +20,7 @@
 #include "platform/calendar.h"
 
 class CalDataManager {
-  public:
+public:
     static CalDataManager& getInstance();
 
     CalDataManager() = default;
@@ -69,8 +69,10 @@ class CalDataManager {
     [[nodiscard]] int clearDeletedEvent(int eventId);
     [[nodiscard]] int hasExceptionEvent(int originalEventId);
     [[nodiscard]] int getAllExceptionEvents(int originalEventId, std::list<std::string>* recurrenceIds);
-    [[nodiscard]] int getExceptionEventUri(int originalEventId, const std::string& recurrenceId, std::string* uri);
-    [[nodiscard]] int getExceptionEventEtag(int originalEventId, const std::string& recurrenceId, std::string* etag);
+    [[nodiscard]] int getExceptionEventUri(int originalEventId, const std::string& recurrenceId,
+                                           std::string* uri);
+    [[nodiscard]] int getExceptionEventEtag(int originalEventId, const std::string& recurrenceId,
+                                            std::string* etag);
     [[nodiscard]] int updateExceptionEventUri(int originalEventId, const std::string& recurrenceId,
                                               const std::string& uri, const std::string& etag);
 
@@ -88,7 +90,15 @@ class CalDataManager {
     // The store, prepared.
     [[nodiscard]] CalMetaDataDBHelper* metaData() { return mpMetaData.get(); }
 
-  private:
+private:
+    // The store, or NULL ("not prepare sync" logged).
+    CalMetaDataDBHelper* prepared();
+    template <class... Params, class... Args>
+    int forward(int (CalMetaDataDBHelper::*operation)(Params...), Args&&... args);
+    template <class Read, class Write>
+    int updateRow(Read read, Write write, const std::string& uri, const std::string& etag);
+    [[nodiscard]] bool anyBookChanged(int accountId);
+
     std::mutex mPrepareMutex;
     bool mConnected = false;                          // guarded by mPrepareMutex
     std::unique_ptr<CalMetaDataDBHelper> mpMetaData;  // set once under mPrepareMutex, then constant

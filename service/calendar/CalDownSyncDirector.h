@@ -9,7 +9,6 @@
 //   5. create new books and fill them
 #pragma once
 
-#include <atomic>
 #include <memory>
 #include <string>
 #include <vector>
@@ -19,11 +18,10 @@
 #include "common/SyncDirector.h"
 
 class Account;
-class CalBookSnapshot;
-class CalDataManager;
+class CalEventWriter;
 
 class CalDownSyncDirector : public SyncDirector, private IProgressObserver {
-  public:
+public:
     // Neither pointer is owned. `stopQuery` may be NULL.
     CalDownSyncDirector(Account* account, IStopQuery* stopQuery);
     ~CalDownSyncDirector() override;
@@ -34,20 +32,31 @@ class CalDownSyncDirector : public SyncDirector, private IProgressObserver {
     // Calendars and events.
     [[nodiscard]] int syncCalendar();
 
-  private:
-    struct BookPlan;
+private:
+    // What is to be done with the account's books.
+    struct BookPlan {
+        CalListPage listed;
+        CalList known;  // on the device already
+        CalList changed;
+        CalList fresh;
+        std::vector<std::string> gone;
+    };
+    enum class EventPageMode { kComparing = 0, kFirstTime = 1 };
 
     int onProgress(double downloadTotal, double downloaded, double uploadTotal, double uploaded) override;
     [[nodiscard]] bool isStopped() const;
-    [[nodiscard]] int fail(int result, const std::string& text);
+    // Remembers why the run failed (the first reason) and gives `result` back.
+    int fail(int result, const std::string& text);
 
-    [[nodiscard]] int fetchCalendars(CalListPage* page);
-    [[nodiscard]] int planBooks(const CalListPage& listed, BookPlan* plan);
+    [[nodiscard]] int fetchCalendars(CalListPage* listed);
+    [[nodiscard]] int planBooks(BookPlan* plan);
     [[nodiscard]] int proveBookDeletions(BookPlan* plan);
-    [[nodiscard]] int syncEventPage(const std::string& calendarUri);
-    [[nodiscard]] int applyPages(const std::string& calendarUri, class CalEventWriter* writer);
-    [[nodiscard]] int deleteUnlisted(const std::string& calendarUri, class CalEventWriter* writer);
-    [[nodiscard]] int secondLook(const std::string& calendarUri, class CalEventWriter* writer);
+    [[nodiscard]] int deleteBooks(const BookPlan& plan);
+    [[nodiscard]] int insertBooks(const BookPlan& plan);
+    // Compares the events of each calendar; one that fails does not keep the others, unless the server is out of reach.
+    [[nodiscard]] int syncEvents(const CalList& calendars, EventPageMode mode);
+    [[nodiscard]] int syncEventPage(const std::string& calendarUri, EventPageMode mode);
+    [[nodiscard]] int secondLook(const std::string& calendarUri, CalEventWriter* writer);
 
     Account* const mpAccount;
     IStopQuery* const mpStopQuery;

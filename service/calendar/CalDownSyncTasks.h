@@ -11,36 +11,42 @@
 
 // What every task does: one request, one parsed reply.
 class CalRequestTask {
-  public:
+public:
     CalRequestTask(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share);
 
     // Why the last request failed, for people; empty after a success.
     [[nodiscard]] const std::string& failure() const { return mFailure; }
+    // Whether the last request had no answer at all.
+    [[nodiscard]] bool unreachable() const { return mCurl.lastHttpStatus() == 0; }
 
-  protected:
+protected:
     using ListOperation = int (CalJsonParser::*)(CalListPage*) const;
-    [[nodiscard]] int fetch(const std::string& path, const char* unreadableText, ListOperation read, CalListPage* page);
+    [[nodiscard]] int fetch(const std::string& path, const char* unreadableText, ListOperation read,
+                            CalListPage* page);
 
     CalCurl mCurl;
     CalJsonParser mParser;
 
-  private:
+private:
     std::string mFailure;
 };
 
 class CalDownSyncBookListTask : public CalRequestTask {
-  public:
+public:
     using CalRequestTask::CalRequestTask;
-    [[nodiscard]] int getList(CalListPage* page);
+    // One reply as a rule; a server that answers with a token all the same is asked for the rest.
+    [[nodiscard]] int getList(const std::string& pageToken, CalListPage* page);
 };
 
 class CalDownSyncEventListTask : public CalRequestTask {
-  public:
+public:
     using CalRequestTask::CalRequestTask;
     // Ids, etags and titles of all events in one reply.
     [[nodiscard]] int getList(const std::string& calendarId, CalListPage* page);
     // The same in pages of 50; an empty token asks for the first.
-    [[nodiscard]] int getListPage(const std::string& calendarId, const std::string& pageToken, CalListPage* page);
+    [[nodiscard]] int getListPage(const std::string& calendarId, const std::string& pageToken,
+                                  CalListPage* page);
     // Whole events in pages of 50.
-    [[nodiscard]] int getAllPage(const std::string& calendarId, const std::string& pageToken, CalListPage* page);
+    [[nodiscard]] int getAllPage(const std::string& calendarId, const std::string& pageToken,
+                                 CalListPage* page);
 };

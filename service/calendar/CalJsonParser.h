@@ -12,7 +12,7 @@
 #include "platform/calendar.h"
 
 class CalJsonParser {
-  public:
+public:
     // Parses a reply body. -1 when it is no JSON (logged "load fail") or nested too deeply.
     [[nodiscard]] int setString(std::string_view body);
 
@@ -33,7 +33,7 @@ class CalJsonParser {
     // -1 ("checkException fail" at the caller) when "originalStartTime" is there but cannot be read.
     [[nodiscard]] static int checkException(JsonObject* event, ExceptionInfo* out);
 
-  private:
+private:
     JsonNodePtr mpRoot;
 };
 

@@ -11,7 +11,7 @@
 #include "common/Handles.h"
 
 struct CalListInfo {
-    std::string id;    // the server's id: "uri" in the metadata stores
+    std::string id;  // the server's id: "uri" in the metadata stores
     std::string etag;
     std::string summary;          // events and calendars: summary; task lists and tasks: title
     std::string backgroundColor;  // calendars only
@@ -27,10 +27,10 @@ using CalList = std::vector<CalListInfoPtr>;
 
 // A page of a list.
 struct CalListPage {
-    CalList entries;                   // entries that can be compared: with id and etag
-    std::vector<std::string> idOnly;   // ids listed without an etag: left as they are, but listed
-    std::string nextPageToken;         // empty: the last page
-    size_t unreadable = 0;             // items without an id, or that are no objects: the list proves nothing
+    CalList entries;                  // entries that can be compared: with id and etag
+    std::vector<std::string> idOnly;  // ids listed without an etag: left as they are, but listed
+    std::string nextPageToken;        // empty: the last page
+    size_t unreadable = 0;            // items without an id, or that are no objects: the list proves nothing
 };
 
 // What checkException finds out about an event.

@@ -16,7 +16,7 @@
 #include "common/SyncDatabase.h"
 
 class CalMetaDataDBHelper {
-  public:
+public:
     CalMetaDataDBHelper();
 
     // --- events: reads
@@ -26,7 +26,7 @@ class CalMetaDataDBHelper {
     [[nodiscard]] int getEventEtag(int eventId, std::string* etag);
     [[nodiscard]] int getEventEtag(int calendarId, const std::string& uri, std::string* etag);
     [[nodiscard]] int getEventVersion(int eventId, int* version);
-    [[nodiscard]] int getEvent(int originalEventId, const std::string& recurrenceId, CalEventMetaData* row);
+    [[nodiscard]] int getEvent(const CalInstanceKey& instance, CalEventMetaData* row);
     [[nodiscard]] int getEvent(int eventId, CalEventMetaData* row);
     [[nodiscard]] int getEvent(int calendarId, const std::string& uri, CalEventMetaData* row);
     [[nodiscard]] int getAllExceptionEvents(int originalEventId, std::list<std::string>* recurrenceIds);
@@ -45,9 +45,6 @@ class CalMetaDataDBHelper {
     [[nodiscard]] int updateEventDirty(int eventId, int dirty);
     [[nodiscard]] int updateEventDeleted(int eventId, int deleted);
     [[nodiscard]] int deleteEvent(int calendarId, const std::string& uri);
-    // By row id: for instances, whose event_id and uri do not address one row alone.
-    [[nodiscard]] int updateRow(const CalEventMetaData& row);
-    [[nodiscard]] int deleteRow(int rowId);
 
     // --- calendars: reads
     [[nodiscard]] int getCalendarbookId(int accountId, const std::string& uri, int* calendarId);
@@ -66,6 +63,8 @@ class CalMetaDataDBHelper {
     // --- calendars: writes
     [[nodiscard]] int insertCalendarbook(const CalBookMetaData& row);
     [[nodiscard]] int updateCalendarbook(const CalBookMetaData& row);
+    // "UPDATE calendarbooksync_table SET uri=?, etag=? WHERE calendar_id=?"
+    [[nodiscard]] int updateCalendarbookUri(int calendarId, const std::string& uri, const std::string& etag);
     [[nodiscard]] int updateCalendarbookVersion(int calendarId, int version);
     [[nodiscard]] int updateCalendarbookDirty(int calendarId, int dirty);
     [[nodiscard]] int updateCalendarbookDeleted(int calendarId, int deleted);
@@ -75,6 +74,6 @@ class CalMetaDataDBHelper {
     // For SyncTransaction: one transaction over several writes.
     SyncDatabase& database() { return mDatabase; }
 
-  private:
+private:
     SyncDatabase mDatabase;
 };

@@ -9,14 +9,14 @@
 class Account;
 
 class CalUpSyncDirector : public SyncDirector {
-  public:
+public:
     // Neither pointer is owned. `stopQuery` may be NULL.
     CalUpSyncDirector(Account* account, IStopQuery* stopQuery);
 
     int run() override;
     [[nodiscard]] std::string lastFailure() const override { return mFailure; }
 
-  private:
+private:
     Account* const mpAccount;
     std::string mFailure;
 };

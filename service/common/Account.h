@@ -9,7 +9,7 @@
 #include "common/vantor_pim_sync.h"
 
 class Account {
-  public:
+public:
     explicit Account(const vantor_pim_sync_account_s& record);
     virtual ~Account();
 
@@ -41,7 +41,7 @@ class Account {
     // first whether the token is still the one that the server refused.
     std::mutex& refreshMutex() { return mRefreshMutex; }
 
-  private:
+private:
     struct Fields {
         int accountId = 0;
         std::string accessToken;

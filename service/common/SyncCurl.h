@@ -14,26 +14,26 @@ enum class HttpMethod { kGet = 0, kPost = 1, kPatch = 2, kDelete = 3 };
 
 // Asked during transfers whether to go on; non-zero aborts.
 class IProgressObserver {
-  public:
+public:
     virtual ~IProgressObserver() = default;
     virtual int onProgress(double downloadTotal, double downloaded, double uploadTotal, double uploaded) = 0;
 };
 
 // HttpShare: what the easy handles of one worker share (one kept connection per server).
 class HttpShare {
-  public:
+public:
     HttpShare();
     ~HttpShare();
     HttpShare(const HttpShare&) = delete;
     HttpShare& operator=(const HttpShare&) = delete;
     [[nodiscard]] void* handle() const { return mpShare; }  // a CURLSH
 
-  private:
+private:
     void* mpShare;
 };
 
 class SyncCurl {
-  public:
+public:
     // Neither pointer is owned; the observer may be NULL. `share` may be NULL: then nothing is shared.
     SyncCurl(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share = nullptr);
     virtual ~SyncCurl();
@@ -43,7 +43,8 @@ class SyncCurl {
     // One exchange. 0 for any HTTP status (in *httpCode), else -1, -2 (aborted) or -3 (time-out). `body` and `response`
     // may be NULL; the response is appended. Redirects are not followed.
     [[nodiscard]] int performCurl(const std::string& url, const HttpMethod& method, const char* body,
-                                  std::string* response, const std::vector<std::string>& headers, long* httpCode);
+                                  std::string* response, const std::vector<std::string>& headers,
+                                  long* httpCode);
 
     // With the account's bearer token and, but for GET, the JSON headers.
     [[nodiscard]] int sendRequest(const std::string& url, const HttpMethod& method, const char* body,
@@ -57,7 +58,7 @@ class SyncCurl {
     // The bearer token that the last sendRequest carried.
     [[nodiscard]] const std::string& lastToken() const { return mLastToken; }
 
-  private:
+private:
     friend int syncCurlProgress(void* self, double, double, double, double);
 
     Account* mpAccount;

@@ -35,7 +35,7 @@ int createWithMode(const std::string& path) {
 
 // Gives the kept statement back in a state that holds no lock and no borrowed text.
 class StatementUse {
-  public:
+public:
     explicit StatementUse(sqlite3_stmt* statement) : mpStatement(statement) {}
     ~StatementUse() {
         sqlite3_reset(mpStatement);
@@ -44,7 +44,7 @@ class StatementUse {
     StatementUse(const StatementUse&) = delete;
     StatementUse& operator=(const StatementUse&) = delete;
 
-  private:
+private:
     sqlite3_stmt* mpStatement;
 };
 
@@ -116,7 +116,8 @@ sqlite3_stmt* SyncDatabase::prepare(std::string_view sql) {
     const std::string text(sql);
     if (const auto known = mStatements.find(text); known != mStatements.end()) return known->second.get();
     sqlite3_stmt* statement = nullptr;
-    if (sqlite3_prepare_v3(mpHandle, text.c_str(), -1, SQLITE_PREPARE_PERSISTENT, &statement, nullptr) != SQLITE_OK) {
+    if (sqlite3_prepare_v3(mpHandle, text.c_str(), -1, SQLITE_PREPARE_PERSISTENT, &statement, nullptr) !=
+        SQLITE_OK) {
         return nullptr;
     }
     mStatements.emplace(text, SqliteStmt(statement));
@@ -237,4 +238,6 @@ int SyncDatabase::readAll(std::string_view sql, Params params, const std::functi
     return read(sql, params, /*firstOnly=*/false, use);
 }
 
-int SyncDatabase::changes() const { return sqlite3_changes(mpHandle); }
+int SyncDatabase::changes() const {
+    return sqlite3_changes(mpHandle);
+}

@@ -17,17 +17,18 @@
 #include "common/SyncResult.h"
 
 class SyncDatabase {
-  public:
+public:
     // A bound parameter.
     class Param {
-      public:
-        Param(int value) : mInteger(value), mIsText(false) {}                        // NOLINT(google-explicit-constructor)
-        Param(int64_t value) : mInteger(value), mIsText(false) {}                    // NOLINT(google-explicit-constructor)
-        Param(std::string_view value) : mText(value), mIsText(true) {}               // NOLINT(google-explicit-constructor)
-        Param(const std::string& value) : Param(std::string_view(value)) {}          // NOLINT(google-explicit-constructor)
+    public:
+        Param(int value) : mInteger(value), mIsText(false) {}           // NOLINT(google-explicit-constructor)
+        Param(int64_t value) : mInteger(value), mIsText(false) {}       // NOLINT(google-explicit-constructor)
+        Param(std::string_view value) : mText(value), mIsText(true) {}  // NOLINT(google-explicit-constructor)
+        Param(const std::string& value)
+            : Param(std::string_view(value)) {}  // NOLINT(google-explicit-constructor)
         int bind(sqlite3_stmt* statement, int index) const;
 
-      private:
+    private:
         int64_t mInteger = 0;
         std::string_view mText;
         bool mIsText;
@@ -36,13 +37,13 @@ class SyncDatabase {
 
     // The current row of a read; NULL text is empty.
     class Row {
-      public:
+    public:
         explicit Row(sqlite3_stmt* statement) : mpStatement(statement) {}
         [[nodiscard]] int integer(int column) const { return sqlite3_column_int(mpStatement, column); }
         [[nodiscard]] std::string text(int column) const;
         [[nodiscard]] bool isNull(int column) const;
 
-      private:
+    private:
         sqlite3_stmt* mpStatement;
     };
 
@@ -67,9 +68,11 @@ class SyncDatabase {
     [[nodiscard]] int write(std::string_view sql, Params params);
 
     // Reads the first row: 0 with `use` called, or -1 (no row: without a log).
-    [[nodiscard]] int readRow(std::string_view sql, Params params, const std::function<void(const Row&)>& use);
+    [[nodiscard]] int readRow(std::string_view sql, Params params,
+                              const std::function<void(const Row&)>& use);
     // Reads all rows; none is success.
-    [[nodiscard]] int readAll(std::string_view sql, Params params, const std::function<void(const Row&)>& use);
+    [[nodiscard]] int readAll(std::string_view sql, Params params,
+                              const std::function<void(const Row&)>& use);
 
     [[nodiscard]] int begin_trans();
     int end_trans(bool success);
@@ -79,7 +82,7 @@ class SyncDatabase {
     // The rows that the last successful write changed.
     [[nodiscard]] int changes() const;
 
-  private:
+private:
     [[nodiscard]] sqlite3_stmt* prepare(std::string_view sql);
     [[nodiscard]] int execRetried(const char* sql);
     [[nodiscard]] int read(std::string_view sql, Params params, bool firstOnly,
@@ -90,14 +93,14 @@ class SyncDatabase {
     const char* const mNotOpenedText;
 
     std::recursive_mutex mMutex;
-    sqlite3* mpHandle = nullptr;                              // guarded by mMutex, as all below
+    sqlite3* mpHandle = nullptr;  // guarded by mMutex, as all below
     int mTransactionDepth = 0;
     std::unordered_map<std::string, SqliteStmt> mStatements;  // by SQL text
 };
 
 // A transaction that is rolled back unless commit() was called; holds the store's mutex.
 class SyncTransaction {
-  public:
+public:
     explicit SyncTransaction(SyncDatabase& database)
         : mDatabase(database), mLock(database.mutex()), mBegun(database.begin_trans() == sync_result::kOk) {}
     ~SyncTransaction() {
@@ -111,7 +114,7 @@ class SyncTransaction {
         return mDatabase.end_trans(/*success=*/true);
     }
 
-  private:
+private:
     SyncDatabase& mDatabase;
     std::unique_lock<std::recursive_mutex> mLock;
     bool mBegun;

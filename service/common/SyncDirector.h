@@ -5,7 +5,7 @@
 #include <string>
 
 class SyncDirector {
-  public:
+public:
     virtual ~SyncDirector() = default;
     virtual int run() = 0;
     // Why the last run failed, for people, never a secret; empty after a run that ended well. Main thread, after the run.
@@ -14,7 +14,7 @@ class SyncDirector {
 
 // IStopQuery: answers whether the running request has been stopped. Any thread.
 class IStopQuery {
-  public:
+public:
     virtual ~IStopQuery() = default;
     [[nodiscard]] virtual bool isStopped() = 0;
 };

@@ -9,21 +9,26 @@
 
 inline constexpr const char* kSyncLogTag = "VANTOR_PIM_SYNC_SERVICE";
 
-#define SYNC_ERR(format, ...)                                                                              \
-    dlog_print(DLOG_ERROR, kSyncLogTag, "%s: %s(%d) > \033[31m* Critical * " format "\033[0m", __FILE_NAME__, \
-               __func__, __LINE__ __VA_OPT__(, ) __VA_ARGS__)
+#define SYNC_ERR(format, ...)                                                                  \
+    dlog_print(DLOG_ERROR, kSyncLogTag, "%s: %s(%d) > \033[31m* Critical * " format "\033[0m", \
+               __FILE_NAME__, __func__, __LINE__ __VA_OPT__(, ) __VA_ARGS__)
 
-#define SYNC_DBG(format, ...)                                                                    \
-    dlog_print(DLOG_DEBUG, kSyncLogTag, "%s: %s(%d) > " format, __FILE_NAME__, __func__, __LINE__ \
-               __VA_OPT__(, ) __VA_ARGS__)
+// What a run did, for people who read the log.
+#define SYNC_INFO(format, ...)                                                          \
+    dlog_print(DLOG_INFO, kSyncLogTag, "%s: %s(%d) > " format, __FILE_NAME__, __func__, \
+               __LINE__ __VA_OPT__(, ) __VA_ARGS__)
+
+#define SYNC_DBG(format, ...)                                                            \
+    dlog_print(DLOG_DEBUG, kSyncLogTag, "%s: %s(%d) > " format, __FILE_NAME__, __func__, \
+               __LINE__ __VA_OPT__(, ) __VA_ARGS__)
 
 // A broken invariant: logs its text and aborts, in every build type.
-#define SYNC_ASSERT_TEXT(condition, text)         \
-    do {                                          \
-        if (!(condition)) {                       \
-            SYNC_ERR("Assertion %s", text);       \
-            std::abort();                         \
-        }                                         \
+#define SYNC_ASSERT_TEXT(condition, text)   \
+    do {                                    \
+        if (!(condition)) {                 \
+            SYNC_ERR("Assertion %s", text); \
+            std::abort();                   \
+        }                                   \
     } while (false)
 
 #define SYNC_ASSERT(condition) SYNC_ASSERT_TEXT(condition, #condition)

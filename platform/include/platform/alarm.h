@@ -17,8 +17,8 @@ using alarm_enum_fn_t = int (*)(alarm_id_t id, void* user_param);
 
 // First expiry in `trigger_at_time` seconds (0 or more), then every `interval` seconds (0: once).
 // `alarm_type` must be 0; `destination` is unused, pass NULL.
-[[nodiscard]] int alarmmgr_add_alarm(int alarm_type, time_t trigger_at_time, time_t interval, const char* destination,
-                                     alarm_id_t* id);
+[[nodiscard]] int alarmmgr_add_alarm(int alarm_type, time_t trigger_at_time, time_t interval,
+                                     const char* destination, alarm_id_t* id);
 // PLATFORM_ERROR_NOT_FOUND when the application holds no such alarm.
 int alarmmgr_remove_alarm(alarm_id_t id);
 // Calls `fn` for each alarm that the application holds; alarms may be removed from inside it.

@@ -44,19 +44,19 @@ enum calendar_property_e : unsigned {
     CALENDAR_BOOK_VERSION,         // int, ro: version of its last write
     CALENDAR_BOOK_SYNCED_VERSION,  // int, ro: version of the sync engine's last write, 0 when none
 
-    CALENDAR_EVENT_ID = 0x0200,        // int, ro
-    CALENDAR_EVENT_BOOK_ID,            // int, must name a book of store type 1
-    CALENDAR_EVENT_UID,                // str: the server's id
-    CALENDAR_EVENT_SUMMARY,            // str
-    CALENDAR_EVENT_DESCRIPTION,        // str
-    CALENDAR_EVENT_LOCATION,           // str
-    CALENDAR_EVENT_STATUS,             // int: 1 none (default), 2 tentative, 4 confirmed, 8 cancelled
-    CALENDAR_EVENT_START,              // caltime
-    CALENDAR_EVENT_END,                // caltime
-    CALENDAR_EVENT_START_TZID,         // str
-    CALENDAR_EVENT_END_TZID,           // str
-    CALENDAR_EVENT_SENSITIVITY,        // int: 0 public, 1 private, 2 confidential (default: goes out as "default")
-    CALENDAR_EVENT_BUSY_STATUS,        // int: 0 free, 1 busy (default)
+    CALENDAR_EVENT_ID = 0x0200,  // int, ro
+    CALENDAR_EVENT_BOOK_ID,      // int, must name a book of store type 1
+    CALENDAR_EVENT_UID,          // str: the server's id
+    CALENDAR_EVENT_SUMMARY,      // str
+    CALENDAR_EVENT_DESCRIPTION,  // str
+    CALENDAR_EVENT_LOCATION,     // str
+    CALENDAR_EVENT_STATUS,       // int: 1 none (default), 2 tentative, 4 confirmed, 8 cancelled
+    CALENDAR_EVENT_START,        // caltime
+    CALENDAR_EVENT_END,          // caltime
+    CALENDAR_EVENT_START_TZID,   // str
+    CALENDAR_EVENT_END_TZID,     // str
+    CALENDAR_EVENT_SENSITIVITY,  // int: 0 public, 1 private, 2 confidential (default: goes out as "default")
+    CALENDAR_EVENT_BUSY_STATUS,  // int: 0 free, 1 busy (default)
     CALENDAR_EVENT_ORGANIZER_NAME,     // str
     CALENDAR_EVENT_ORGANIZER_EMAIL,    // str
     CALENDAR_EVENT_MEETING_STATUS,     // int: 0 none, 1 organised by the user, 2 by somebody else
@@ -76,12 +76,12 @@ enum calendar_property_e : unsigned {
     CALENDAR_EVENT_RECURRENCE_ID,      // str, exceptions only: "20140501" or "20140501T100000Z"
     CALENDAR_EVENT_ORIGINAL_EVENT_ID,  // int, exceptions only: the series
     CALENDAR_EVENT_SYNC_DATA1,         // str: for the sync engine ("declined" or "not_declined")
-    CALENDAR_EVENT_SYNC_DATA2,         // str: for the sync engine (the server's etag of the engine's last write)
-    CALENDAR_EVENT_VERSION,            // int, ro: version of the last write of the event or one of its children
-    CALENDAR_EVENT_SYNCED_VERSION,     // int, ro: version of the sync engine's last write, 0 when none
-    CALENDAR_EVENT_ATTENDEES,          // children of _calendar_attendee
-    CALENDAR_EVENT_ALARMS,             // children of _calendar_alarm
-    CALENDAR_EVENT_EXCEPTIONS,         // children of _calendar_event
+    CALENDAR_EVENT_SYNC_DATA2,      // str: for the sync engine (the server's etag of the engine's last write)
+    CALENDAR_EVENT_VERSION,         // int, ro: version of the last write of the event or one of its children
+    CALENDAR_EVENT_SYNCED_VERSION,  // int, ro: version of the sync engine's last write, 0 when none
+    CALENDAR_EVENT_ATTENDEES,       // children of _calendar_attendee
+    CALENDAR_EVENT_ALARMS,          // children of _calendar_alarm
+    CALENDAR_EVENT_EXCEPTIONS,      // children of _calendar_event
 
     CALENDAR_TODO_ID = 0x0300,     // int, ro
     CALENDAR_TODO_BOOK_ID,         // int, must name a book of store type 2
@@ -127,7 +127,8 @@ int calendar_record_destroy(calendar_record_h record, bool with_children);  // N
 [[nodiscard]] int calendar_record_get_int(calendar_record_h record, unsigned property, int* out);
 [[nodiscard]] int calendar_record_get_lli(calendar_record_h record, unsigned property, int64_t* out);
 [[nodiscard]] int calendar_record_get_str_p(calendar_record_h record, unsigned property, const char** out);
-[[nodiscard]] int calendar_record_get_caltime(calendar_record_h record, unsigned property, calendar_time_s* out);
+[[nodiscard]] int calendar_record_get_caltime(calendar_record_h record, unsigned property,
+                                              calendar_time_s* out);
 [[nodiscard]] int calendar_record_set_int(calendar_record_h record, unsigned property, int value);
 [[nodiscard]] int calendar_record_set_lli(calendar_record_h record, unsigned property, int64_t value);
 [[nodiscard]] int calendar_record_set_str(calendar_record_h record, unsigned property, const char* value);
@@ -162,7 +163,8 @@ int calendar_query_destroy(calendar_query_h query);
 [[nodiscard]] int calendar_query_add_filter_str(calendar_query_h query, unsigned property, const char* value);
 // Only these properties are read, the others keep their defaults; children are read only when their property
 // is named. Without a projection everything is read.
-[[nodiscard]] int calendar_query_set_projection(calendar_query_h query, const unsigned* properties, size_t count);
+[[nodiscard]] int calendar_query_set_projection(calendar_query_h query, const unsigned* properties,
+                                                size_t count);
 [[nodiscard]] int calendar_query_set_sort(calendar_query_h query, unsigned property, bool ascending);
 
 // --- database: reads ---------------------------------------------------------------------------------
@@ -188,12 +190,15 @@ int calendar_query_destroy(calendar_query_h query);
 // (its book is the series'); exceptions among a new series' children are inserted with it.
 [[nodiscard]] int calendar_db_insert_record(calendar_record_h record, int* id,
                                             const record_write_options_s& options = {});
-[[nodiscard]] int calendar_db_insert_records(calendar_list_h list, const record_write_options_s& options = {});
+[[nodiscard]] int calendar_db_insert_records(calendar_list_h list,
+                                             const record_write_options_s& options = {});
 // update: writes the record (found by its own id) as it stands. Attendees and alarms become those of the record.
 // Exceptions among the children: one without an id is inserted, the others are updated where they differ, and
 // those taken out of the record are deleted. A record read through a projection writes only what was read or set.
-[[nodiscard]] int calendar_db_update_record(calendar_record_h record, const record_write_options_s& options = {});
-[[nodiscard]] int calendar_db_update_records(calendar_list_h list, const record_write_options_s& options = {});
+[[nodiscard]] int calendar_db_update_record(calendar_record_h record,
+                                            const record_write_options_s& options = {});
+[[nodiscard]] int calendar_db_update_records(calendar_list_h list,
+                                             const record_write_options_s& options = {});
 // replace: makes the record `id` equal to `record` (defaults included); a series keeps its exceptions and its
 // exception dates, every record its id and its book.
 [[nodiscard]] int calendar_db_replace_record(calendar_record_h record, int id,
@@ -201,7 +206,8 @@ int calendar_query_destroy(calendar_query_h query);
 [[nodiscard]] int calendar_db_replace_records(calendar_list_h list, const int* ids, size_t count,
                                               const record_write_options_s& options = {});
 // delete: a series goes with its exceptions, a book with all its records. A single exception may be deleted too.
-[[nodiscard]] int calendar_db_delete_record(const char* view, int id, const record_write_options_s& options = {});
+[[nodiscard]] int calendar_db_delete_record(const char* view, int id,
+                                            const record_write_options_s& options = {});
 [[nodiscard]] int calendar_db_delete_records(const char* view, const int* ids, size_t count,
                                              const record_write_options_s& options = {});
 
@@ -214,7 +220,8 @@ int calendar_query_destroy(calendar_query_h query);
 // Called by the default main context after another process wrote records of `view` (an exception's write counts as
 // an event's). Several writes may be told once. Main thread only.
 using calendar_db_changed_cb = void (*)(const char* view, void* user_data);
-[[nodiscard]] int calendar_db_add_changed_cb(const char* view, calendar_db_changed_cb callback, void* user_data);
+[[nodiscard]] int calendar_db_add_changed_cb(const char* view, calendar_db_changed_cb callback,
+                                             void* user_data);
 int calendar_db_remove_changed_cb(const char* view, calendar_db_changed_cb callback, void* user_data);
 
 // --- RAII -----------------------------------------------------------------------------------------------------

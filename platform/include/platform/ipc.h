@@ -54,7 +54,7 @@ int pims_ipc_destroy(pims_ipc_h ipc);
 // Blocks until the reply, at most `timeout_ms`. *data_out is NULL for a reply without data; the caller
 // destroys it. PLATFORM_ERROR_NOT_FOUND: unknown module or command. After PLATFORM_ERROR_TIMED_OUT or
 // PLATFORM_ERROR_IO the handle is broken and every call fails.
-[[nodiscard]] int pims_ipc_call(pims_ipc_h ipc, const char* module, const char* command, pims_ipc_data_h data_in,
-                                pims_ipc_data_h* data_out, int timeout_ms);
+[[nodiscard]] int pims_ipc_call(pims_ipc_h ipc, const char* module, const char* command,
+                                pims_ipc_data_h data_in, pims_ipc_data_h* data_out, int timeout_ms);
 // The process id of the serving process.
 [[nodiscard]] int pims_ipc_get_server_pid(pims_ipc_h ipc, int* pid);

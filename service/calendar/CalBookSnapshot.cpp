@@ -1,0 +1,171 @@
+#include "calendar/CalBookSnapshot.h"
+
+#include <iterator>
+
+#include "calendar/CalRecordAccess.h"
+#include "common/SyncLog.h"
+
+using cal_record::intOf;
+using cal_record::textOf;
+using sync_result::kFailed;
+using sync_result::kOk;
+
+namespace {
+
+constexpr unsigned kStateProperties[] = {
+    CALENDAR_EVENT_ID,
+    CALENDAR_EVENT_VERSION,
+    CALENDAR_EVENT_SYNCED_VERSION,
+    CALENDAR_EVENT_ORIGINAL_EVENT_ID,
+    CALENDAR_EVENT_UID,
+    CALENDAR_EVENT_SYNC_DATA2,
+    CALENDAR_EVENT_RECURRENCE_ID,
+};
+
+int readRecordStates(int bookId, std::unordered_map<int, CalRecordState>* states) {
+    calendar_query_h rawQuery = nullptr;
+    if (calendar_query_create(_calendar_event, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
+    const CalendarQuery query(rawQuery);
+    calendar_list_h rawList = nullptr;
+    if (calendar_query_add_filter_int(query.get(), CALENDAR_EVENT_BOOK_ID, bookId) != PLATFORM_ERROR_NONE ||
+        calendar_query_set_projection(query.get(), kStateProperties, std::size(kStateProperties)) !=
+            PLATFORM_ERROR_NONE ||
+        calendar_db_get_records_with_query(query.get(), 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
+        SYNC_ERR("get_records_with_query fail");
+        return kFailed;
+    }
+    const CalendarList list(rawList);
+    cal_record::forEach(list.get(), [states](calendar_record_h record) {
+        CalRecordState state;
+        state.version = intOf(record, CALENDAR_EVENT_VERSION);
+        state.syncedVersion = intOf(record, CALENDAR_EVENT_SYNCED_VERSION);
+        state.originalEventId = intOf(record, CALENDAR_EVENT_ORIGINAL_EVENT_ID);
+        state.uid = textOf(record, CALENDAR_EVENT_UID);
+        state.etag = textOf(record, CALENDAR_EVENT_SYNC_DATA2);
+        state.recurrenceId = textOf(record, CALENDAR_EVENT_RECURRENCE_ID);
+        states->emplace(intOf(record, CALENDAR_EVENT_ID), std::move(state));
+    });
+    return kOk;
+}
+
+// Events that a user deleted since the book's changes were last examined.
+int readUnseenDeletions(const CalBookMetaData& book, std::unordered_set<int>* eventIds) {
+    calendar_list_h rawList = nullptr;
+    int current = 0;
+    if (calendar_db_get_changes_by_version(_calendar_event, book.calendar_id, book.sync_version, &rawList,
+                                           &current) != PLATFORM_ERROR_NONE) {
+        SYNC_ERR("db_get_changes_by_version fail");
+        return kFailed;
+    }
+    const CalendarList list(rawList);
+    cal_record::forEach(list.get(), [eventIds](calendar_record_h record) {
+        const bool deleted = intOf(record, CALENDAR_UPDATED_INFO_MODIFIED_STATUS) == RECORD_DELETED;
+        const bool own = intOf(record, CALENDAR_UPDATED_INFO_SYNCED_VERSION) ==
+                         intOf(record, CALENDAR_UPDATED_INFO_VERSION);
+        if (deleted && !own) eventIds->insert(intOf(record, CALENDAR_UPDATED_INFO_ID));
+    });
+    return kOk;
+}
+
+}  // namespace
+
+int CalBookSnapshot::load(CalMetaDataDBHelper& metaData, const CalBookMetaData& book) {
+    mBook = book;
+    // Rows before records: a record that appears in between is the user's own and has no row to be compared with.
+    if (metaData.getAllEvents(book.calendar_id, &mRows) != kOk) return kFailed;
+    if (readRecordStates(book.calendar_id, &mRecords) != kOk) return kFailed;
+
+    std::unordered_set<int> withRow;
+    bool someMissing = false;
+    for (size_t i = 0; i < mRows.size(); ++i) {
+        index(i);
+        withRow.insert(mRows[i].event_id);
+        someMissing = someMissing || (mRows[i].event_id > 0 && record(mRows[i].event_id) == nullptr);
+    }
+    for (const auto& [eventId, state] : mRecords) {
+        if (state.syncedVersion != 0 && !state.uid.empty() && !withRow.contains(eventId)) {
+            mOrphans.emplace(state.uid, eventId);
+        }
+    }
+    return someMissing ? readUnseenDeletions(book, &mDeletedByUser) : kOk;
+}
+
+void CalBookSnapshot::index(size_t position) {
+    const CalEventMetaData& row = mRows[position];
+    if (row.original_event_id != 0) {
+        mInstances.insert_or_assign({row.original_event_id, row.recurrence_id}, position);
+        // An instance found locally carries its series' uri until it was sent; the series owns that uri.
+        if (!row.uri.empty()) mByUri.emplace(row.uri, position);
+        return;
+    }
+    mByEventId.insert_or_assign(row.event_id, position);
+    if (!row.uri.empty()) mByUri.insert_or_assign(row.uri, position);
+}
+
+const CalEventMetaData* CalBookSnapshot::rowByUri(const std::string& uri) const {
+    const auto found = mByUri.find(uri);
+    return found == mByUri.end() ? nullptr : &mRows[found->second];
+}
+
+const CalEventMetaData* CalBookSnapshot::instanceRow(int seriesEventId,
+                                                     const std::string& recurrenceId) const {
+    const auto found = mInstances.find({seriesEventId, recurrenceId});
+    return found == mInstances.end() ? nullptr : &mRows[found->second];
+}
+
+const CalRecordState* CalBookSnapshot::record(int eventId) const {
+    const auto found = mRecords.find(eventId);
+    return found == mRecords.end() ? nullptr : &found->second;
+}
+
+int CalBookSnapshot::orphan(const std::string& uri) const {
+    const auto found = mOrphans.find(uri);
+    return found == mOrphans.end() ? 0 : found->second;
+}
+
+std::vector<const CalEventMetaData*> CalBookSnapshot::knownToServer() const {
+    std::vector<const CalEventMetaData*> rows;
+    rows.reserve(mByUri.size());
+    for (const auto& [uri, position] : mByUri) rows.push_back(&mRows[position]);
+    return rows;
+}
+
+bool CalBookSnapshot::isLost(const CalEventMetaData& row) const {
+    return row.event_id > 0 && row.deleted == 0 && record(row.event_id) == nullptr &&
+           !mDeletedByUser.contains(row.event_id);
+}
+
+bool CalBookSnapshot::hasLocalChange(const CalEventMetaData& row) const {
+    if (row.dirty != 0 || row.deleted != 0) return true;
+    if (row.event_id <= 0) return false;
+    const CalRecordState* state = record(row.event_id);
+    if (state == nullptr) return mDeletedByUser.contains(row.event_id);
+    return state->version != row.version && !state->isEnginesOwnWrite();
+}
+
+void CalBookSnapshot::put(const CalEventMetaData& row) {
+    const auto sameRow = [&row](const CalEventMetaData* known) {
+        return known != nullptr && known->uri == row.uri && known->original_event_id == row.original_event_id;
+    };
+    const CalEventMetaData* known = row.original_event_id != 0
+                                        ? instanceRow(row.original_event_id, row.recurrence_id)
+                                        : rowByUri(row.uri);
+    size_t position = mRows.size();
+    if (sameRow(known)) {
+        position = static_cast<size_t>(known - mRows.data());
+        mRows[position] = row;
+    } else {
+        mRows.push_back(row);
+    }
+    index(position);
+    mOrphans.erase(row.uri);
+}
+
+void CalBookSnapshot::setVersion(int seriesEventId, int version) {
+    if (const auto found = mByEventId.find(seriesEventId); found != mByEventId.end())
+        mRows[found->second].version = version;
+}
+
+void CalBookSnapshot::putRecord(int eventId, CalRecordState state) {
+    mRecords.insert_or_assign(eventId, std::move(state));
+}

@@ -34,21 +34,21 @@ typedef enum {
 } vantor_pim_sync_state_e;
 
 typedef struct {
-    int32_t account_id;     /* the account service's id */
-    char* access_token;     /* never stored */
-    char* refresh_token;    /* in the daemon it comes from the account's key file */
+    int32_t account_id;  /* the account service's id */
+    char* access_token;  /* never stored */
+    char* refresh_token; /* in the daemon it comes from the account's key file */
     char* email;
-    int32_t reserved;       /* carried, not stored, not read */
-    bool ssl;               /* a bare host below is reached over https */
-    bool calsync;           /* calendar sync on */
-    char* calserver;        /* URL or bare host */
-    int32_t calserverport;  /* appended when above 0 and the text has none */
-    bool ctsync;            /* contacts sync on */
+    int32_t reserved;      /* carried, not stored, not read */
+    bool ssl;              /* a bare host below is reached over https */
+    bool calsync;          /* calendar sync on */
+    char* calserver;       /* URL or bare host */
+    int32_t calserverport; /* appended when above 0 and the text has none */
+    bool ctsync;           /* contacts sync on */
     char* ctserver;
     int32_t ctserverport;
-    int32_t calperiod;      /* minutes between scheduled syncs; below 1: on request only */
+    int32_t calperiod; /* minutes between scheduled syncs; below 1: on request only */
     int32_t ctperiod;
-    int32_t roaming;        /* 0: no scheduled sync while roaming */
+    int32_t roaming; /* 0: no scheduled sync while roaming */
 } vantor_pim_sync_account_s;
 
 typedef void (*vantor_pim_sync_state_changed_cb)(vantor_pim_sync_type_e type, void* user_data);
@@ -70,7 +70,8 @@ VANTOR_PIM_SYNC_EXPORT int vantor_pim_sync_stop(int account_id, vantor_pim_sync_
 /* A NULL state is not an error. */
 VANTOR_PIM_SYNC_EXPORT int vantor_pim_sync_get_state(int account_id, vantor_pim_sync_type_e type, int* state);
 /* Seconds since 1970 of the last successful download, 0 when there was none. */
-VANTOR_PIM_SYNC_EXPORT int vantor_pim_sync_get_sync_time(int account_id, vantor_pim_sync_type_e type, int* time);
+VANTOR_PIM_SYNC_EXPORT int vantor_pim_sync_get_sync_time(int account_id, vantor_pim_sync_type_e type,
+                                                         int* time);
 
 /* The callback is called after every state change of any account for this kind. */
 VANTOR_PIM_SYNC_EXPORT int vantor_pim_sync_add_state_changed_cb(vantor_pim_sync_type_e type,

@@ -7,7 +7,7 @@
 #include <string>
 
 class TestRoot {
-  public:
+public:
     TestRoot() {
         std::string pattern = (std::filesystem::temp_directory_path() / "vps-XXXXXX").string();
         mPath = mkdtemp(pattern.data());
@@ -27,8 +27,10 @@ class TestRoot {
 
     [[nodiscard]] const std::filesystem::path& path() const { return mPath; }
     // A path of the system ("/opt/usr/...") inside this root.
-    [[nodiscard]] std::filesystem::path at(const std::string& absolute) const { return mPath / absolute.substr(1); }
+    [[nodiscard]] std::filesystem::path at(const std::string& absolute) const {
+        return mPath / absolute.substr(1);
+    }
 
-  private:
+private:
     std::filesystem::path mPath;
 };

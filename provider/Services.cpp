@@ -1,0 +1,14 @@
+#include "Services.h"
+
+namespace provider {
+
+std::vector<std::unique_ptr<Service>> makeServices(Context& context) {
+    std::vector<std::unique_ptr<Service>> services;
+    services.push_back(std::make_unique<TokenService>(context));
+    services.push_back(std::make_unique<CalendarService>(context));
+    services.push_back(std::make_unique<AdminDataService>(context));
+    services.push_back(std::make_unique<AdminControlService>(context));
+    return services;
+}
+
+}  // namespace provider

@@ -1,0 +1,73 @@
+// Services: the groups of routes of this provider. A further one is a file, a class here and a line in
+// makeServices.
+#pragma once
+
+#include <memory>
+#include <vector>
+
+#include "Context.h"
+#include "Router.h"
+
+namespace provider {
+
+// POST /o/oauth2/token: the refresh-token grant.
+class TokenService : public Service {
+public:
+    explicit TokenService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    Reply grant(const Call& call);
+    Context& mContext;
+};
+
+// /calendar/v3: calendar list and events.
+class CalendarService : public Service {
+public:
+    explicit CalendarService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    enum class Need { kRead, kWrite };
+    // The account's calendar that the call's first id names; the store is guarded by the caller.
+    Calendar& calendar(const Call& call, Need need);
+    Reply listCalendars(const Call& call);
+    Reply listEvents(const Call& call);
+    Reply getEvent(const Call& call);
+    Reply insertEvent(const Call& call);
+    Reply patchEvent(const Call& call);
+    Reply replaceEvent(const Call& call);
+    Reply deleteEvent(const Call& call);
+    Context& mContext;
+};
+
+// /admin: the content, for tests and people.
+class AdminDataService : public Service {
+public:
+    explicit AdminDataService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    void addAccountRoutes(Router& router);
+    void addCalendarRoutes(Router& router);
+    void addEventRoutes(Router& router);
+    [[nodiscard]] Json accountJson(const Account& account) const;
+    Reply putRaw(const Call& call, const std::string& eventId, const Json& body);
+    Reply seed(const Call& call);
+    Context& mContext;
+};
+
+// /admin: requests, tokens, faults and holds.
+class AdminControlService : public Service {
+public:
+    explicit AdminControlService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    Reply held(const Call& call);
+    Context& mContext;
+};
+
+std::vector<std::unique_ptr<Service>> makeServices(Context& context);
+
+}  // namespace provider

@@ -1,0 +1,279 @@
+#include "Store.h"
+
+#include <algorithm>
+#include <cctype>
+
+namespace provider {
+
+namespace {
+
+[[noreturn]] void invalid(const std::string& member) {
+    throw ApiError{400, "invalid", "Invalid value for: " + member, member};
+}
+
+std::string textOf(const Json& object, const char* name, const std::string& fallback) {
+    const auto found = object.find(name);
+    if (found == object.end()) return fallback;
+    if (!found->is_string()) invalid(name);
+    return found->get<std::string>();
+}
+
+void checkRole(const std::string& role) {
+    if (role != "owner" && role != "writer" && role != "reader") invalid("accessRole");
+}
+
+void checkColor(const std::string& color) {
+    const bool isHex =
+        color.size() == 7 && color[0] == '#' &&
+        std::all_of(color.begin() + 1, color.end(), [](unsigned char c) { return std::isxdigit(c); });
+    if (!isHex) invalid("backgroundColor");
+}
+
+struct CalendarMember {
+    const char* name;
+    std::string Calendar::*member;
+};
+constexpr CalendarMember kCalendarMembers[] = {{"summary", &Calendar::summary},
+                                               {"description", &Calendar::description},
+                                               {"timeZone", &Calendar::timeZone},
+                                               {"backgroundColor", &Calendar::backgroundColor}};
+
+void setMembers(Calendar& calendar, const Json& members) {
+    for (const CalendarMember& row : kCalendarMembers) {
+        calendar.*row.member = textOf(members, row.name, calendar.*row.member);
+    }
+}
+
+void checkMembers(const Json& members) {
+    for (const CalendarMember& row : kCalendarMembers) textOf(members, row.name, "");
+    checkColor(textOf(members, "backgroundColor", "#000000"));
+    if (!isTimeZone(textOf(members, "timeZone", "UTC"))) invalid("timeZone");
+    checkRole(textOf(members, "accessRole", "owner"));
+}
+
+const Json& listOf(const Json& object, const char* name) {
+    static const Json kNone = Json::array();
+    const auto found = object.find(name);
+    if (found == object.end()) return kNone;
+    if (!found->is_array()) invalid(name);
+    return *found;
+}
+
+}  // namespace
+
+const CalendarEntry* Account::find(const std::string& calendarId) const {
+    const auto found = std::find_if(calendars.begin(), calendars.end(), [&](const CalendarEntry& entry) {
+        return entry.calendarId == calendarId;
+    });
+    return found == calendars.end() ? nullptr : &*found;
+}
+
+Account& Store::addAccount(const std::string& email, const std::string& name) {
+    if (email.find('@') == std::string::npos || email.find('/') != std::string::npos) invalid("email");
+    if (mAccounts.count(email) != 0) throw ApiError{409, "duplicate", "The account exists.", "email"};
+    Account& account = mAccounts[email];
+    account.email = email;
+    account.name = name.empty() ? email.substr(0, email.find('@')) : name;
+    issueRefreshToken(account);
+    return account;
+}
+
+Account& Store::account(const std::string& email) {
+    const auto found = mAccounts.find(email);
+    if (found == mAccounts.end()) throw ApiError{404, "notFound", "No such account", "email"};
+    return found->second;
+}
+
+void Store::issueRefreshToken(Account& account) {
+    std::string name = account.email;
+    std::replace_if(
+        name.begin(), name.end(), [](unsigned char c) { return std::isalnum(c) == 0; }, '-');
+    account.refreshToken = "refresh-" + name + "-" + std::to_string(mRevisions.next());
+}
+
+void Store::removeAccount(const std::string& email) {
+    Account& removed = account(email);
+    while (!removed.calendars.empty()) removeCalendar(removed, removed.calendars.back().calendarId);
+    mAccounts.erase(email);
+}
+
+void Store::touch(Calendar& calendar) {
+    calendar.etag = etagOf(mRevisions.next());
+    calendar.updated = stampOf(mRevisions.last());
+    for (auto& [email, account] : mAccounts) {
+        for (CalendarEntry& entry : account.calendars) {
+            if (entry.calendarId == calendar.id) entry.etag = calendar.etag;
+        }
+    }
+}
+
+Calendar& Store::addCalendar(Account& account, const Json& members) {
+    checkMembers(members);
+    const std::string madeId = "cal" + std::to_string(mRevisions.last() + 1) + "@group.provider.example";
+    const std::string calendarId = textOf(members, "id", madeId);
+    if (calendarId.empty() || calendarId.find('/') != std::string::npos) invalid("id");
+    if (mCalendars.count(calendarId) != 0) throw ApiError{409, "duplicate", "The calendar exists.", "id"};
+    auto& calendar = mCalendars[calendarId] = std::make_unique<Calendar>(calendarId, mRevisions);
+    calendar->summary = calendarId;
+    setMembers(*calendar, members);
+    account.calendars.push_back({calendarId, textOf(members, "accessRole", "owner"), ""});
+    touch(*calendar);
+    return *calendar;
+}
+
+void Store::changeCalendar(Account& account, const std::string& calendarId, const Json& members) {
+    if (account.find(calendarId) == nullptr)
+        throw ApiError{404, "notFound", "No such calendar", "calendarId"};
+    checkMembers(members);
+    Calendar& changed = calendar(calendarId);
+    setMembers(changed, members);
+    touch(changed);
+    for (CalendarEntry& entry : account.calendars) {
+        if (entry.calendarId == calendarId)
+            entry.accessRole = textOf(members, "accessRole", entry.accessRole);
+    }
+}
+
+void Store::share(Account& account, const std::string& calendarId, const std::string& accessRole) {
+    checkRole(accessRole);
+    calendar(calendarId);
+    if (account.find(calendarId) != nullptr) {
+        throw ApiError{409, "duplicate", "The account has this calendar.", "id"};
+    }
+    account.calendars.push_back({calendarId, accessRole, etagOf(mRevisions.next())});
+}
+
+void Store::removeCalendar(Account& account, const std::string& calendarId) {
+    const auto isIt = [&](const CalendarEntry& entry) { return entry.calendarId == calendarId; };
+    if (std::erase_if(account.calendars, isIt) == 0) {
+        throw ApiError{404, "notFound", "No such calendar", "calendarId"};
+    }
+    const bool isUsed = std::any_of(mAccounts.begin(), mAccounts.end(), [&](const auto& item) {
+        return item.second.find(calendarId) != nullptr;
+    });
+    if (!isUsed) mCalendars.erase(calendarId);
+}
+
+Calendar& Store::calendar(const std::string& calendarId) {
+    const auto found = mCalendars.find(calendarId);
+    if (found == mCalendars.end()) throw ApiError{404, "notFound", "No such calendar", "calendarId"};
+    return *found->second;
+}
+
+Json Store::calendarEntry(const Account& account, const CalendarEntry& entry) const {
+    const Calendar& calendar = *mCalendars.at(entry.calendarId);
+    Json out = {{"kind", "calendar#calendarListEntry"}, {"etag", entry.etag}, {"id", calendar.id}};
+    out["summary"] = calendar.summary;
+    if (!calendar.description.empty()) out["description"] = calendar.description;
+    out["timeZone"] = calendar.timeZone;
+    out["backgroundColor"] = calendar.backgroundColor;
+    out["foregroundColor"] = "#000000";
+    out["selected"] = true;
+    out["accessRole"] = entry.accessRole;
+    out["defaultReminders"] = Json::array({{{"method", "popup"}, {"minutes", 10}}});
+    if (calendar.id == account.email) out["primary"] = true;
+    return out;
+}
+
+Json Store::dump() const {
+    Json out = {{"clientId", clientId}, {"clientSecret", clientSecret}, {"revision", mRevisions.last()}};
+    out["accounts"] = Json::array();
+    for (const auto& [email, account] : mAccounts) {
+        Json entries = Json::array();
+        for (const CalendarEntry& entry : account.calendars) {
+            entries.push_back(
+                {{"id", entry.calendarId}, {"accessRole", entry.accessRole}, {"etag", entry.etag}});
+        }
+        out["accounts"].push_back({{"email", email},
+                                   {"name", account.name},
+                                   {"refreshToken", account.refreshToken},
+                                   {"calendars", entries}});
+    }
+    out["calendars"] = Json::array();
+    for (const auto& [calendarId, calendar] : mCalendars) {
+        Json item = {{"id", calendarId}, {"etag", calendar->etag}, {"updated", calendar->updated}};
+        for (const CalendarMember& row : kCalendarMembers) item[row.name] = (*calendar).*row.member;
+        item["events"] = Json::array();
+        item["deleted"] = Json::array();
+        for (const auto& event : calendar->events()) {
+            if (event->isDeleted) {
+                item["deleted"].push_back(event->id);
+            } else {
+                item["events"].push_back({{"id", event->id}, {"event", event->text.json()}});
+            }
+        }
+        out["calendars"].push_back(std::move(item));
+    }
+    return out;
+}
+
+void Store::load(const Json& state) {
+    if (!state.is_object()) throw ApiError{400, "invalid", "A state is a JSON object", ""};
+    Store fresh;
+    fresh.clientId = textOf(state, "clientId", clientId);
+    fresh.clientSecret = textOf(state, "clientSecret", clientSecret);
+    const auto revision = state.find("revision");
+    if (revision != state.end()) {
+        if (!revision->is_number_unsigned()) invalid("revision");
+        fresh.mRevisions.restore(revision->get<std::uint64_t>());
+    }
+    // The calendars refer to the revisions of the store that they live in, so they are made here, not moved.
+    std::swap(mAccounts, fresh.mAccounts);
+    std::swap(mCalendars, fresh.mCalendars);
+    std::swap(mRevisions, fresh.mRevisions);
+    std::swap(clientId, fresh.clientId);
+    std::swap(clientSecret, fresh.clientSecret);
+    try {
+        for (const Json& calendar : listOf(state, "calendars")) loadCalendar(calendar);
+        for (const Json& account : listOf(state, "accounts")) loadAccount(account);
+    } catch (...) {
+        std::swap(mAccounts, fresh.mAccounts);
+        std::swap(mCalendars, fresh.mCalendars);
+        std::swap(mRevisions, fresh.mRevisions);
+        std::swap(clientId, fresh.clientId);
+        std::swap(clientSecret, fresh.clientSecret);
+        throw;
+    }
+}
+
+// Events stand as {"id","event"}, taken as they are, or as plain event bodies, checked and completed.
+void Store::loadCalendar(const Json& state) {
+    if (!state.is_object()) invalid("calendars");
+    const std::string calendarId = textOf(state, "id", "");
+    if (calendarId.empty() || mCalendars.count(calendarId) != 0) invalid("calendars.id");
+    checkMembers(state);
+    auto& calendar = mCalendars[calendarId] = std::make_unique<Calendar>(calendarId, mRevisions);
+    calendar->summary = calendarId;
+    setMembers(*calendar, state);
+    for (const Json& event : listOf(state, "events")) {
+        if (!event.is_object()) invalid("calendars.events");
+        const auto kept = event.find("event");
+        if (kept == event.end()) {
+            calendar->insert(event, {"", true});
+        } else if (!kept->is_object() || textOf(event, "id", "").empty()) {
+            invalid("calendars.events");
+        } else {
+            calendar->put(textOf(event, "id", ""), *kept);
+        }
+    }
+    for (const Json& deleted : listOf(state, "deleted")) {
+        if (!deleted.is_string()) invalid("calendars.deleted");
+        calendar->putDeleted(deleted.get<std::string>());
+    }
+    calendar->etag = textOf(state, "etag", etagOf(mRevisions.next()));
+    calendar->updated = textOf(state, "updated", stampOf(mRevisions.last()));
+}
+
+void Store::loadAccount(const Json& state) {
+    if (!state.is_object()) invalid("accounts");
+    Account& account = addAccount(textOf(state, "email", ""), textOf(state, "name", ""));
+    account.refreshToken = textOf(state, "refreshToken", account.refreshToken);
+    for (const Json& item : listOf(state, "calendars")) {
+        if (!item.is_object()) invalid("accounts.calendars");
+        const std::string calendarId = textOf(item, "id", "");
+        share(account, calendarId, textOf(item, "accessRole", "owner"));
+        account.calendars.back().etag = textOf(item, "etag", calendar(calendarId).etag);
+    }
+}
+
+}  // namespace provider

@@ -13,12 +13,13 @@ std::string dump(const Json& value) {
 }  // namespace
 
 EventText::EventText(const Json& event) {
-    mText = "{";
+    mText.push_back('{');
     for (const auto& [name, value] : event.items()) {
         if (mText.size() > 1) mText += ',';
         Member member{};
         member.name = static_cast<std::uint32_t>(mText.size());
-        mText += dump(name) + ":";
+        mText += dump(name);
+        mText.push_back(':');
         member.value = static_cast<std::uint32_t>(mText.size());
         mText += dump(value);
         member.end = static_cast<std::uint32_t>(mText.size());

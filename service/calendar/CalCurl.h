@@ -39,16 +39,15 @@ public:
 private:
     enum class Decision { kStop, kRetry };
 
-    [[nodiscard]] int performCurl(const std::string& url, const char* method, const std::string* body,
+    [[nodiscard]] int performCurl(const std::string& path, const char* method, const std::string* body,
                                   std::string* response);
-    [[nodiscard]] int performCurlCompress(const std::string& url, const char* method, const std::string* body,
-                                          std::string* response);
+    [[nodiscard]] int performCurlCompress(const std::string& path, const char* method,
+                                          const std::string* body, std::string* response);
     [[nodiscard]] Decision decideResponse(long httpStatus, const std::string& usedToken, int* result);
     [[nodiscard]] int getAccessToken(std::string* reply);
-    [[nodiscard]] int checked(const char* operation, int result) const;
+    [[nodiscard]] static int checked(const char* operation, int result);
 
     Account* mpAccount;
-    std::string mBase;
     std::unique_ptr<SyncCurl> mpTransport;
     long mHttpStatus = 0;
 };

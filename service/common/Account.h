@@ -60,6 +60,9 @@ private:
         int roaming = 0;
     };
 
+    template <class T>
+    [[nodiscard]] T get(T Fields::*field) const;
+
     mutable std::mutex mMutex;
     Fields mFields;  // guarded by mMutex
     std::mutex mRefreshMutex;

@@ -26,7 +26,7 @@ public:
     ~HttpShare();
     HttpShare(const HttpShare&) = delete;
     HttpShare& operator=(const HttpShare&) = delete;
-    [[nodiscard]] void* handle() const { return mpShare; }  // a CURLSH
+    [[nodiscard]] void* handle() const;  // a CURLSH
 
 private:
     void* mpShare;
@@ -59,7 +59,10 @@ public:
     [[nodiscard]] const std::string& lastToken() const { return mLastToken; }
 
 private:
-    friend int syncCurlProgress(void* self, double, double, double, double);
+    static int onProgress(void* self, double downloadTotal, double downloaded, double uploadTotal,
+                          double uploaded);
+    void setCommonOptions(void* handle, std::string* reply);
+    void setOwnOptions(void* handle);
 
     Account* mpAccount;
     IProgressObserver* mpProgressObserver;

@@ -69,12 +69,17 @@ const CalendarEntry* Account::find(const std::string& calendarId) const {
 }
 
 Account& Store::addAccount(const std::string& email, const std::string& name) {
+    Account& account = addBareAccount(email, name);
+    issueRefreshToken(account);
+    return account;
+}
+
+Account& Store::addBareAccount(const std::string& email, const std::string& name) {
     if (email.find('@') == std::string::npos || email.find('/') != std::string::npos) invalid("email");
     if (mAccounts.count(email) != 0) throw ApiError{409, "duplicate", "The account exists.", "email"};
     Account& account = mAccounts[email];
     account.email = email;
     account.name = name.empty() ? email.substr(0, email.find('@')) : name;
-    issueRefreshToken(account);
     return account;
 }
 
@@ -93,7 +98,10 @@ void Store::issueRefreshToken(Account& account) {
 
 void Store::removeAccount(const std::string& email) {
     Account& removed = account(email);
-    while (!removed.calendars.empty()) removeCalendar(removed, removed.calendars.back().calendarId);
+    while (!removed.calendars.empty()) {
+        const std::string calendarId = removed.calendars.back().calendarId;
+        removeCalendar(removed, calendarId);
+    }
     mAccounts.erase(email);
 }
 
@@ -135,12 +143,17 @@ void Store::changeCalendar(Account& account, const std::string& calendarId, cons
 }
 
 void Store::share(Account& account, const std::string& calendarId, const std::string& accessRole) {
+    addEntry(account, calendarId, accessRole).etag = etagOf(mRevisions.next());
+}
+
+CalendarEntry& Store::addEntry(Account& account, const std::string& calendarId,
+                               const std::string& accessRole) {
     checkRole(accessRole);
     calendar(calendarId);
     if (account.find(calendarId) != nullptr) {
         throw ApiError{409, "duplicate", "The account has this calendar.", "id"};
     }
-    account.calendars.push_back({calendarId, accessRole, etagOf(mRevisions.next())});
+    return account.calendars.emplace_back(CalendarEntry{calendarId, accessRole, ""});
 }
 
 void Store::removeCalendar(Account& account, const std::string& calendarId) {
@@ -260,19 +273,24 @@ void Store::loadCalendar(const Json& state) {
         if (!deleted.is_string()) invalid("calendars.deleted");
         calendar->putDeleted(deleted.get<std::string>());
     }
-    calendar->etag = textOf(state, "etag", etagOf(mRevisions.next()));
+    calendar->etag = textOf(state, "etag", "");
+    if (calendar->etag.empty()) calendar->etag = etagOf(mRevisions.next());
     calendar->updated = textOf(state, "updated", stampOf(mRevisions.last()));
 }
 
 void Store::loadAccount(const Json& state) {
     if (!state.is_object()) invalid("accounts");
-    Account& account = addAccount(textOf(state, "email", ""), textOf(state, "name", ""));
-    account.refreshToken = textOf(state, "refreshToken", account.refreshToken);
+    Account& account = addBareAccount(textOf(state, "email", ""), textOf(state, "name", ""));
+    if (state.contains("refreshToken")) {
+        account.refreshToken = textOf(state, "refreshToken", "");
+    } else {
+        issueRefreshToken(account);
+    }
     for (const Json& item : listOf(state, "calendars")) {
         if (!item.is_object()) invalid("accounts.calendars");
         const std::string calendarId = textOf(item, "id", "");
-        share(account, calendarId, textOf(item, "accessRole", "owner"));
-        account.calendars.back().etag = textOf(item, "etag", calendar(calendarId).etag);
+        CalendarEntry& entry = addEntry(account, calendarId, textOf(item, "accessRole", "owner"));
+        entry.etag = textOf(item, "etag", calendar(calendarId).etag);
     }
 }
 

@@ -57,6 +57,8 @@ public:
     std::string clientSecret = "local-demo-only";
 
 private:
+    Account& addBareAccount(const std::string& email, const std::string& name);  // no refresh token yet
+    CalendarEntry& addEntry(Account& account, const std::string& calendarId, const std::string& accessRole);
     void loadCalendar(const Json& state);
     void loadAccount(const Json& state);
     void touch(Calendar& calendar);

@@ -29,7 +29,8 @@ public:
     [[nodiscard]] void* handle() const;  // a CURLSH
 
 private:
-    void* mpShare;
+    struct State;
+    std::unique_ptr<State> mpState;
 };
 
 class SyncCurl {

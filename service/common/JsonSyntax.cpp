@@ -1,0 +1,132 @@
+#include "common/JsonSyntax.h"
+
+#include <glib.h>
+
+#include <algorithm>
+
+namespace json_syntax {
+
+namespace {
+
+class Checker {
+public:
+    explicit Checker(std::string_view text) : mRest(text) {}
+
+    bool document() {
+        skipSpace();
+        if (!value(0)) return false;
+        skipSpace();
+        return mRest.empty();
+    }
+
+private:
+    [[nodiscard]] char peek() const { return mRest.empty() ? '\0' : mRest.front(); }
+
+    bool take(char c) {
+        if (mRest.empty() || mRest.front() != c) return false;
+        mRest.remove_prefix(1);
+        return true;
+    }
+
+    bool takeWord(std::string_view word) {
+        if (!mRest.starts_with(word)) return false;
+        mRest.remove_prefix(word.size());
+        return true;
+    }
+
+    void skipSpace() {
+        const size_t length = mRest.find_first_not_of(" \t\n\r");
+        mRest.remove_prefix(length == std::string_view::npos ? mRest.size() : length);
+    }
+
+    bool value(int depth) {
+        if (depth > kMaxDepth) return false;
+        switch (peek()) {
+            case '{':
+                return container(depth, '{', '}');
+            case '[':
+                return container(depth, '[', ']');
+            case '"':
+                return string();
+            case 't':
+                return takeWord("true");
+            case 'f':
+                return takeWord("false");
+            case 'n':
+                return takeWord("null");
+            default:
+                return number();
+        }
+    }
+
+    bool container(int depth, char open, char close) {
+        take(open);
+        skipSpace();
+        if (take(close)) return true;
+        do {
+            skipSpace();
+            if (open == '{') {
+                if (!string()) return false;
+                skipSpace();
+                if (!take(':')) return false;
+                skipSpace();
+            }
+            if (!value(depth + 1)) return false;
+            skipSpace();
+        } while (take(','));
+        return take(close);
+    }
+
+    bool string() {
+        if (!take('"')) return false;
+        while (!mRest.empty()) {
+            const auto c = static_cast<unsigned char>(mRest.front());
+            mRest.remove_prefix(1);
+            if (c == '"') return true;
+            if (c < 0x20) return false;
+            if (c == '\\' && !escape()) return false;
+        }
+        return false;
+    }
+
+    bool escape() {
+        if (mRest.empty()) return false;
+        const char c = mRest.front();
+        mRest.remove_prefix(1);
+        if (c != 'u') return std::string_view("\"\\/bfnrt").find(c) != std::string_view::npos;
+        constexpr size_t kHexDigits = 4;
+        if (mRest.size() < kHexDigits) return false;
+        const std::string_view digits = mRest.substr(0, kHexDigits);
+        mRest.remove_prefix(kHexDigits);
+        return digits.find_first_not_of("0123456789abcdefABCDEF") == std::string_view::npos;
+    }
+
+    bool digits() {
+        const size_t length = std::min(mRest.find_first_not_of("0123456789"), mRest.size());
+        mRest.remove_prefix(length);
+        return length > 0;
+    }
+
+    bool number() {
+        take('-');
+        if (!take('0') && !digits()) return false;
+        if (take('.') && !digits()) return false;
+        if (take('e') || take('E')) {
+            if (!take('+')) take('-');
+            return digits();
+        }
+        return true;
+    }
+
+    std::string_view mRest;
+};
+
+}  // namespace
+
+bool isValid(std::string_view text) {
+    // A zero byte inside is no valid UTF-8 here either.
+    return g_utf8_validate(text.data(), static_cast<gssize>(text.size()), nullptr) != FALSE &&
+           Checker(text).document();
+}
+
+}  // namespace json_syntax

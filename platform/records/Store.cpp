@@ -1,0 +1,218 @@
+#include "Store.h"
+
+#include <sys/stat.h>
+
+#include <random>
+#include <unordered_map>
+
+#include "StoreWrite.h"
+#include "platform/error.h"
+#include "platform/log.h"
+#include "platform/root.h"
+
+namespace platform::records {
+
+namespace {
+
+constexpr const char* kTag = "PLATFORM_RECORDS";
+constexpr int kSchemaVersion = 1;
+constexpr mode_t kFolderMode = 0770;
+constexpr mode_t kFileMode = 0660;
+
+int64_t randomId() {
+    std::random_device device;
+    return static_cast<int64_t>((static_cast<uint64_t>(device()) << 31 | device()) >> 1);
+}
+
+const char* sqlType(Type type) {
+    return type == Type::kInt || type == Type::kLong ? "INTEGER" : "TEXT";
+}
+
+}  // namespace
+
+std::unordered_map<const Store*, int>& lastVersions() {
+    thread_local std::unordered_map<const Store*, int> versions;
+    return versions;
+}
+
+Store::Store(const char* file, std::span<const View* const> views, const FeedShape& feed)
+    : mFile(file), mViews(views), mFeed(feed), mWriterId(randomId()) {}
+
+Store::~Store() = default;
+
+int Store::connect() {
+    const std::lock_guard lock(mMutex);
+    if (!mConnection.isOpen()) {
+        if (const int code = open(); code != PLATFORM_ERROR_NONE) return code;
+    }
+    ++mConnects;
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::disconnect() {
+    const std::lock_guard lock(mMutex);
+    if (mConnects == 0) return PLATFORM_ERROR_INVALID_PARAMETER;
+    if (--mConnects == 0) {
+        mConnection.close();
+        lastVersions().erase(this);
+    }
+    return PLATFORM_ERROR_NONE;
+}
+
+const View* Store::viewOf(const char* uri) const {
+    for (const View* view : mViews) {
+        if (uri != nullptr && isSame(view->uri, uri)) return view;
+    }
+    return nullptr;
+}
+
+int Store::codeOf(int sqliteCode) {
+    switch (sqliteCode) {
+        case SQLITE_OK:
+        case SQLITE_ROW:
+        case SQLITE_DONE:
+            return PLATFORM_ERROR_NONE;
+        case SQLITE_CONSTRAINT:
+            return PLATFORM_ERROR_INVALID_PARAMETER;
+        default:
+            dlog_print(DLOG_ERROR, kTag, "%s: %s", mPath.c_str(),
+                       mConnection.isOpen() ? mConnection.message() : sqlite3_errstr(sqliteCode));
+            return sqliteCode == SQLITE_FULL ? PLATFORM_ERROR_NO_SPACE : PLATFORM_ERROR_DATABASE;
+    }
+}
+
+int Store::open() {
+    const std::string file = mFile;
+    if (const int code = makeFolder(file.substr(0, file.rfind('/')), kFolderMode);
+        code != PLATFORM_ERROR_NONE) {
+        dlog_print(DLOG_ERROR, kTag, "the folder of %s cannot be made", file.c_str());
+        return code;
+    }
+    mPath = rootedPath(file);
+    if (const int code = mConnection.open(mPath); code != SQLITE_OK) return codeOf(code);
+    const int code = makeSchema();
+    if (code != PLATFORM_ERROR_NONE) mConnection.close();
+    return code;
+}
+
+int Store::makeSchema() {
+    int version = 0;
+    {
+        Statement statement = mConnection.prepare("PRAGMA user_version");
+        if (const int code = statement.step(); code != SQLITE_ROW) return codeOf(code);
+        version = static_cast<int>(statement.integer(0));
+    }
+    if (version == kSchemaVersion) return PLATFORM_ERROR_NONE;
+    if (version > kSchemaVersion) {
+        dlog_print(DLOG_ERROR, kTag,
+                   "%s was written by a newer version (%d, this one knows %d), it is left alone",
+                   mPath.c_str(), version, kSchemaVersion);
+        return PLATFORM_ERROR_DATABASE;
+    }
+    std::string schema = "BEGIN IMMEDIATE;";
+    for (const View* view : mViews) {
+        if (view->table != nullptr) schema += tableText(*view);
+    }
+    schema +=
+        "CREATE TABLE IF NOT EXISTS store(version INTEGER NOT NULL);"
+        "INSERT INTO store SELECT 0 WHERE NOT EXISTS (SELECT 1 FROM store);"
+        "CREATE TABLE IF NOT EXISTS writes(version INTEGER PRIMARY KEY, writer INTEGER NOT NULL, views "
+        "INTEGER NOT NULL);"
+        "CREATE TABLE IF NOT EXISTS tombstones(view TEXT NOT NULL, id INTEGER NOT NULL, book INTEGER NOT "
+        "NULL, created "
+        "INTEGER NOT NULL, deleted INTEGER NOT NULL, synced INTEGER NOT NULL);"
+        "CREATE INDEX IF NOT EXISTS tombstones_feed ON tombstones(book, deleted);"
+        "PRAGMA user_version=" +
+        std::to_string(kSchemaVersion) + ";COMMIT;";
+    if (const int code = mConnection.run(schema); code != SQLITE_OK) {
+        const int result = codeOf(code);
+        if (mConnection.inTransaction()) (void)mConnection.run("ROLLBACK");
+        return result;
+    }
+    for (const std::string& path : {mPath, mPath + "-journal"}) (void)chmod(path.c_str(), kFileMode);
+    return PLATFORM_ERROR_NONE;
+}
+
+std::string Store::tableText(const View& view) const {
+    const std::string table = view.table;
+    std::string text = "CREATE TABLE IF NOT EXISTS " + table + "(id INTEGER PRIMARY KEY AUTOINCREMENT";
+    if (view.role == Role::kChild) text += ", parent INTEGER NOT NULL";
+    if (view.role != Role::kChild)
+        text +=
+            ", created_version INTEGER NOT NULL, version INTEGER NOT NULL, synced_version INTEGER NOT NULL";
+    for (const Property& property : view.properties) {
+        if (property.column != nullptr && !property.readOnly) {
+            text += std::string(", ") + property.column + " " + sqlType(property.type) + " NOT NULL";
+        }
+    }
+    text += ");";
+    if (view.role == Role::kChild) {
+        return text + "CREATE INDEX IF NOT EXISTS " + table + "_parent ON " + table + "(parent);";
+    }
+    if (view.bookProperty != 0) {
+        const std::string book = view.columnOf(view.bookProperty);
+        text += "CREATE INDEX IF NOT EXISTS " + table + "_feed ON " + table + "(" + book + ", version);";
+    }
+    if (view.hasSeries()) {
+        const std::string series = view.columnOf(view.seriesProperty);
+        text += "CREATE UNIQUE INDEX IF NOT EXISTS " + table + "_instance ON " + table + "(" + series + ", " +
+                view.columnOf(view.instanceProperty) + ") WHERE " + series + " <> 0;";
+    }
+    // What an item owns goes with it.
+    for (const Property& property : view.properties) {
+        const View* child = property.childView != nullptr ? viewOf(property.childView) : nullptr;
+        if (child == nullptr || child == &view) continue;
+        text += "CREATE TRIGGER IF NOT EXISTS " + table + "_" + child->table + " AFTER DELETE ON " + table +
+                " BEGIN DELETE FROM " + child->table + " WHERE parent = old.id; END;";
+    }
+    return text;
+}
+
+int Store::currentVersion(int* version) {
+    const std::lock_guard lock(mMutex);
+    Statement statement = mConnection.prepare("SELECT version FROM store");
+    const int code = statement.step();
+    if (code != SQLITE_ROW) return codeOf(code == SQLITE_DONE ? SQLITE_CORRUPT : code);
+    *version = static_cast<int>(statement.integer(0));
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::lastChangeVersion(int* version) {
+    const std::lock_guard lock(mMutex);
+    const auto own = lastVersions().find(this);
+    if (own == lastVersions().end()) return currentVersion(version);
+    *version = own->second;
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::begin() {
+    mMutex.lock();
+    if (mDepth == 0) {
+        if (const int code = codeOf(mConnection.run("BEGIN IMMEDIATE")); code != PLATFORM_ERROR_NONE) {
+            mMutex.unlock();
+            return code;
+        }
+        mTrusted.clear();
+    }
+    ++mDepth;
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::end(bool commit) {
+    const std::unique_lock<std::recursive_mutex> held(mMutex, std::adopt_lock);  // taken by begin()
+    if (mDepth == 0) return PLATFORM_ERROR_INVALID_PARAMETER;
+    if (--mDepth > 0) {
+        // An inner part that failed takes the whole with it at the outermost end.
+        mFailed = mFailed || !commit;
+        return PLATFORM_ERROR_NONE;
+    }
+    mTrusted.clear();
+    int code = PLATFORM_ERROR_NONE;
+    const bool failed = std::exchange(mFailed, false);
+    if (commit && !failed) code = codeOf(mConnection.run("COMMIT"));
+    if (mConnection.inTransaction()) (void)mConnection.run("ROLLBACK");
+    if (commit && failed) code = PLATFORM_ERROR_FAILED;
+    return code;
+}
+
+}  // namespace platform::records

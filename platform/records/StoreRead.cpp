@@ -1,0 +1,210 @@
+// Reading records, lists and the change feed.
+#include <algorithm>
+
+#include "Store.h"
+#include "platform/error.h"
+
+namespace platform::records {
+
+namespace {
+
+// A read transaction, unless the thread has a transaction open already: several statements see one state.
+class Snapshot {
+public:
+    explicit Snapshot(Connection& connection)
+        : mConnection(connection),
+          mOwn(!connection.inTransaction() && connection.run("BEGIN") == SQLITE_OK) {}
+    ~Snapshot() {
+        if (mOwn) (void)mConnection.run("COMMIT");
+    }
+    Snapshot(const Snapshot&) = delete;
+    Snapshot& operator=(const Snapshot&) = delete;
+
+private:
+    Connection& mConnection;
+    const bool mOwn;
+};
+
+// The store's own columns have their own names; read-only properties name them in their column.
+bool isRead(const Query& query, size_t index) {
+    return query.projection.empty() || query.projection[index];
+}
+
+std::string conditionOf(const Query& query, std::vector<Value>* values) {
+    std::string condition;
+    for (const Query::Filter& filter : query.filters) {
+        condition += condition.empty() ? " WHERE " : " AND ";
+        condition += std::string(query.view->properties[filter.index].column) + " = ?";
+        values->push_back(filter.value);
+    }
+    return condition;
+}
+
+std::string tailOf(const Query& query, int offset, int limit) {
+    std::string tail = " ORDER BY ";
+    if (query.sortIndex >= 0) {
+        tail += std::string(query.view->properties[static_cast<size_t>(query.sortIndex)].column) +
+                (query.ascending ? ", " : " DESC, ");
+    }
+    tail += "id";
+    if (limit > 0 || offset > 0) {
+        tail += " LIMIT " + std::to_string(limit > 0 ? limit : -1) + " OFFSET " +
+                std::to_string(std::max(offset, 0));
+    }
+    return tail;
+}
+
+}  // namespace
+
+int Store::get(const View& view, int id, std::unique_ptr<Record>* out) {
+    Query query(view);
+    query.filters.push_back({static_cast<size_t>(view.indexOf(view.idProperty)), int64_t{id}});
+    RecordList found;
+    if (const int code = this->query(query, 0, 1, &found); code != PLATFORM_ERROR_NONE) return code;
+    if (found.records.empty()) return PLATFORM_ERROR_NOT_FOUND;
+    out->reset(found.records.front());
+    found.release();
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::query(const Query& query, int offset, int limit, RecordList* out) {
+    if (query.view->table == nullptr || query.view->role == Role::kChild)
+        return PLATFORM_ERROR_INVALID_PARAMETER;
+    const std::lock_guard lock(mMutex);
+    if (!mConnection.isOpen()) return PLATFORM_ERROR_DATABASE;
+    const Snapshot snapshot(mConnection);
+    std::vector<Value> values;
+    const std::string condition = conditionOf(query, &values);
+    std::vector<std::unique_ptr<Record>> found;
+    const int code = readRecords(query, condition, values, tailOf(query, offset, limit), &found);
+    if (code != PLATFORM_ERROR_NONE) return code;
+    out->records.reserve(out->records.size() + found.size());
+    for (auto& record : found) out->records.push_back(record.release());
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::readRecords(const Query& query, const std::string& condition, const std::vector<Value>& values,
+                       const std::string& tail, std::vector<std::unique_ptr<Record>>* out) {
+    const View& view = *query.view;
+    std::string columns = "id";
+    std::vector<size_t> read;
+    bool readsChildren = false;
+    for (size_t i = 0; i < view.properties.size(); ++i) {
+        if (!isRead(query, i)) continue;
+        if (view.properties[i].type == Type::kChildren) {
+            readsChildren = true;
+        } else {
+            columns += std::string(", ") + view.properties[i].column;
+            read.push_back(i);
+        }
+    }
+    std::map<int, Record*> byId;
+    {
+        Statement statement =
+            mConnection.prepare("SELECT " + columns + " FROM " + view.table + condition + tail);
+        for (const Value& value : values) statement.bind(value);
+        int code = statement.step();
+        for (; code == SQLITE_ROW; code = statement.step()) {
+            auto record = std::make_unique<Record>(view);
+            record->setAllPresent(false);
+            record->setNumber(view.idProperty, statement.integer(0));
+            for (size_t k = 0; k < read.size(); ++k) {
+                record->setAt(read[k],
+                              statement.value(static_cast<int>(k) + 1, view.properties[read[k]].type));
+            }
+            if (readsChildren) byId[record->id()] = record.get();
+            out->push_back(std::move(record));
+        }
+        if (code != SQLITE_DONE) return codeOf(code);
+    }
+    if (!readsChildren || byId.empty()) return PLATFORM_ERROR_NONE;
+    return readChildren(view, query, std::string("SELECT id FROM ") + view.table + condition + tail, values,
+                        &byId);
+}
+
+int Store::readChildren(const View& view, const Query& query, const std::string& selectIds,
+                        const std::vector<Value>& values, std::map<int, Record*>* byId) {
+    for (size_t i = 0; i < view.properties.size(); ++i) {
+        const Property& property = view.properties[i];
+        if (property.type != Type::kChildren || !isRead(query, i)) continue;
+        for (auto& [id, record] : *byId) record->setPresent(i, true);
+        const View& child = *viewOf(property.childView);
+        const bool isException = property.id == view.exceptionsProperty;
+        std::vector<std::unique_ptr<Record>> children;
+        std::vector<int> parents;
+        if (isException) {
+            // Exceptions have attendees and alarms of their own, but no exceptions.
+            Query exceptions(view);
+            exceptions.projection.assign(view.properties.size(), true);
+            exceptions.projection[i] = false;
+            const std::string condition =
+                std::string(" WHERE ") + view.columnOf(view.seriesProperty) + " IN (" + selectIds + ")";
+            const int code = readRecords(exceptions, condition, values, " ORDER BY id", &children);
+            if (code != PLATFORM_ERROR_NONE) return code;
+            for (const auto& record : children) parents.push_back(record->seriesId());
+        } else {
+            std::string columns = "parent, id";
+            for (const Property& column : child.properties) columns += std::string(", ") + column.column;
+            Statement statement = mConnection.prepare("SELECT " + columns + " FROM " + child.table +
+                                                      " WHERE parent IN (" + selectIds + ") ORDER BY id");
+            for (const Value& value : values) statement.bind(value);
+            int code = statement.step();
+            for (; code == SQLITE_ROW; code = statement.step()) {
+                auto record = std::make_unique<Record>(child);
+                for (size_t k = 0; k < child.properties.size(); ++k) {
+                    record->setAt(k, statement.value(static_cast<int>(k) + 2, child.properties[k].type));
+                }
+                parents.push_back(static_cast<int>(statement.integer(0)));
+                children.push_back(std::move(record));
+            }
+            if (code != SQLITE_DONE) return codeOf(code);
+        }
+        for (size_t k = 0; k < children.size(); ++k) {
+            if (const auto parent = byId->find(parents[k]); parent != byId->end()) {
+                parent->second->children(i).push_back(std::move(children[k]));
+            }
+        }
+    }
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::changes(const View& view, int bookId, int since, RecordList* out, int* current) {
+    if (view.role != Role::kItem) return PLATFORM_ERROR_INVALID_PARAMETER;
+    const std::lock_guard lock(mMutex);
+    if (!mConnection.isOpen()) return PLATFORM_ERROR_DATABASE;
+    const Snapshot snapshot(mConnection);
+    int version = 0;
+    if (const int code = currentVersion(&version); code != PLATFORM_ERROR_NONE) return code;
+
+    const std::string book = view.columnOf(view.bookProperty);
+    const std::string topLevel =
+        view.hasSeries() ? std::string(" AND ") + view.columnOf(view.seriesProperty) + " = 0" : "";
+    Statement statement = mConnection.prepare(
+        "SELECT id, CASE WHEN created_version > ? THEN 0 ELSE 1 END, version AS changed, synced_version "
+        "FROM " +
+        std::string(view.table) + " WHERE " + book + " = ? AND version > ?" + topLevel +
+        " UNION ALL SELECT id, 2, deleted AS changed, synced FROM tombstones WHERE book = ? AND deleted > ? "
+        "AND created <= ? "
+        "AND view = ? ORDER BY changed, id");
+    const int64_t from = since;
+    const int64_t inBook = bookId;
+    statement.bind(from).bind(inBook).bind(from).bind(inBook).bind(from).bind(from).bind(
+        std::string(view.uri));
+    RecordList found;
+    int code = statement.step();
+    for (; code == SQLITE_ROW; code = statement.step()) {
+        auto record = std::make_unique<Record>(*mFeed.view);
+        record->setNumber(mFeed.id, statement.integer(0));
+        record->setNumber(mFeed.book, bookId);
+        record->setNumber(mFeed.change, statement.integer(1));
+        record->setNumber(mFeed.version, statement.integer(2));
+        record->setNumber(mFeed.syncedVersion, statement.integer(3));
+        found.records.push_back(record.release());
+    }
+    if (code != SQLITE_DONE) return codeOf(code);
+    out->records.swap(found.records);
+    *current = version;
+    return PLATFORM_ERROR_NONE;
+}
+
+}  // namespace platform::records

@@ -1,0 +1,306 @@
+// What a writing call does to one record.
+#include <algorithm>
+
+#include "StoreWrite.h"
+#include "platform/error.h"
+
+namespace platform::records {
+
+namespace {
+
+bool isDone(int code) {
+    return code == SQLITE_DONE;
+}
+
+// "UPDATE" and "INSERT" lists are made per view once and kept as prepared statements by their text.
+bool isColumn(const Property& property) {
+    return property.column != nullptr && !property.readOnly;
+}
+
+}  // namespace
+
+int Store::load(const View& view, int id, Stored* stored) {
+    std::string sql = "SELECT version, synced_version, ";
+    sql += view.bookProperty != 0 ? view.columnOf(view.bookProperty) : "0";
+    sql += ", ";
+    sql += view.hasSeries() ? view.columnOf(view.seriesProperty) : "0";
+    sql += std::string(" FROM ") + view.table + " WHERE id = ?";
+    Statement statement = mConnection.prepare(sql);
+    const int code = statement.bind(int64_t{id}).step();
+    if (isDone(code)) return PLATFORM_ERROR_NOT_FOUND;
+    if (code != SQLITE_ROW) return codeOf(code);
+    *stored = {.version = static_cast<int>(statement.integer(0)),
+               .syncedVersion = static_cast<int>(statement.integer(1)),
+               .bookId = static_cast<int>(statement.integer(2)),
+               .seriesId = static_cast<int>(statement.integer(3))};
+    return PLATFORM_ERROR_NONE;
+}
+
+// An exception is as old as its series: whoever changed the series, or another of its exceptions, has moved it on.
+int Store::check(const View& view, int id, const Stored& stored, int expected) {
+    if (expected == kAnyVersion) return PLATFORM_ERROR_NONE;
+    const int subject = stored.seriesId != 0 ? stored.seriesId : id;
+    if (mTrusted.contains({&view, subject})) return PLATFORM_ERROR_NONE;
+    int version = stored.version;
+    if (stored.seriesId != 0) {
+        Stored series;
+        if (const int code = load(view, stored.seriesId, &series); code != PLATFORM_ERROR_NONE) return code;
+        version = series.version;
+    }
+    if (version != expected) return PLATFORM_ERROR_CONFLICT;
+    mTrusted.insert({&view, subject});
+    return PLATFORM_ERROR_NONE;
+}
+
+// A child's write is an update of its series. The series counts as the sync's own only if no unseen edit is in it.
+int Store::touchSeries(Write& write, const View& view, int seriesId) {
+    Stored series;
+    if (const int code = load(view, seriesId, &series); code != PLATFORM_ERROR_NONE) return code;
+    const bool clean = series.version == series.syncedVersion || mTrusted.contains({&view, seriesId});
+    const int synced = write.bySync() && clean ? write.version() : series.syncedVersion;
+    Statement statement = mConnection.prepare(std::string("UPDATE ") + view.table +
+                                              " SET version = ?, synced_version = ? WHERE id = ?");
+    const int code =
+        statement.bind(int64_t{write.version()}).bind(int64_t{synced}).bind(int64_t{seriesId}).step();
+    if (clean) mTrusted.insert({&view, seriesId});
+    return codeOf(code);
+}
+
+int Store::checkBook(const View& view, int bookId) {
+    const View* books = viewOf(view.bookView);
+    Statement statement =
+        mConnection.prepare(std::string("SELECT ") + books->columnOf(view.bookTypeProperty) + " FROM " +
+                            books->table + " WHERE id = ?");
+    const int code = statement.bind(int64_t{bookId}).step();
+    if (isDone(code)) return PLATFORM_ERROR_INVALID_PARAMETER;
+    if (code != SQLITE_ROW) return codeOf(code);
+    return statement.integer(0) == view.bookType ? PLATFORM_ERROR_NONE : PLATFORM_ERROR_INVALID_PARAMETER;
+}
+
+int Store::insertOne(Write& write, Record& record, int expected) {
+    const View& view = record.view();
+    if (view.table == nullptr || view.role == Role::kChild) return PLATFORM_ERROR_INVALID_PARAMETER;
+    const int seriesId = record.seriesId();
+    int bookId = 0;
+    if (seriesId != 0) {
+        Stored series;
+        if (const int code = load(view, seriesId, &series); code != PLATFORM_ERROR_NONE) return code;
+        if (series.seriesId != 0) return PLATFORM_ERROR_INVALID_PARAMETER;
+        if (const int code = check(view, seriesId, series, expected); code != PLATFORM_ERROR_NONE)
+            return code;
+        bookId = series.bookId;
+    } else if (view.bookProperty != 0) {
+        bookId = static_cast<int>(record.number(view.bookProperty));
+        if (const int code = checkBook(view, bookId); code != PLATFORM_ERROR_NONE) return code;
+    }
+    if (const int code = insertRow(write, record, bookId); code != PLATFORM_ERROR_NONE) return code;
+    write.touch(view);
+    if (seriesId != 0) return touchSeries(write, view, seriesId);
+    if (!view.hasSeries()) return PLATFORM_ERROR_NONE;
+    for (auto& exception : record.children(static_cast<size_t>(view.indexOf(view.exceptionsProperty)))) {
+        exception->setNumber(view.seriesProperty, record.id());
+        if (const int code = insertOne(write, *exception, kAnyVersion); code != PLATFORM_ERROR_NONE)
+            return code;
+    }
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::insertRow(Write& write, Record& record, int bookId) {
+    const View& view = record.view();
+    std::string columns = "created_version, version, synced_version";
+    std::string places = "?, ?, ?";
+    for (const Property& property : view.properties) {
+        if (!isColumn(property)) continue;
+        columns += std::string(", ") + property.column;
+        places += ", ?";
+    }
+    Statement statement = mConnection.prepare(std::string("INSERT INTO ") + view.table + "(" + columns +
+                                              ") VALUES(" + places + ")");
+    const int64_t version = write.version();
+    statement.bind(version).bind(version).bind(write.bySync() ? version : int64_t{0});
+    if (view.bookProperty != 0) record.setNumber(view.bookProperty, bookId);
+    for (size_t i = 0; i < view.properties.size(); ++i) {
+        if (isColumn(view.properties[i])) statement.bind(record.valueAt(i));
+    }
+    if (const int code = statement.step(); !isDone(code)) return codeOf(code);
+    const auto id = static_cast<int>(mConnection.lastRowId());
+    record.setNumber(view.idProperty, id);
+    mTrusted.insert({&view, id});
+    return writeChildren(record, id, /*onlyPresent=*/false);
+}
+
+// Attendees, alarms and the like become those of the record.
+int Store::writeChildren(Record& record, int id, bool onlyPresent) {
+    const View& view = record.view();
+    for (size_t i = 0; i < view.properties.size(); ++i) {
+        const Property& property = view.properties[i];
+        if (property.type != Type::kChildren || property.id == view.exceptionsProperty) continue;
+        if (onlyPresent && !record.isPresent(i)) continue;
+        const View& child = *viewOf(property.childView);
+        Statement clear =
+            mConnection.prepare(std::string("DELETE FROM ") + child.table + " WHERE parent = ?");
+        if (const int code = clear.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);
+        std::string columns = "parent";
+        std::string places = "?";
+        for (const Property& column : child.properties) {
+            if (!isColumn(column)) continue;
+            columns += std::string(", ") + column.column;
+            places += ", ?";
+        }
+        for (const auto& entry : record.children(i)) {
+            Statement insert = mConnection.prepare(std::string("INSERT INTO ") + child.table + "(" + columns +
+                                                   ") VALUES(" + places + ")");
+            insert.bind(int64_t{id});
+            for (size_t k = 0; k < child.properties.size(); ++k) {
+                if (isColumn(child.properties[k])) insert.bind(entry->valueAt(k));
+            }
+            if (const int code = insert.step(); !isDone(code)) return codeOf(code);
+        }
+    }
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::writeColumns(Write& write, const View& view, int id, const Record& record, bool bySync,
+                        const MayWrite& mayWrite) {
+    std::string columns = "version = ?";
+    if (bySync) columns += ", synced_version = ?";
+    for (size_t i = 0; i < view.properties.size(); ++i) {
+        if (isColumn(view.properties[i]) && mayWrite(view.properties[i], i)) {
+            columns += std::string(", ") + view.properties[i].column + " = ?";
+        }
+    }
+    Statement statement =
+        mConnection.prepare(std::string("UPDATE ") + view.table + " SET " + columns + " WHERE id = ?");
+    statement.bind(int64_t{write.version()});
+    if (bySync) statement.bind(int64_t{write.version()});
+    for (size_t i = 0; i < view.properties.size(); ++i) {
+        if (isColumn(view.properties[i]) && mayWrite(view.properties[i], i))
+            statement.bind(record.valueAt(i));
+    }
+    const int code = statement.bind(int64_t{id}).step();
+    if (!isDone(code)) return codeOf(code);
+    write.touch(view);
+    mTrusted.insert({&view, id});
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::updateOne(Write& write, Record& record, int expected) {
+    const View& view = record.view();
+    if (view.table == nullptr || view.role == Role::kChild) return PLATFORM_ERROR_INVALID_PARAMETER;
+    const int id = record.id();
+    Stored stored;
+    if (const int code = load(view, id, &stored); code != PLATFORM_ERROR_NONE) return code;
+    if (const int code = check(view, id, stored, expected); code != PLATFORM_ERROR_NONE) return code;
+    const int code =
+        writeColumns(write, view, id, record, write.bySync(), [&](const Property& property, size_t i) {
+            return record.isPresent(i) && !view.isFixed(property.id);
+        });
+    if (code != PLATFORM_ERROR_NONE) return code;
+    if (const int children = writeChildren(record, id, /*onlyPresent=*/true);
+        children != PLATFORM_ERROR_NONE) {
+        return children;
+    }
+    if (stored.seriesId != 0) return touchSeries(write, view, stored.seriesId);
+    if (!view.hasSeries()) return PLATFORM_ERROR_NONE;
+    return updateExceptions(write, record);
+}
+
+int Store::updateExceptions(Write& write, Record& record) {
+    const View& view = record.view();
+    const auto index = static_cast<size_t>(view.indexOf(view.exceptionsProperty));
+    if (!record.isPresent(index)) return PLATFORM_ERROR_NONE;
+    std::unique_ptr<Record> before;
+    if (const int code = get(view, record.id(), &before); code != PLATFORM_ERROR_NONE) return code;
+    std::map<int, const Record*> left;
+    for (const auto& exception : before->children(index)) left[exception->id()] = exception.get();
+
+    for (auto& exception : record.children(index)) {
+        const auto known = left.find(exception->id());
+        int code = PLATFORM_ERROR_NONE;
+        if (known == left.end()) {
+            exception->setNumber(view.seriesProperty, record.id());
+            code = insertOne(write, *exception, kAnyVersion);
+        } else {
+            if (!exception->hasSameContent(*known->second)) code = updateOne(write, *exception, kAnyVersion);
+            left.erase(known);
+        }
+        if (code != PLATFORM_ERROR_NONE) return code;
+    }
+    for (const auto& [id, exception] : left) {
+        if (const int code = removeOne(write, view, id, kAnyVersion); code != PLATFORM_ERROR_NONE)
+            return code;
+    }
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::replaceOne(Write& write, Record& record, int id, int expected) {
+    const View& view = record.view();
+    if (view.table == nullptr || view.role == Role::kChild) return PLATFORM_ERROR_INVALID_PARAMETER;
+    Stored stored;
+    if (const int code = load(view, id, &stored); code != PLATFORM_ERROR_NONE) return code;
+    if (const int code = check(view, id, stored, expected); code != PLATFORM_ERROR_NONE) return code;
+    const int code =
+        writeColumns(write, view, id, record, write.bySync(), [&](const Property& property, size_t) {
+            return !view.isFixed(property.id) && property.id != view.keptOnReplace;
+        });
+    if (code != PLATFORM_ERROR_NONE) return code;
+    if (const int children = writeChildren(record, id, /*onlyPresent=*/false);
+        children != PLATFORM_ERROR_NONE) {
+        return children;
+    }
+    return stored.seriesId != 0 ? touchSeries(write, view, stored.seriesId) : PLATFORM_ERROR_NONE;
+}
+
+int Store::removeOne(Write& write, const View& view, int id, int expected) {
+    Stored stored;
+    if (const int code = load(view, id, &stored); code != PLATFORM_ERROR_NONE) return code;
+    if (const int code = check(view, id, stored, expected); code != PLATFORM_ERROR_NONE) return code;
+    write.touch(view);
+    if (view.role == Role::kBook) return removeBook(write, view, id);
+    return removeItem(write, view, id, stored);
+}
+
+int Store::removeItem(Write& write, const View& view, int id, const Stored& stored) {
+    const std::string table = view.table;
+    if (stored.seriesId == 0) {
+        Statement bury = mConnection.prepare(
+            "INSERT INTO tombstones(view, id, book, created, deleted, synced) SELECT ?, id, ?, "
+            "created_version, ?, ? FROM " +
+            table + " WHERE id = ?");
+        const int64_t synced = write.bySync() ? write.version() : stored.syncedVersion;
+        const int code = bury.bind(std::string(view.uri))
+                             .bind(int64_t{stored.bookId})
+                             .bind(int64_t{write.version()})
+                             .bind(synced)
+                             .bind(int64_t{id})
+                             .step();
+        if (!isDone(code)) return codeOf(code);
+        if (view.hasSeries()) {
+            Statement exceptions = mConnection.prepare("DELETE FROM " + table + " WHERE " +
+                                                       view.columnOf(view.seriesProperty) + " = ?");
+            if (const int removed = exceptions.bind(int64_t{id}).step(); !isDone(removed))
+                return codeOf(removed);
+        }
+    }
+    Statement statement = mConnection.prepare("DELETE FROM " + table + " WHERE id = ?");
+    if (const int code = statement.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);
+    return stored.seriesId != 0 ? touchSeries(write, view, stored.seriesId) : PLATFORM_ERROR_NONE;
+}
+
+// A book's records go unlisted, and so do the deletions that were listed for it.
+int Store::removeBook(Write& write, const View& view, int id) {
+    for (const View* items : mViews) {
+        if (items->bookProperty == 0 || !isSame(items->bookView, view.uri)) continue;
+        Statement statement = mConnection.prepare(std::string("DELETE FROM ") + items->table + " WHERE " +
+                                                  items->columnOf(items->bookProperty) + " = ?");
+        if (const int code = statement.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);
+        write.touch(*items);
+    }
+    Statement forget = mConnection.prepare("DELETE FROM tombstones WHERE book = ?");
+    if (const int code = forget.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);
+    Statement statement = mConnection.prepare(std::string("DELETE FROM ") + view.table + " WHERE id = ?");
+    const int code = statement.bind(int64_t{id}).step();
+    return isDone(code) ? PLATFORM_ERROR_NONE : codeOf(code);
+}
+
+}  // namespace platform::records

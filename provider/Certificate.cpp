@@ -36,7 +36,7 @@ std::string pemOf(X509* certificate) {
 
 Certificate Certificate::make() {
     Certificate made;
-    made.key.reset(EVP_EC_gen("P-256"));
+    made.key.reset(EVP_PKEY_Q_keygen(nullptr, nullptr, "EC", "P-256"));
     made.certificate.reset(X509_new());
     X509* certificate = made.certificate.get();
     require(made.key != nullptr && certificate != nullptr);

@@ -15,6 +15,7 @@ constexpr KindName kKindNames[] = {{FaultKind::kStatus, "status"},
                                    {FaultKind::kReset, "reset"},
                                    {FaultKind::kCut, "cut"},
                                    {FaultKind::kCorruptGzip, "corrupt-gzip"},
+                                   {FaultKind::kShortGzip, "short-gzip"},
                                    {FaultKind::kBody, "body"}};
 
 [[noreturn]] void invalid(const std::string& member, const std::string& why) {
@@ -81,8 +82,8 @@ Fault Fault::parse(const Json& body) {
     const Json after = body.value("afterHandling", Json(false));
     if (!after.is_boolean()) invalid("afterHandling", "must be a boolean");
     // These spoil a reply, so that there has to be one.
-    fault.afterHandling =
-        after.get<bool>() || fault.kind == FaultKind::kCut || fault.kind == FaultKind::kCorruptGzip;
+    fault.afterHandling = after.get<bool>() || fault.kind == FaultKind::kCut ||
+                          fault.kind == FaultKind::kCorruptGzip || fault.kind == FaultKind::kShortGzip;
     return fault;
 }
 

@@ -24,7 +24,7 @@ struct Match {
     [[nodiscard]] bool fits(const Call& call) const;
 };
 
-enum class FaultKind { kStatus, kDelay, kReset, kCut, kCorruptGzip, kBody };
+enum class FaultKind { kStatus, kDelay, kReset, kCut, kCorruptGzip, kShortGzip, kBody };
 
 struct Fault {
     Match match;

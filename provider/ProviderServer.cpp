@@ -67,6 +67,7 @@ struct ProviderServer::Outcome {
     bool isReset = false;
     bool isCut = false;
     bool isCorrupt = false;
+    bool isShort = false;
 };
 
 ProviderServer::ProviderServer(const ServerOptions& options)
@@ -267,6 +268,9 @@ void ProviderServer::spoil(const Fault& fault, Outcome& outcome) {
         case FaultKind::kCorruptGzip:
             outcome.isCorrupt = true;
             break;
+        case FaultKind::kShortGzip:
+            outcome.isShort = true;
+            break;
         case FaultKind::kBody:
             reply.body.clear();
             break;
@@ -278,13 +282,14 @@ void ProviderServer::spoil(const Fault& fault, Outcome& outcome) {
 
 void ProviderServer::deliver(Outcome& outcome, httplib::Response& response) {
     Reply& reply = outcome.reply;
-    if (outcome.isCorrupt) outcome.isGzip = true;
+    if (outcome.isCorrupt || outcome.isShort) outcome.isGzip = true;
     if (outcome.isGzip) reply.body = gzip(reply.body);
     if (outcome.isCorrupt) {
         // Behind the gzip header, so that it is found only while inflating.
         for (std::size_t i = 10; i < reply.body.size(); i += 7)
             reply.body[i] = static_cast<char>(~reply.body[i]);
     }
+    if (outcome.isShort) reply.body.resize(reply.body.size() / 2);
     response.status = reply.status;
     if (outcome.isGzip) response.set_header("Content-Encoding", "gzip");
     if (!outcome.isAdmin) response.set_header("Vary", "Accept-Encoding, User-Agent");

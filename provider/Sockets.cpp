@@ -43,7 +43,7 @@ void resetConnection(int port, int clientPort) {
         if (remote != clientPort) return;
         // Dissolving the association of a connected socket is an abortive close.
         const sockaddr none{AF_UNSPEC, {}};
-        connect(fd, &none, sizeof none);
+        static_cast<void>(connect(fd, &none, sizeof none));
     });
 }
 

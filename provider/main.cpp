@@ -52,7 +52,9 @@ void fill(provider::Store& store, const std::string& seed, const std::string& st
     if (seed == "sample") {
         provider::seedSample(store);
     } else if (isNumber) {
-        provider::seedBulk(store, std::min<std::size_t>(std::stoul(seed), kMaxSeedEvents));
+        const std::size_t events = std::stoul(seed);
+        if (events > kMaxSeedEvents) throw std::runtime_error("--seed takes at most 1000000 events");
+        provider::seedBulk(store, events);
     } else {
         store.load(readJson(seed));
     }
@@ -77,9 +79,7 @@ int run(const provider::ServerOptions& options, const std::string& seed, const s
     return 0;
 }
 
-}  // namespace
-
-int main(int argc, char** argv) {
+int readAndRun(int argc, char** argv) {
     CLI::App app{
         "A cloud account provider on this machine: accounts, calendars and events over REST, for demos, "
         "tests and benchmarks. Prints one line of JSON when it is ready."};
@@ -107,12 +107,18 @@ int main(int argc, char** argv) {
     }
     options.latency = std::chrono::milliseconds(latencyMs);
     options.tokenLifetime = std::chrono::seconds(tokenLifetime);
+    return run(options, seed, stateFile);
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
     try {
-        return run(options, seed, stateFile);
+        return readAndRun(argc, argv);
     } catch (const provider::ApiError& error) {
-        std::cerr << "vantor-pim-provider: " << error.message << '\n';
+        std::fprintf(stderr, "vantor-pim-provider: %s\n", error.message.c_str());
     } catch (const std::exception& error) {
-        std::cerr << "vantor-pim-provider: " << error.what() << '\n';
+        std::fprintf(stderr, "vantor-pim-provider: %s\n", error.what());
     }
     return 1;
 }

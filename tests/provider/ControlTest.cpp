@@ -105,6 +105,10 @@ TEST_F(Control, FaultsSpoilRepliesInEveryWay) {
     const Answer corrupt = get(kEvents);
     EXPECT_EQ(corrupt.headers.count("Content-Encoding"), 1U);
     EXPECT_EQ(corrupt.text.substr(0, 2), "\x1f\x8b");
+    fault(R"({"kind":"short-gzip"})");
+    const Answer cutShort = get(kEvents);
+    EXPECT_EQ(cutShort.status, 200);
+    EXPECT_LT(cutShort.text.size(), corrupt.text.size());
     fault(R"({"kind":"delay","delayMs":60})");
     const auto begin = std::chrono::steady_clock::now();
     EXPECT_EQ(get(kEvents).status, 200);

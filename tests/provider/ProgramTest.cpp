@@ -28,6 +28,7 @@ public:
             close(pipe[1]);
             arguments.insert(arguments.begin(), VPS_BIN_DIR "/vantor-pim-provider");
             std::vector<char*> argv;
+            argv.reserve(arguments.size() + 1);
             for (std::string& argument : arguments) argv.push_back(argument.data());
             argv.push_back(nullptr);
             execv(argv[0], argv.data());

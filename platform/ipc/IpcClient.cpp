@@ -142,6 +142,13 @@ int pims_ipc_call(pims_ipc_h ipc, const char* module, const char* command, pims_
     return PLATFORM_ERROR_IO;
 }
 
+bool pims_ipc_is_alive(pims_ipc_h ipc) {
+    if (ipc == nullptr || ipc->broken) return false;
+    pollfd entry{ipc->fd, POLLIN, 0};
+    // Between calls nothing is sent, so anything to read is the end of the connection.
+    return poll(&entry, 1, 0) == 0;
+}
+
 int pims_ipc_get_server_pid(pims_ipc_h ipc, int* pid) {
     if (ipc == nullptr || pid == nullptr) return PLATFORM_ERROR_INVALID_PARAMETER;
     ucred peer{};

@@ -56,5 +56,7 @@ int pims_ipc_destroy(pims_ipc_h ipc);
 // PLATFORM_ERROR_IO the handle is broken and every call fails.
 [[nodiscard]] int pims_ipc_call(pims_ipc_h ipc, const char* module, const char* command,
                                 pims_ipc_data_h data_in, pims_ipc_data_h* data_out, int timeout_ms);
+// Whether the serving process still holds the connection; asks nobody, takes no time.
+[[nodiscard]] bool pims_ipc_is_alive(pims_ipc_h ipc);
 // The process id of the serving process.
 [[nodiscard]] int pims_ipc_get_server_pid(pims_ipc_h ipc, int* pid);

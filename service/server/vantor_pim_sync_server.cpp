@@ -1,0 +1,66 @@
+// The daemon's entry: opens the service socket, brings the service up, runs the main loop until SIGTERM or SIGINT.
+#include <glib-object.h>
+
+#include <cstdio>
+#include <string_view>
+
+#include "common/SyncLog.h"
+#include "common/SyncService.h"
+#include "common/vantor_pim_sync_ipc_marshal.h"
+#include "platform/root.h"
+#include "server/vantor_pim_sync_server_ipc.h"
+
+namespace {
+
+constexpr unsigned kSocketGroup = 6005;
+constexpr unsigned kSocketMode = 0660;
+
+void initializeTypes() {
+    // Done by the library itself today; kept for older ones.
+#pragma GCC diagnostic push
+#pragma GCC diagnostic ignored "-Wdeprecated-declarations"
+    g_type_init();
+#pragma GCC diagnostic pop
+}
+
+}  // namespace
+
+static int __server_main() {
+    initializeTypes();
+    (void)pims_ipc_svc_init(kServiceSocket, kSocketGroup, kSocketMode);
+    if (!vantor_pim_sync_server_ipc_register()) return 0;
+    const std::string root = platform::rootFolder();
+    SYNC_INFO("serving %s", root.empty() ? "the system" : root.c_str());
+    (void)vantor_pim_sync_initialize();
+    pims_ipc_svc_run_main_loop(nullptr);
+    (void)vantor_pim_sync_finalize();
+    // Running syncs are told to stop and waited for: nothing may run into the end of the process.
+    if (SyncService::exists()) SyncService::getInstance().quiesce();
+    pims_ipc_svc_deinit();
+    SYNC_INFO("ended");
+    return 0;
+}
+
+int main(int argc, char** argv) {
+    constexpr int kMisused = 2;
+    if (argc == 2 && std::string_view(argv[1]) == "--help") {
+        std::puts(
+            "vantor-pim-sync: keeps calendars, to-dos and contacts in step with a cloud account.\n"
+            "Takes no arguments. VANTOR_PIM_SYNC_ROOT names the device's folder, VANTOR_PIM_SYNC_LOG the "
+            "lowest\n"
+            "severity that is logged (debug, info, warning, error). Ends on SIGTERM and SIGINT, and at once "
+            "with\n"
+            "status 0 when the device has no account of the provider. Accounts are managed with "
+            "vantor-pim-syncctl.");
+        return 0;
+    }
+    if (argc == 2 && std::string_view(argv[1]) == "--version") {
+        std::puts("vantor-pim-sync " VPS_VERSION);
+        return 0;
+    }
+    if (argc != 1) {
+        std::fprintf(stderr, "vantor-pim-sync: takes no arguments, see --help\n");
+        return kMisused;
+    }
+    return __server_main();
+}

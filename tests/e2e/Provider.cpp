@@ -1,0 +1,42 @@
+#include "e2e/Provider.h"
+
+#include <gtest/gtest.h>
+#include <httplib.h>
+
+using nlohmann::json;
+
+Provider::Provider(const std::vector<std::string>& arguments) {
+    std::vector<std::string> command = {std::string(VPS_BIN_DIR) + "/vantor-pim-provider", "--port", "0"};
+    command.insert(command.end(), arguments.begin(), arguments.end());
+    mProcess = std::make_unique<Process>(command, Environment{});
+    const json ready =
+        json::parse(mProcess->readLine(20'000).value_or(""), nullptr, /*allow_exceptions=*/false);
+    if (ready.is_discarded()) {
+        ADD_FAILURE() << "the provider did not start";
+        return;
+    }
+    mUrl = ready["url"];
+    mClientId = ready["clientId"];
+    mClientSecret = ready["clientSecret"];
+    for (const json& account : ready["accounts"])
+        mAccounts.push_back({account["email"], account["refreshToken"]});
+}
+
+json Provider::admin(const std::string& method, const std::string& path, const json& body) {
+    httplib::Client client(mUrl);
+    client.enable_server_certificate_verification(false);
+    client.set_read_timeout(60);
+    httplib::Request request;
+    request.method = method;
+    request.path = "/admin" + path;
+    if (!body.is_null()) {
+        request.body = body.dump();
+        request.set_header("Content-Type", "application/json");
+    }
+    const httplib::Result result = client.send(request);
+    if (!result || result->status >= 300) {
+        ADD_FAILURE() << method << ' ' << path << ": " << (result ? result->body : to_string(result.error()));
+        return nullptr;
+    }
+    return json::parse(result->body, nullptr, /*allow_exceptions=*/false);
+}

@@ -1,0 +1,39 @@
+// SyncPair: a provider and a device that knows some of its accounts; the laws that hold after every sync.
+#pragma once
+
+#include <map>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "e2e/Device.h"
+#include "e2e/ExpectedEvents.h"
+#include "e2e/Provider.h"
+
+class SyncPair {
+public:
+    // Adds accounts 1..accounts of the provider, in its order.
+    explicit SyncPair(int accounts = 1,
+                      const std::vector<std::string>& providerArguments = {"--seed", "sample"});
+
+    // Fails the test unless the account's calendars and events are the same on both sides, once each.
+    void expectSame(int account);
+    // Fails the test unless another sync sends no write and changes no store.
+    void expectQuiet(int account);
+
+    [[nodiscard]] std::vector<Json> wireCalendars(int account);
+    [[nodiscard]] std::vector<Json> wireEvents(const std::string& calendarId);
+    [[nodiscard]] std::string firstCalendar(int account) { return wireCalendars(account).at(0)["id"]; }
+    // The local event with this server id.
+    [[nodiscard]] Json localEvent(const std::string& uid);
+    // The provider's requests so far, counted by method.
+    [[nodiscard]] std::map<std::string, int> requestCounts();
+    void installFault(const Json& fault) { provider.admin("POST", "/faults", fault); }
+    void expectFaultsUsed();
+
+    Provider provider;
+    Device device;
+};
+
+// A calendar's id inside an admin path.
+std::string pathText(const std::string& id);

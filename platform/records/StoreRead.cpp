@@ -184,7 +184,7 @@ int Store::changes(const View& view, int bookId, int since, RecordList* out, int
         "FROM " +
         std::string(view.table) + " WHERE " + book + " = ? AND version > ?" + topLevel +
         " UNION ALL SELECT id, 2, deleted AS changed, synced FROM tombstones WHERE book = ? AND deleted > ? "
-        "AND created <= ? "
+        "AND (created <= ? OR synced <> 0) "
         "AND view = ? ORDER BY changed, id");
     const int64_t from = since;
     const int64_t inBook = bookId;

@@ -29,6 +29,7 @@ struct LocalChange {
     int status = RECORD_UPDATED;
     int version = 0;
     bool ownWrite = false;
+    bool knownToSync = false;  // the sync wrote the record at some time
     std::vector<ChangedChild> children;
 };
 
@@ -58,6 +59,7 @@ int readChanges(int calendarId, int since, std::vector<LocalChange>* changes, in
             SYNC_ERR("record_get_int fail");
         } else {
             change.ownWrite = synced == change.version;
+            change.knownToSync = synced != 0;
             changes->push_back(std::move(change));
         }
     }
@@ -105,15 +107,16 @@ public:
     void mark(const LocalChange& change) {
         const auto known = mRows.find(change.eventId);
         const CalEventMetaData* row = known != mRows.end() ? &known->second : nullptr;
-        if (change.ownWrite || (row != nullptr && row->version == change.version)) return;
+        if (row != nullptr && row->version == change.version) return;
         if (change.status == RECORD_DELETED) {
             if (mStore.updateEventDeleted(change.eventId, 1) != kOk) SYNC_ERR("MetaDB update deleted fail");
         } else if (row != nullptr) {
             if (mStore.updateEventDirty(change.eventId, 1) != kOk) SYNC_ERR("MetaDB update dirty fail");
             markChildren(*row, change);
-        } else {
+        } else if (!change.knownToSync) {
             markNew(change);
         }
+        // A record of the sync that has no row is taken over by the next download, as changed.
     }
 
 private:
@@ -186,9 +189,10 @@ int CalDataManager::setCalendarbookChanged(int calendarId) {
     int current = 0;
     if (readChanges(calendarId, since, &changes, &current) != kOk) return kFailed;
     if (current <= since) return kOk;
+    std::erase_if(changes, [](const LocalChange& change) { return change.ownWrite; });
     // Everything is read from the calendar service before the transaction begins.
     for (LocalChange& change : changes) {
-        if (!change.ownWrite && change.status != RECORD_DELETED) readChildren(&change);
+        if (change.status != RECORD_DELETED) readChildren(&change);
     }
     std::vector<CalEventMetaData> rows;
     if (!changes.empty() && metaData->getAllEvents(calendarId, &rows) != kOk) return kFailed;

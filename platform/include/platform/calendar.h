@@ -172,8 +172,9 @@ int calendar_query_destroy(calendar_query_h query);
 [[nodiscard]] int calendar_db_get_all_records(const char* view, int offset, int limit, calendar_list_h* out);
 [[nodiscard]] int calendar_db_get_records_with_query(calendar_query_h query, int offset, int limit,
                                                      calendar_list_h* out);  // limit 0: all
-// Per record of `view` in `book_id` its latest change after `version`, as _calendar_updated_info records in version
-// order; a record inserted and later updated is still "inserted", inserted and deleted in between is nothing.
+// Per record of `view` in `book_id` its latest change after `version`, as _calendar_updated_info records in
+// version order; a record inserted and later updated is still "inserted", inserted and deleted in between is
+// nothing, unless the sync engine wrote it (it has seen what it wrote, and must learn of the deletion).
 // Exceptions are never listed. `current_version` is the store's version of the same snapshot.
 [[nodiscard]] int calendar_db_get_changes_by_version(const char* view, int book_id, int version,
                                                      calendar_list_h* out, int* current_version);

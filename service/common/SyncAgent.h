@@ -86,6 +86,7 @@ protected:
     Account* mpAccount;
 
 private:
+    friend struct SyncAgentProbe;  // lets a test put an agent into any state
     struct IdleRequest;
 
     // The caller holds mMutex.

@@ -4,6 +4,7 @@
 #include <stdlib.h>
 
 #include <filesystem>
+#include <fstream>
 #include <string>
 
 class TestRoot {
@@ -14,6 +15,9 @@ public:
         for (const char* folder : {"tmp", "opt/usr/dbspace", "opt/usr/data/vantor-pim-sync",
                                    "opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted"}) {
             std::filesystem::create_directories(mPath / folder);
+        }
+        for (const char* file : {".notificationPathCalendar", ".notificationPathContacts"}) {
+            std::ofstream(mPath / "opt/usr/data/vantor-pim-sync" / file);
         }
         setenv("VANTOR_PIM_SYNC_ROOT", mPath.c_str(), 1);
     }

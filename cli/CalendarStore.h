@@ -1,0 +1,56 @@
+// CalendarStore.h: the device's calendar store as the commands need it. Works whether the daemon runs or not.
+#pragma once
+
+#include <optional>
+#include <span>
+#include <string>
+#include <vector>
+
+#include "platform/calendar.h"
+
+// One event of the store; the list that it came in owns it.
+class FoundEvent {
+public:
+    FoundEvent(CalendarList list, calendar_record_h record) : mList(std::move(list)), mpRecord(record) {}
+    [[nodiscard]] calendar_record_h get() const { return mpRecord; }
+
+private:
+    CalendarList mList;
+    calendar_record_h mpRecord;
+};
+
+// Open while the object lives.
+class CalendarStore {
+public:
+    CalendarStore();
+    ~CalendarStore();
+    CalendarStore(const CalendarStore&) = delete;
+    CalendarStore& operator=(const CalendarStore&) = delete;
+
+    struct Filter {
+        unsigned property;
+        int value;
+    };
+    // The records of `view` that meet all filters, by ascending `sortBy`. An empty projection reads everything.
+    static CalendarList find(const char* view, const std::vector<Filter>& filters, unsigned sortBy,
+                             std::span<const unsigned> projection = {});
+    static CalendarList calendars(std::optional<int> account);
+    // A Failure when there is none.
+    static CalendarRecord calendar(int id);
+    static FoundEvent event(int id, std::span<const unsigned> projection);
+    // A Failure when the calendar is missing, is none of events, or is read-only.
+    static void checkWritable(int calendarId);
+};
+
+// A transaction of the store: undone unless commit() was reached.
+class CalendarTransaction {
+public:
+    CalendarTransaction();
+    ~CalendarTransaction();
+    CalendarTransaction(const CalendarTransaction&) = delete;
+    CalendarTransaction& operator=(const CalendarTransaction&) = delete;
+    void commit();
+
+private:
+    bool mIsOpen = true;
+};

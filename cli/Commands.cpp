@@ -1,0 +1,182 @@
+#include "Commands.h"
+
+#include <charconv>
+#include <cstdio>
+#include <map>
+
+#include "Failure.h"
+#include "Output.h"
+
+namespace {
+
+constexpr const char* kProgram = "vantor-pim-syncctl";
+
+struct Noun {
+    const char* name;
+    const char* summary;
+};
+// Nouns with verbs below them.
+constexpr Noun kNouns[] = {
+    {"key", "Secrets of this device"},
+    {"setting", "Settings of this device"},
+    {"account", "Accounts that are kept in step"},
+    {"daemon", "The daemon of a private root folder"},
+    {"calendars", "Calendars of this device"},
+    {"events", "Events of this device"},
+    {"event", "One event"},
+};
+
+constexpr Command kCommands[] = {
+    {"init", nullptr, "Make the folders, notification files and stores of this root", "init", buildInit},
+    {"key", "set", "Store a secret that is read from standard input", "key set client_id < client-id.txt",
+     buildKeySet},
+    {"setting", "get", "Print a setting", "setting get db/account/auto_sync", buildSettingGet},
+    {"setting", "set", "Store a setting (a whole number, true or false, or a text)",
+     "setting set db/account/auto_sync 1\nsetting set db/vantor-pim-sync/token_server https://token.example",
+     buildSettingSet},
+    {"account", "add", "Register an account and keep it in step",
+     "account add --id 7 --email me@example.com --server https://pim.example --refresh-token-file token.txt\n"
+     "account add --id 7 --email me@example.com --server http://127.0.0.1:8080 --refresh-token-file - < "
+     "token.txt",
+     buildAccountAdd},
+    {"account", "list", "List the accounts", "account list\naccount list --json", buildAccountList},
+    {"account", "show", "Show one account", "account show 7", buildAccountShow},
+    {"account", "update", "Change an account; what is not named stays as it is",
+     "account update 7 --calendar-period 30\naccount update 7 --refresh-token-file token.txt",
+     buildAccountUpdate},
+    {"account", "remove", "Stop an account's syncs and remove it with its data on this device",
+     "account remove 7", buildAccountRemove},
+    {"sync", nullptr, "Bring both sides together now", "sync 7\nsync 7 calendar --wait", buildSync},
+    {"stop", nullptr, "Stop a running sync", "stop 7\nstop 7 calendar", buildStop},
+    {"status", nullptr, "Show how the syncs stand", "status\nstatus 7 --json", buildStatus},
+    {"daemon", "start", "Start the daemon and wait until it answers", "daemon start", buildDaemonStart},
+    {"daemon", "stop", "End the daemon and wait until it is gone", "daemon stop", buildDaemonStop},
+    {"daemon", "status", "Tell whether the daemon answers (exit status 0) or not (1)",
+     "daemon status\ndaemon status --json", buildDaemonStatus},
+    {"calendars", "list", "List calendars", "calendars list\ncalendars list --account 7 --json",
+     buildCalendarsList},
+    {"events", "list", "List events", "events list --calendar 3\nevents list --account 7 --json",
+     buildEventsList},
+    {"event", "show", "Show one event", "event show 12\nevent show 12 --json > event.json", buildEventShow},
+    {"event", "add", "Add the event of a JSON file",
+     "event add event.json\nevent add --calendar 3 - < event.json", buildEventAdd},
+    {"event", "set", "Change fields of an event",
+     "event set 12 summary=Lunch location=Canteen\nevent set 12 start=2014-05-01T10:00:00Z "
+     "end=2014-05-01T11:00:00Z",
+     buildEventSet},
+    {"event", "delete", "Delete an event, a series, or one changed instance of a series", "event delete 12",
+     buildEventDelete},
+};
+
+std::string examplesOf(const Command& command) {
+    std::string text = std::string("Examples:\n  ") + kProgram + " ";
+    for (const char* at = command.examples; *at != '\0'; ++at) {
+        text += *at;
+        if (*at == '\n') text += std::string("  ") + kProgram + " ";
+    }
+    return text;
+}
+
+constexpr const char* kMainExamples =
+    "Examples:\n"
+    "  vantor-pim-syncctl init\n"
+    "  vantor-pim-syncctl account add --id 7 --email me@example.com --server https://pim.example \\\n"
+    "      --refresh-token-file token.txt\n"
+    "  vantor-pim-syncctl sync 7 --wait\n"
+    "  vantor-pim-syncctl events list\n\n"
+    "Exit status: 0 done, 1 failed, 2 misused. VANTOR_PIM_SYNC_ROOT names the root folder of a private "
+    "device.";
+
+void declare(CLI::App& app, Action& chosen) {
+    app.require_subcommand(1);
+    app.footer(kMainExamples);
+    app.set_version_flag("--version", VPS_VERSION);
+    std::map<std::string, CLI::App*> nouns;
+    for (const Noun& noun : kNouns) {
+        nouns[noun.name] = app.add_subcommand(noun.name, noun.summary);
+        nouns[noun.name]->require_subcommand(1);
+    }
+    std::map<std::string, std::string> nounExamples;
+    for (const Command& command : kCommands) {
+        CLI::App* sub = command.verb == nullptr
+                            ? app.add_subcommand(command.noun, command.summary)
+                            : nouns[command.noun]->add_subcommand(command.verb, command.summary);
+        sub->footer(examplesOf(command));
+        if (command.verb != nullptr) {
+            std::string& examples = nounExamples[command.noun];
+            examples +=
+                examplesOf(command).substr(examples.empty() ? 0 : std::string("Examples:\n").size()) + "\n";
+        }
+        sub->callback([&chosen, action = command.build(*sub)] { chosen = action; });
+    }
+    for (const auto& [noun, examples] : nounExamples) nouns[noun]->footer(examples);
+}
+
+int complain(std::string_view problem, int status) {
+    std::fprintf(stderr, "%s: %s\n", kProgram, output::printable(problem).c_str());
+    return status;
+}
+
+int parse(CLI::App& app, int argc, const char* const* argv) {
+    try {
+        app.parse(argc, argv);
+        return kExitDone;
+    } catch (const CLI::Success& wanted) {  // --help, --version
+        app.exit(wanted);
+        return kExitDone;
+    } catch (const CLI::ParseError& error) {
+        return complain(std::string(error.what()) + " (see --help)", kExitMisused);
+    }
+}
+
+}  // namespace
+
+namespace command {
+
+bool readNumber(const std::string& text, int least, int most, int* out) {
+    int value = 0;
+    const char* end = text.data() + text.size();
+    const auto [stop, error] = std::from_chars(text.data(), end, value);
+    if (text.empty() || error != std::errc() || stop != end || value < least || value > most) return false;
+    *out = value;
+    return true;
+}
+
+CLI::Option* addNumber(CLI::App& app, const std::string& name, int& value, int least, int most,
+                       const std::string& help) {
+    const auto read = [&value, least, most, name](const std::string& text) {
+        if (readNumber(text, least, most, &value)) return;
+        throw CLI::ValidationError(name, "\"" + text + "\" is not a whole number from " +
+                                             std::to_string(least) + " to " + std::to_string(most));
+    };
+    return app.add_option_function<std::string>(name, read, help);
+}
+
+CLI::Option* addId(CLI::App& app, const std::string& name, int& id, const std::string& help) {
+    return addNumber(app, name, id, 1, INT32_MAX, help);
+}
+
+CLI::Option* addJson(CLI::App& app, bool& isJson) {
+    return app.add_flag("--json", isJson, "Print JSON for scripts");
+}
+
+}  // namespace command
+
+std::span<const Command> allCommands() {
+    return kCommands;
+}
+
+int runCommandLine(int argc, const char* const* argv) {
+    CLI::App app("Keeps calendars of this device in step with an account's services.", kProgram);
+    Action chosen;
+    try {
+        declare(app, chosen);
+        const int status = parse(app, argc, argv);
+        if (status != kExitDone || !chosen) return status;
+        return chosen();
+    } catch (const Misuse& problem) {
+        return complain(problem.what(), kExitMisused);
+    } catch (const std::exception& problem) {
+        return complain(problem.what(), kExitFailed);
+    }
+}

@@ -1,0 +1,17 @@
+// Device.h: what a root folder needs before the daemon can work in it.
+#pragma once
+
+namespace device {
+
+// Makes the folders, the notification files and the stores that are missing; what is there stays as it is.
+void prepare();
+
+// Whether a root folder of its own is set (VANTOR_PIM_SYNC_ROOT), so that the tool may start and end its daemon.
+bool isPrivate();
+
+inline constexpr const char* kDataFolder = "/opt/usr/data/vantor-pim-sync";
+inline constexpr const char* kStoreFolder = "/opt/usr/dbspace";
+inline constexpr const char* kTrustedFolder =
+    "/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted";
+
+}  // namespace device

@@ -1,0 +1,50 @@
+// EventJson.h: an event record as the JSON that scripts rely on, and back. What compose() gives, parse() takes; a
+// text of another shape is a Failure that names the member.
+#pragma once
+
+#include <optional>
+#include <span>
+#include <string>
+#include <string_view>
+
+#include "Names.h"
+#include "Output.h"
+#include "platform/calendar.h"
+
+namespace event_json {
+
+enum class FieldKind { kText, kZone, kTime, kWord, kFlag, kRule };
+
+// A field with one value, which `event set` can write.
+struct ScalarField {
+    std::string_view name;
+    FieldKind kind;
+    unsigned property;  // of the event view; of a rule its frequency
+    std::span<const NameOf> words;
+};
+
+// NULL for a name that is no scalar field.
+const ScalarField* findScalar(std::string_view name);
+
+// Every field of the documented table, always.
+Json compose(calendar_record_h event);
+// What compose() reads, for a query that reads no more.
+std::span<const unsigned> projection();
+// What `event set` reads and writes.
+std::span<const unsigned> scalarProjection();
+
+// An event of a file. The record has everything but its place (book, series); id and uid of the file are not used:
+// the copy of an event is an event of its own.
+struct NewEvent {
+    CalendarRecord record;
+    std::optional<int> calendar;
+    std::optional<int> originalEvent;
+    std::string recurrenceId;
+};
+NewEvent parse(const Json& object);
+
+void setScalar(calendar_record_h event, const ScalarField& field, const std::string& text);
+// What holds between fields: all-day events have two dates, no event ends before its start.
+void checkTimes(calendar_record_h event);
+
+}  // namespace event_json

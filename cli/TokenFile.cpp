@@ -1,0 +1,95 @@
+#include "TokenFile.h"
+
+#include <fcntl.h>
+#include <sys/stat.h>
+
+#include <array>
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
+
+#include "Device.h"
+#include "Failure.h"
+#include "Handles.h"
+#include "platform/root.h"
+
+namespace token_file {
+
+namespace {
+
+constexpr mode_t kMode = 0600;
+constexpr size_t kMostBytes = 64 * 1024;
+
+std::string nameOf(int accountId) {
+    return std::to_string(accountId) + "_file";
+}
+
+[[noreturn]] void fail(const std::string& name, const char* what) {
+    const int error = errno;
+    throw Failure("the token file " + platform::rootedPath(device::kTrustedFolder) + "/" + name +
+                  " cannot be " + what + ": " + std::strerror(error));
+}
+
+// -1 when the folder is not there.
+Descriptor openFolder() {
+    const std::string path = platform::rootedPath(device::kTrustedFolder);
+    Descriptor folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
+    if (!folder && errno != ENOENT) throw Failure(path + " cannot be opened: " + std::strerror(errno));
+    return folder;
+}
+
+bool writeAll(int fd, const std::string& text) {
+    for (size_t at = 0; at < text.size();) {
+        const ssize_t put = ::write(fd, text.data() + at, text.size() - at);
+        if (put < 0 && errno == EINTR) continue;
+        if (put <= 0) return false;
+        at += static_cast<size_t>(put);
+    }
+    return fsync(fd) == 0;
+}
+
+}  // namespace
+
+std::optional<std::string> read(int accountId) {
+    const std::string name = nameOf(accountId);
+    const Descriptor folder = openFolder();
+    if (!folder) return std::nullopt;
+    const Descriptor file(openat(folder.get(), name.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+    if (!file && errno == ENOENT) return std::nullopt;
+    struct stat info {};
+    if (!file || fstat(file.get(), &info) != 0) fail(name, "read");
+    if (!S_ISREG(info.st_mode)) throw Failure("the token file " + name + " is no plain file; move it away");
+    std::string token(kMostBytes, '\0');
+    const ssize_t got = ::read(file.get(), token.data(), token.size());
+    if (got < 0) fail(name, "read");
+    token.resize(static_cast<size_t>(got));
+    if (token.ends_with('\n')) token.pop_back();
+    if (token.ends_with('\r')) token.pop_back();
+    return token;
+}
+
+void write(int accountId, const std::string& token) {
+    const std::string name = nameOf(accountId);
+    const std::string fresh = "." + name + "." + std::to_string(getpid());
+    const Descriptor folder = openFolder();
+    if (!folder) fail(name, "written");
+    const Descriptor file(
+        openat(folder.get(), fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, kMode));
+    if (!file) fail(name, "written");
+    if (!writeAll(file.get(), token) ||
+        renameat(folder.get(), fresh.c_str(), folder.get(), name.c_str()) != 0) {
+        const int error = errno;
+        unlinkat(folder.get(), fresh.c_str(), 0);
+        errno = error;
+        fail(name, "written");
+    }
+    fsync(folder.get());
+}
+
+void remove(int accountId) {
+    const std::string name = nameOf(accountId);
+    const Descriptor folder = openFolder();
+    if (folder && unlinkat(folder.get(), name.c_str(), 0) != 0 && errno != ENOENT) fail(name, "removed");
+}
+
+}  // namespace token_file

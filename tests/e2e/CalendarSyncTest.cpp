@@ -142,7 +142,8 @@ TEST(CalendarSync, AFaultOfTheServerLosesNothing) {
     const std::vector<Fault> faults = {
         {"500 on a page", {{"kind", "status"}, {"status", 500}, {"path", kEventPages}}, 1},
         {"403 on the list", {{"kind", "status"}, {"status", 403}, {"path", "calendarList"}}, 1},
-        {"a reset connection", {{"kind", "reset"}, {"path", kEventPages}}, 1},
+        // libcurl asks once more by itself when a kept connection is reset; a read may be asked twice.
+        {"reset connections", {{"kind", "reset"}, {"count", 2}, {"path", kEventPages}}, 1},
         {"a body cut short", {{"kind", "cut"}, {"path", kEventPages}}, 1},
         {"gzip that is broken", {{"kind", "corrupt-gzip"}, {"path", kEventPages}}, 1},
         {"no JSON", {{"kind", "body"}, {"body", "<html>"}, {"path", kEventPages}}, 1},

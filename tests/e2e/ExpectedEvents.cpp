@@ -78,7 +78,7 @@ Json expectedEvent(const Json& wire) {
                   {"originalEvent", nullptr},
                   {"recurrenceId", ""}};
     const std::string visibility = wire.value("visibility", "default");
-    event["visibility"] = visibility == "confidential" ? "default" : visibility;
+    event["visibility"] = visibility == "private" ? "private" : "default";
     for (const Json& attendee : wire.value("attendees", Json::array()))
         event["attendees"].push_back(personOf(attendee));
     for (const Json& reminder : wire.value("reminders", Json::object()).value("overrides", Json::array())) {

@@ -68,13 +68,22 @@ constexpr Command kCommands[] = {
      buildEventDelete},
 };
 
+const std::string kExamplesTitle = "Examples:\n";
+
 std::string examplesOf(const Command& command) {
-    std::string text = std::string("Examples:\n  ") + kProgram + " ";
+    std::string text = std::string("  ") + kProgram + " ";
     for (const char* at = command.examples; *at != '\0'; ++at) {
         text += *at;
         if (*at == '\n') text += std::string("  ") + kProgram + " ";
     }
     return text;
+}
+
+const char* summaryOf(const std::string& name) {
+    for (const Noun& noun : kNouns) {
+        if (name == noun.name) return noun.summary;
+    }
+    return "";
 }
 
 constexpr const char* kMainExamples =
@@ -92,29 +101,35 @@ void declare(CLI::App& app, Action& chosen) {
     app.footer(kMainExamples);
     app.set_version_flag("--version", VPS_VERSION);
     std::map<std::string, CLI::App*> nouns;
-    for (const Noun& noun : kNouns) {
-        nouns[noun.name] = app.add_subcommand(noun.name, noun.summary);
-        nouns[noun.name]->require_subcommand(1);
-    }
     std::map<std::string, std::string> nounExamples;
     for (const Command& command : kCommands) {
+        if (command.verb != nullptr && !nouns.contains(command.noun)) {
+            nouns[command.noun] = app.add_subcommand(command.noun, summaryOf(command.noun));
+            nouns[command.noun]->require_subcommand(1);
+        }
         CLI::App* sub = command.verb == nullptr
                             ? app.add_subcommand(command.noun, command.summary)
                             : nouns[command.noun]->add_subcommand(command.verb, command.summary);
-        sub->footer(examplesOf(command));
-        if (command.verb != nullptr) {
-            std::string& examples = nounExamples[command.noun];
-            examples +=
-                examplesOf(command).substr(examples.empty() ? 0 : std::string("Examples:\n").size()) + "\n";
-        }
+        sub->footer(kExamplesTitle + examplesOf(command));
+        if (command.verb != nullptr) nounExamples[command.noun] += "\n" + examplesOf(command);
         sub->callback([&chosen, action = command.build(*sub)] { chosen = action; });
     }
-    for (const auto& [noun, examples] : nounExamples) nouns[noun]->footer(examples);
+    for (const auto& [noun, examples] : nounExamples)
+        nouns[noun]->footer(kExamplesTitle + examples.substr(1));
 }
 
 int complain(std::string_view problem, int status) {
     std::fprintf(stderr, "%s: %s\n", kProgram, output::printable(problem).c_str());
     return status;
+}
+
+// A word that is no command is named; the parser itself only misses a command.
+std::string describe(const CLI::App& app, const CLI::ParseError& error) {
+    const std::vector<std::string> rest = app.remaining(/*recurse=*/true);
+    const bool isUnknown =
+        error.get_exit_code() == static_cast<int>(CLI::ExitCodes::RequiredError) && !rest.empty();
+    return (isUnknown ? "\"" + rest.front() + "\" is no command" : std::string(error.what())) +
+           " (see --help)";
 }
 
 int parse(CLI::App& app, int argc, const char* const* argv) {
@@ -125,7 +140,7 @@ int parse(CLI::App& app, int argc, const char* const* argv) {
         app.exit(wanted);
         return kExitDone;
     } catch (const CLI::ParseError& error) {
-        return complain(std::string(error.what()) + " (see --help)", kExitMisused);
+        return complain(describe(app, error), kExitMisused);
     }
 }
 

@@ -15,7 +15,7 @@ ReadOnlyDatabase::ReadOnlyDatabase(const char* path) : mPath(platform::rootedPat
     // connection; query_only keeps our own statements from writing.
     for (const int mode : {SQLITE_OPEN_READWRITE, SQLITE_OPEN_READONLY}) {
         sqlite3* handle = nullptr;
-        const int code = sqlite3_open_v2(mPath.c_str(), &handle, mode | SQLITE_OPEN_NOFOLLOW, nullptr);
+        const int code = sqlite3_open_v2(mPath.c_str(), &handle, mode, nullptr);
         mHandle.reset(handle);
         if (code == SQLITE_OK) break;
     }

@@ -84,6 +84,9 @@ Action buildSettingSet(CLI::App& app) {
     app.allow_extras();  // a negative number looks like an option
     return [options, &app] {
         std::vector<std::string> values = app.remaining();
+        for (const std::string& text : values) {
+            if (!isWholeNumber(text)) throw Misuse("\"" + text + "\" is not expected (see --help)");
+        }
         if (app.count("VALUE") > 0) values.push_back(options->value);
         if (values.size() != 1) throw Misuse("setting set takes a KEY and one VALUE (see --help)");
         const int code = write(options->key, values.front());

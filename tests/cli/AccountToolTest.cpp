@@ -55,7 +55,7 @@ TEST(AccountTool, AnAddThatFailsLeavesWhatWasThereBefore) {
         {"no daemon, known account", nullptr, "former", "neither beside"},
         {"daemon ends, new account", "exit 3", nullptr, "exit status 3"},
         {"daemon ends, known account", "kill -9 $$", "former", "signal 9"},
-        {"daemon cannot be run", "", nullptr, "ended at its start"},
+        {"daemon ends well", "", nullptr, "ended at its start"},
     };
     for (const RollbackRow& row : rows) {
         SCOPED_TRACE(row.name);

@@ -75,6 +75,9 @@ std::string waitFor(SyncWait& wait, int account, vantor_pim_sync_type_e kind, in
         output::progress(sync_client::kindName(kind) + ": in step");
         return {};
     }
+    if (sync_client::state(account, kind) == SYNC_AGENT_STATE_UNAVAILABLE) {
+        return sync_client::refusal(state.downResult(), account, kind);
+    }
     const std::string text = state.failure();
     return text.empty() ? "the sync failed (download " + std::to_string(state.downResult()) + ", upload " +
                               std::to_string(state.upResult()) + "); the daemon's log tells why"
@@ -117,7 +120,7 @@ void stop(const Options& options) {
     daemon_link::requireRunning();
     for (const vantor_pim_sync_type_e kind : kindsOf(options)) {
         const int code = vantor_pim_sync_stop(options.account, kind);
-        const bool isIdle = sync_client::state(options.account, kind) == SYNC_AGENT_STATE_READY;
+        const bool isIdle = sync_client::state(options.account, kind) != SYNC_AGENT_STATE_IN_PROGRESS;
         const AccountRecord record = sync_client::account(options.account);
         const bool isOn =
             record != nullptr && (kind == VANTOR_PIM_SYNC_TYPE_CALENDAR ? record->calsync : record->ctsync);

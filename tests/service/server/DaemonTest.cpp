@@ -1,0 +1,231 @@
+// The daemon program over its socket: the commands, bad clients, its life and death.
+#include <gtest/gtest.h>
+#include <signal.h>
+#include <sys/socket.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <fstream>
+#include <memory>
+#include <thread>
+
+#include "common/AccountDBHelper.h"
+#include "common/vantor_pim_sync_ipc_marshal.h"
+#include "e2e/Process.h"
+#include "platform/account.h"
+#include "platform/error.h"
+#include "platform/root.h"
+#include "platform/settings.h"
+#include "support/TestRoot.h"
+
+namespace {
+
+constexpr const char* kPackage = "com.morvane.vantor-service-account-lite";
+
+struct Destroy {
+    void operator()(pims_ipc_s* ipc) const noexcept { pims_ipc_destroy(ipc); }
+    void operator()(pims_ipc_data_s* data) const noexcept { pims_ipc_data_destroy(data); }
+};
+using Ipc = std::unique_ptr<pims_ipc_s, Destroy>;
+using Data = std::unique_ptr<pims_ipc_data_s, Destroy>;
+
+class Daemon {
+public:
+    explicit Daemon(const TestRoot& root) : mLog(root.path() / "daemon.log") { start(); }
+    void start() {
+        process = std::make_unique<Process>(std::vector<std::string>{VPS_BIN_DIR "/vantor-pim-sync"},
+                                            Environment{}, mLog);
+    }
+    // A connection once the daemon answers.
+    Ipc connect() {
+        for (int i = 0; i < 2000 && !process->wait(0); ++i) {
+            pims_ipc_h ipc = nullptr;
+            if (pims_ipc_create(kServiceSocket, &ipc) == 0) return Ipc(ipc);
+            std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        }
+        return nullptr;
+    }
+    [[nodiscard]] std::string log() const {
+        std::ifstream file(mLog);
+        return {std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
+    }
+    std::unique_ptr<Process> process;
+
+private:
+    std::string mLog;
+};
+
+void addAccount(const TestRoot& root, int id) {
+    ASSERT_EQ(account_insert(id, kPackage, "me@x"), 0);
+    std::ofstream(root.at("/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted/") /
+                  (std::to_string(id) + "_file"))
+        << "token";
+}
+
+// The sizes and first int of a reply's items.
+struct Reply {
+    int code = 0;
+    std::vector<int> numbers;
+    bool operator==(const Reply&) const = default;
+};
+
+Reply call(pims_ipc_h ipc, const char* command, const std::vector<int>& arguments,
+           const char* module = kServiceModule) {
+    const Data request(pims_ipc_data_create_with_size(64, 0));
+    for (const int argument : arguments)
+        EXPECT_EQ(vantor_pim_sync_ipc_marshal_int(argument, request.get()), 0);
+    pims_ipc_data_h raw = nullptr;
+    Reply reply;
+    reply.code = pims_ipc_call(ipc, module, command, request.get(), &raw, 10'000);
+    const Data data(raw);
+    int number = 0;
+    while (raw != nullptr && vantor_pim_sync_ipc_unmarshal_int(raw, &number) == 0)
+        reply.numbers.push_back(number);
+    return reply;
+}
+
+int rawConnection() {
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    const std::string path = platform::rootedPath(kServiceSocket);
+    path.copy(address.sun_path, sizeof address.sun_path - 1);
+    const int fd = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    EXPECT_EQ(connect(fd, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+    return fd;
+}
+
+}  // namespace
+
+TEST(Daemon, AnswersTheEightCommands) {
+    const TestRoot root;
+    addAccount(root, 7);
+    Daemon daemon(root);
+    const Ipc ipc = daemon.connect();
+    ASSERT_TRUE(ipc) << daemon.log();
+    for (const char* command : {"add_account", "remove_account", "update_account", "get_account", "start",
+                                "stop", "get_state", "get_sync_time"}) {
+        EXPECT_EQ(call(ipc.get(), command, {}), (Reply{0, {0}})) << command << " without data runs nothing";
+    }
+    struct Row {
+        const char* command;
+        std::vector<int> arguments;
+        std::vector<int> reply;
+    };
+    for (const Row& row :
+         {Row{"get_state", {7}, {-1}}, Row{"get_sync_time", {7}, {-1}}, Row{"add_account", {7}, {-1}},
+          Row{"get_account", {99}, {-1}}, Row{"get_state", {99, 0}, {0, 0}}, Row{"get_state", {7, 5}, {0, 0}},
+          Row{"start", {99, 0}, {-1}}, Row{"stop", {7, 0}, {-1}}, Row{"remove_account", {99}, {-1}}}) {
+        EXPECT_EQ(call(ipc.get(), row.command, row.arguments).numbers, row.reply) << row.command;
+    }
+    EXPECT_EQ(call(ipc.get(), "get_nothing", {1}).code, PLATFORM_ERROR_NOT_FOUND);
+    EXPECT_EQ(call(ipc.get(), "start", {7, 0}, "other_module").code, PLATFORM_ERROR_NOT_FOUND);
+
+    // An account: added, told, switched off, refused.
+    std::string server = "127.0.0.1";
+    vantor_pim_sync_account_s account{};
+    account.account_id = 7;
+    account.calsync = true;
+    account.calserver = server.data();
+    const auto send = [&](const char* command) {
+        const Data request(pims_ipc_data_create_with_size(64, 0));
+        EXPECT_EQ(vantor_pim_sync_ipc_marshal_sync_account(&account, request.get()), 0);
+        pims_ipc_data_h raw = nullptr;
+        EXPECT_EQ(pims_ipc_call(ipc.get(), kServiceModule, command, request.get(), &raw, 10'000), 0);
+        const Data reply(raw);
+        int result = -99;
+        EXPECT_EQ(vantor_pim_sync_ipc_unmarshal_int(raw, &result), 0);
+        return result;
+    };
+    EXPECT_EQ(send("update_account"), -1);
+    EXPECT_EQ(send("add_account"), 0);
+    EXPECT_EQ(send("add_account"), -1);
+    EXPECT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers, (std::vector<int>{0, 1}));
+    account.calsync = false;
+    EXPECT_EQ(send("update_account"), 0);
+    EXPECT_EQ(call(ipc.get(), "start", {7, 0}).numbers, std::vector<int>{-1});
+    EXPECT_NE(daemon.log().find("The sync option for calendar is disabled"), std::string::npos);
+    EXPECT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers, (std::vector<int>{0, 1})) << "the agent stays";
+    EXPECT_EQ(call(ipc.get(), "remove_account", {7}).numbers, std::vector<int>{0});
+    EXPECT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers, (std::vector<int>{0, 0}));
+}
+
+TEST(Daemon, BadClientsDisturbNobody) {
+    const TestRoot root;
+    addAccount(root, 7);
+    Daemon daemon(root);
+    const Ipc ipc = daemon.connect();
+    ASSERT_TRUE(ipc);
+    std::vector<int> silent;
+    for (int i = 0; i < 200; ++i) silent.push_back(rawConnection());
+    for (const std::string& bytes :
+         {std::string("\xff\xff\xff\xff", 4), std::string("\4\0\0\0\1\0\0\0", 8),
+          std::string("\10\0\0\0\1\0\0\0\xff\xff\xff\x7f", 12), std::string("\0\0\0\0", 4)}) {
+        const int fd = rawConnection();
+        EXPECT_EQ(write(fd, bytes.data(), bytes.size()), static_cast<ssize_t>(bytes.size()));
+        char byte = 0;
+        EXPECT_EQ(read(fd, &byte, 1), 0) << "disconnected";
+        close(fd);
+    }
+    EXPECT_EQ(write(silent[0], "\x20", 1), 1);  // half a length, for ever
+    EXPECT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers.size(), 2U);
+    for (const int fd : silent) close(fd);
+}
+
+TEST(Daemon, LivesAndDies) {
+    const TestRoot root;
+    {
+        Daemon none(root);
+        EXPECT_EQ(none.process->wait(5000), 0) << "no account, nothing to do";
+    }
+    addAccount(root, 7);
+    Daemon daemon(root);
+    ASSERT_TRUE(daemon.connect());
+    {
+        Daemon second(root);
+        EXPECT_EQ(second.process->wait(5000), 0);
+        EXPECT_NE(second.log().find("pims_ipc_svc_register error"), std::string::npos);
+    }
+    ASSERT_TRUE(daemon.connect()) << "the first one still serves";
+    daemon.process->kill(SIGKILL);
+    EXPECT_EQ(daemon.process->wait(5000), 128 + SIGKILL);
+    daemon.start();
+    ASSERT_TRUE(daemon.connect()) << "the socket was stale";
+    daemon.process->kill(SIGTERM);
+    EXPECT_EQ(daemon.process->wait(3000), 0);
+    EXPECT_FALSE(std::filesystem::exists(root.at(kServiceSocket)));
+}
+
+TEST(Daemon, StartsWithWhatTheDeviceStillHas) {
+    const TestRoot root;
+    addAccount(root, 7);
+    addAccount(root, 8);
+    vantor_pim_sync_account_s account{};
+    account.calsync = true;
+    for (account.account_id = 7; account.account_id <= 9; ++account.account_id) {
+        ASSERT_EQ(AccountDBHelper::getInstance().insertAccount(Account(account)), 0);
+    }
+    Daemon daemon(root);
+    const Ipc ipc = daemon.connect();
+    ASSERT_TRUE(ipc) << daemon.log();
+    EXPECT_EQ(call(ipc.get(), "get_state", {8, 0}).numbers, (std::vector<int>{0, 1}));
+    EXPECT_EQ(call(ipc.get(), "get_account", {9}).numbers, std::vector<int>{-1});
+    EXPECT_NE(daemon.log().find("removed account[9]"), std::string::npos);
+
+    daemon.process->kill(SIGTERM);
+    EXPECT_EQ(daemon.process->wait(3000), 0);
+    std::filesystem::remove(
+        root.at("/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted/8_file"));
+    daemon.start();
+    EXPECT_EQ(daemon.process->wait(5000), 128 + SIGABRT) << "it cannot run without an account's token";
+    EXPECT_NE(daemon.log().find("account 8 has no readable refresh token"), std::string::npos);
+}
+
+TEST(Daemon, ARootThatIsTooLongIsToldPlainly) {
+    const TestRoot root;
+    const std::filesystem::path deep = root.path() / std::string(100, 'd');
+    std::filesystem::create_directories(deep);
+    setenv("VANTOR_PIM_SYNC_ROOT", deep.c_str(), 1);
+    Daemon daemon(root);
+    EXPECT_EQ(daemon.process->wait(5000), 0);
+    EXPECT_NE(daemon.log().find("the root folder is too long"), std::string::npos);
+}

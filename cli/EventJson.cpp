@@ -329,7 +329,8 @@ const ScalarField* findScalar(std::string_view name) {
 }
 
 Json compose(calendar_record_h event) {
-    Json object;
+    Json object = Json::object();
+    object.get_ref<Json::object_t&>().reserve(std::size(kScalars) + std::size(kOthers));
     object["id"] = intOf(event, CALENDAR_EVENT_ID);
     object["calendar"] = intOf(event, CALENDAR_EVENT_BOOK_ID);
     object["uid"] = textOf(event, CALENDAR_EVENT_UID);

@@ -116,9 +116,19 @@ std::string folderOf(const std::string& key) {
 }
 
 std::optional<Value> read(const std::string& key) {
-    std::ifstream file(fileOf(key), std::ios::binary);
-    if (!file) return std::nullopt;
-    const std::string content{std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
+    const int fd = open(fileOf(key).c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK);
+    if (fd == -1) return std::nullopt;
+    std::string content;
+    struct stat info {};
+    // A folder of longer keys is no key, and nothing but a plain file is read.
+    if (fstat(fd, &info) == 0 && S_ISREG(info.st_mode)) {
+        char chunk[4096];
+        for (ssize_t count = 0; (count = ::read(fd, chunk, sizeof chunk)) > 0;) {
+            content.append(chunk, static_cast<size_t>(count));
+        }
+    }
+    close(fd);
+    if (!S_ISREG(info.st_mode)) return std::nullopt;
     std::optional<Value> value = parse(key, content);
     if (!value)
         dlog_print(DLOG_ERROR, kTag, "the file of %s is damaged, the key counts as unset", key.c_str());

@@ -44,8 +44,9 @@ int accountStatus(int id) {
     account_h account = nullptr;
     EXPECT_EQ(account_create(&account), 0);
     account_sync_state_e status = ACCOUNT_SYNC_INVALID;
-    if (account_query_account_by_account_id(id, &account) == 0)
+    if (account_query_account_by_account_id(id, &account) == 0) {
         EXPECT_EQ(account_get_sync_support(account, &status), 0);
+    }
     account_destroy(account);
     return status;
 }

@@ -80,6 +80,10 @@ public:
         if (fd < 0) return fd;
         mFd = fd;
         mPath = path;
+        // From here on clients can connect, so from here on a signal ends the service in order: at the latest when the
+        // loop begins to run.
+        mSignals[0] = g_unix_signal_add(SIGTERM, onSignal, this);
+        mSignals[1] = g_unix_signal_add(SIGINT, onSignal, this);
         struct stat info {};
         if (lstat(rootedPath(mPath).c_str(), &info) == 0) mInode = info.st_ino;
         listen();
@@ -96,19 +100,17 @@ public:
 
     void run(GMainLoop* loop) {
         const bool own = loop == nullptr;
-        if (own) loop = g_main_loop_new(nullptr, FALSE);
-        const guint terminated = g_unix_signal_add(SIGTERM, onSignal, loop);
-        const guint interrupted = g_unix_signal_add(SIGINT, onSignal, loop);
-        g_main_loop_run(loop);
-        g_source_remove(terminated);
-        g_source_remove(interrupted);
-        if (own) g_main_loop_unref(loop);
+        mLoop = own ? g_main_loop_new(nullptr, FALSE) : loop;
+        g_main_loop_run(mLoop);
+        if (own) g_main_loop_unref(mLoop);
+        mLoop = nullptr;
     }
 
     void shut() {
         mConnections.clear();
         if (mFd == -1) return;
         g_source_remove(mSource);
+        for (const guint signal : mSignals) g_source_remove(signal);
         close(mFd);
         mFd = -1;
         // Another process may have opened its own socket at the path meanwhile.
@@ -158,8 +160,9 @@ private:
 
     void listen() { mSource = g_unix_fd_add(mFd, G_IO_IN, onConnect, this); }
 
-    static gboolean onSignal(gpointer loop) {
-        g_main_loop_quit(static_cast<GMainLoop*>(loop));
+    static gboolean onSignal(gpointer self) {
+        GMainLoop* loop = static_cast<Service*>(self)->mLoop;
+        if (loop != nullptr) g_main_loop_quit(loop);
         return G_SOURCE_CONTINUE;
     }
 
@@ -194,6 +197,8 @@ private:
 
     int mFd = -1;
     guint mSource = 0;
+    guint mSignals[2] = {};
+    GMainLoop* mLoop = nullptr;
     std::string mPath;
     ino_t mInode = 0;
     std::map<std::pair<std::string, std::string>, Command> mCommands;

@@ -222,7 +222,8 @@ int CalDownSyncDirector::syncEventPage(const std::string& calendarUri, EventPage
     const CalEventWriter::Counts& counts = writer.counts();
     // What the sync wrote itself is examined now, so that no later look goes through it again.
     const bool wrote = counts.inserted + counts.updated + counts.deleted > 0;
-    if (wrote && CalDataManager::getInstance().setCalendarbookChanged(book.calendar_id) != kOk) written = kFailed;
+    if (wrote && CalDataManager::getInstance().setCalendarbookChanged(book.calendar_id) != kOk)
+        written = kFailed;
     SYNC_INFO("calendar(%s): %d inserted, %d updated, %d deleted", calendarUri.c_str(), counts.inserted,
               counts.updated, counts.deleted);
     return written == kOk

@@ -102,7 +102,12 @@ private:
     using MayWrite = std::function<bool(const Property& property, size_t index)>;
     [[nodiscard]] int writeColumns(Write& write, const View& view, int id, const Record& record, bool bySync,
                                    const MayWrite& mayWrite);
-    [[nodiscard]] int writeChildren(Record& record, int id, bool onlyPresent);
+    enum class ChildWrite {
+        kFirst,
+        kAlways,
+        kIfPresent
+    };  // of a new record, of every record, where read or set
+    [[nodiscard]] int writeChildren(Record& record, int id, ChildWrite how);
     [[nodiscard]] int load(const View& view, int id, Stored* stored);
     [[nodiscard]] int check(const View& view, int id, const Stored& stored, int expected);
     [[nodiscard]] int touchSeries(Write& write, const View& view, int seriesId);

@@ -126,16 +126,16 @@ int Store::insertRow(Write& write, Record& record, int bookId) {
     const auto id = static_cast<int>(mConnection.lastRowId());
     record.setNumber(view.idProperty, id);
     mTrusted.insert({&view, id});
-    return writeChildren(record, id, /*onlyPresent=*/false);
+    return writeChildren(record, id, ChildWrite::kFirst);
 }
 
 // Attendees, alarms and the like become those of the record.
-int Store::writeChildren(Record& record, int id, bool onlyPresent) {
+int Store::writeChildren(Record& record, int id, ChildWrite how) {
     const View& view = record.view();
     for (size_t i = 0; i < view.properties.size(); ++i) {
         const Property& property = view.properties[i];
         if (property.type != Type::kChildren || property.id == view.exceptionsProperty) continue;
-        if (onlyPresent && !record.isPresent(i)) continue;
+        if (how == ChildWrite::kIfPresent && !record.isPresent(i)) continue;
         const View& child = *viewOf(property.childView);
         Statement clear =
             mConnection.prepare(std::string("DELETE FROM ") + child.table + " WHERE parent = ?");
@@ -196,7 +196,7 @@ int Store::updateOne(Write& write, Record& record, int expected) {
             return record.isPresent(i) && !view.isFixed(property.id);
         });
     if (code != PLATFORM_ERROR_NONE) return code;
-    if (const int children = writeChildren(record, id, /*onlyPresent=*/true);
+    if (const int children = writeChildren(record, id, ChildWrite::kIfPresent);
         children != PLATFORM_ERROR_NONE) {
         return children;
     }
@@ -244,7 +244,7 @@ int Store::replaceOne(Write& write, Record& record, int id, int expected) {
             return !view.isFixed(property.id) && property.id != view.keptOnReplace;
         });
     if (code != PLATFORM_ERROR_NONE) return code;
-    if (const int children = writeChildren(record, id, /*onlyPresent=*/false);
+    if (const int children = writeChildren(record, id, ChildWrite::kAlways);
         children != PLATFORM_ERROR_NONE) {
         return children;
     }

@@ -11,6 +11,7 @@
 #include <fstream>
 #include <iterator>
 
+#include "ErrnoCode.h"
 #include "platform/error.h"
 #include "platform/log.h"
 #include "platform/root.h"
@@ -64,11 +65,6 @@ std::optional<Value> parse(const std::string& key, const std::string& content) {
     const auto [rest, error] = std::from_chars(value.text.data(), last, value.number);
     if (error != std::errc() || rest != last) return std::nullopt;
     return value;
-}
-
-int codeOf(int error) {
-    if (error == ENOSPC || error == EDQUOT) return PLATFORM_ERROR_NO_SPACE;
-    return error == EACCES || error == EROFS ? PLATFORM_ERROR_PERMISSION_DENIED : PLATFORM_ERROR_IO;
 }
 
 bool writeAll(int fd, const std::string& content) {
@@ -141,7 +137,7 @@ int write(const std::string& key, const Value& value) {
     const std::string folder = rootedPath(folderOf(key));
     std::string temporary = folder + "/.XXXXXX";
     const int fd = mkostemp(temporary.data(), O_CLOEXEC);
-    if (fd == -1) return codeOf(errno);
+    if (fd == -1) return codeOfErrno(errno);
     bool written = writeAll(fd, contentOf(key, value)) && fchmod(fd, 0644) == 0;
     if (written && !isMemory(key)) written = fsync(fd) == 0;
     int error = written ? 0 : errno;
@@ -149,7 +145,7 @@ int write(const std::string& key, const Value& value) {
     if (written && rename(temporary.c_str(), fileOf(key).c_str()) != 0) error = errno;
     if (error != 0) {
         unlink(temporary.c_str());
-        return codeOf(error);
+        return codeOfErrno(error);
     }
     if (!isMemory(key)) syncFolder(folder);
     return PLATFORM_ERROR_NONE;
@@ -157,7 +153,7 @@ int write(const std::string& key, const Value& value) {
 
 int remove(const std::string& key) {
     if (unlink(fileOf(key).c_str()) == 0 || errno == ENOENT || errno == ENOTDIR) return PLATFORM_ERROR_NONE;
-    return codeOf(errno);
+    return codeOfErrno(errno);
 }
 
 }  // namespace platform::settings

@@ -10,6 +10,7 @@
 #include <string>
 #include <string_view>
 
+#include "ErrnoCode.h"
 #include "platform/error.h"
 #include "platform/root.h"
 
@@ -29,23 +30,6 @@ std::string pathOf(const char* name) {
     return platform::rootedPath(std::string(kFolder) + "/" + name);
 }
 
-int codeOf(int error) {
-    switch (error) {
-        case ENOENT:
-        case ENOTDIR:
-            return PLATFORM_ERROR_NOT_FOUND;
-        case EACCES:
-        case EPERM:
-        case ELOOP:
-            return PLATFORM_ERROR_PERMISSION_DENIED;
-        case ENOSPC:
-        case EDQUOT:
-            return PLATFORM_ERROR_NO_SPACE;
-        default:
-            return PLATFORM_ERROR_IO;
-    }
-}
-
 // A key that others could read or exchange is not trusted.
 bool isPrivate(int fd) {
     struct stat info {};
@@ -58,7 +42,7 @@ bool isPrivate(int fd) {
 int key_storage_get(const char* name, char** value) {
     if (!isValidName(name) || value == nullptr) return PLATFORM_ERROR_INVALID_PARAMETER;
     const int fd = open(pathOf(name).c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK);
-    if (fd == -1) return codeOf(errno);
+    if (fd == -1) return platform::codeOfErrno(errno);
     if (!isPrivate(fd)) {
         close(fd);
         return PLATFORM_ERROR_PERMISSION_DENIED;
@@ -81,7 +65,7 @@ int key_storage_set(const char* name, const char* value) {
     if (const int code = platform::makeFolder(kFolder, 0700); code != PLATFORM_ERROR_NONE) return code;
     std::string temporary = platform::rootedPath(std::string(kFolder) + "/.XXXXXX");
     const int fd = mkostemp(temporary.data(), O_CLOEXEC);  // mode 0600
-    if (fd == -1) return codeOf(errno);
+    if (fd == -1) return platform::codeOfErrno(errno);
     errno = EIO;
     const bool written =
         write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) && fsync(fd) == 0;
@@ -90,5 +74,5 @@ int key_storage_set(const char* name, const char* value) {
     if (error == 0 && rename(temporary.c_str(), pathOf(name).c_str()) != 0) error = errno;
     if (error == 0) return PLATFORM_ERROR_NONE;
     unlink(temporary.c_str());
-    return codeOf(error);
+    return platform::codeOfErrno(error);
 }

@@ -5,6 +5,7 @@
 #include <cerrno>
 #include <cstdlib>
 
+#include "ErrnoCode.h"
 #include "platform/error.h"
 
 namespace platform {
@@ -20,34 +21,16 @@ std::string rootedPath(std::string_view absolute) {
     return rootFolder().append(absolute);
 }
 
-namespace {
-
-int codeOf(int error) {
-    switch (error) {
-        case EACCES:
-        case EPERM:
-        case EROFS:
-            return PLATFORM_ERROR_PERMISSION_DENIED;
-        case ENOSPC:
-        case EDQUOT:
-            return PLATFORM_ERROR_NO_SPACE;
-        default:
-            return PLATFORM_ERROR_IO;
-    }
-}
-
-}  // namespace
-
 int makeFolder(std::string_view absolute, unsigned mode) {
     const std::string path = rootedPath(absolute);
     for (size_t end = path.find('/', 1);; end = path.find('/', end + 1)) {
         const bool last = end == std::string::npos;
         const std::string part = path.substr(0, end);
-        if (mkdir(part.c_str(), last ? mode : 0755) != 0 && errno != EEXIST) return codeOf(errno);
+        if (mkdir(part.c_str(), last ? mode : 0755) != 0 && errno != EEXIST) return codeOfErrno(errno);
         if (last) break;
     }
     struct stat info {};
-    if (stat(path.c_str(), &info) != 0) return codeOf(errno);
+    if (stat(path.c_str(), &info) != 0) return codeOfErrno(errno);
     return S_ISDIR(info.st_mode) ? PLATFORM_ERROR_NONE : PLATFORM_ERROR_IO;
 }
 

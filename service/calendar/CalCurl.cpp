@@ -71,7 +71,7 @@ CalCurl::CalCurl(Account* account, IProgressObserver* observer, std::shared_ptr<
 }
 
 int CalCurl::checked(const char* operation, int result) {
-    if (result != kOk) SYNC_ERR("%s: performCurl fail(%d)", operation, result);
+    if (result != kOk) SYNC_ERR_AS(operation, "performCurl fail(%d)", result);
     return result;
 }
 

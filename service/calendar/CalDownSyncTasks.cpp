@@ -41,7 +41,8 @@ int CalRequestTask::fetch(const std::string& path, const char* unreadableText, L
     const int errorCode = parsed == kOk ? mParser.checkData() : 0;
     if (status < kHttpOkFirst || status > kHttpOkLast || errorCode != 0) {
         const long code = errorCode != 0 ? errorCode : status;
-        SYNC_ERR("CalCurl get fail(%d): the server answered %ld to %s", kFailed, code, path.c_str());
+        SYNC_ERR("CalCurl get fail(%d)", kFailed);
+        SYNC_ERR("the server answered %ld to %s", code, path.c_str());
         mFailure = "the server answered with error " + std::to_string(code);
         return kFailed;
     }

@@ -131,24 +131,39 @@ int CalEventWriter::writeRecords(CalPagePlan* plan, Batch* batch) {
     return kOk;
 }
 
+namespace {
+
+// Writes a bulk, as new records or over those it names, and tells `note(item, record id, version)` of each that was written.
+template <class Planned, class Note>
+int writeBulk(Bulk<Planned>* bulk, bool isNew, std::unordered_set<const void*>* skipped, Note note) {
+    if (bulk->empty()) return kOk;
+    const int code = isNew ? calendar_db_insert_records(bulk->list(), bulk->options())
+                           : calendar_db_replace_records(bulk->list(), bulk->ids().data(), bulk->ids().size(),
+                                                         bulk->options());
+    if (code != PLATFORM_ERROR_NONE) {
+        SYNC_ERR("%s", isNew ? "insertEvents fail" : "updateEvents fail");
+        return kFailed;
+    }
+    const int version = lastChangeVersion();
+    bulk->finish(CALENDAR_EVENT_ID, skipped, [&](Planned* planned, int id) {
+        planned->row.event_id = id;
+        planned->row.version = version;
+        note(planned, id, version);
+    });
+    return kOk;
+}
+
+}  // namespace
+
 int CalEventWriter::insertEvents(CalPagePlan* plan, Batch* batch) {
     Bulk<PlannedEvent> bulk;
     for (PlannedEvent& planned : plan->events) {
         if (planned.record && planned.row.event_id == 0) bulk.add(&planned, 0, kAnyVersion);
     }
-    if (bulk.empty()) return kOk;
-    if (calendar_db_insert_records(bulk.list(), bulk.options()) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("insertEvents fail");
-        return kFailed;
-    }
-    const int version = lastChangeVersion();
-    bulk.finish(CALENDAR_EVENT_ID, &batch->skipped, [&](PlannedEvent* planned, int id) {
-        planned->row.event_id = id;
-        planned->row.version = version;
+    return writeBulk(&bulk, /*isNew=*/true, &batch->skipped, [&](const PlannedEvent* planned, int id, int) {
         batch->insertedIds.emplace(planned->row.uri, id);
         ++mCounts.inserted;
     });
-    return kOk;
 }
 
 int CalEventWriter::updateEvents(CalPagePlan* plan, Batch* batch) {
@@ -158,18 +173,8 @@ int CalEventWriter::updateEvents(CalPagePlan* plan, Batch* batch) {
             bulk.add(&planned, planned.row.event_id, planned.expectedVersion);
         }
     }
-    if (bulk.empty()) return kOk;
-    if (calendar_db_replace_records(bulk.list(), bulk.ids().data(), bulk.ids().size(), bulk.options()) !=
-        PLATFORM_ERROR_NONE) {
-        SYNC_ERR("updateEvents fail");
-        return kFailed;
-    }
-    const int version = lastChangeVersion();
-    bulk.finish(CALENDAR_EVENT_ID, &batch->skipped, [&](PlannedEvent* planned, int) {
-        planned->row.version = version;
-        ++mCounts.updated;
-    });
-    return kOk;
+    return writeBulk(&bulk, /*isNew=*/false, &batch->skipped,
+                     [&](const PlannedEvent*, int, int) { ++mCounts.updated; });
 }
 
 int CalEventWriter::expectedSeriesVersion(int seriesId) const {
@@ -198,48 +203,24 @@ void CalEventWriter::resolveSeries(CalPagePlan* plan, Batch* batch) {
 }
 
 int CalEventWriter::insertException(CalPagePlan* plan, Batch* batch) {
-    Bulk<PlannedInstance> bulk;
-    for (PlannedInstance& planned : plan->instances) {
-        if (planned.record && planned.childId == 0 && !batch->skipped.contains(&planned)) {
-            bulk.add(&planned, 0, expectedSeriesVersion(planned.row.original_event_id));
-        }
-    }
-    if (bulk.empty()) return kOk;
-    if (calendar_db_insert_records(bulk.list(), bulk.options()) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("insertEvents fail");
-        return kFailed;
-    }
-    const int version = lastChangeVersion();
-    bulk.finish(CALENDAR_EVENT_ID, &batch->skipped, [&](PlannedInstance* planned, int id) {
-        planned->row.event_id = id;
-        planned->row.version = version;
-        batch->seriesVersions[planned->row.original_event_id] = version;
-        ++mCounts.inserted;
-    });
-    return kOk;
+    return writeExceptions(plan, batch, /*isNew=*/true, &mCounts.inserted);
 }
 
 int CalEventWriter::updateException(CalPagePlan* plan, Batch* batch) {
+    return writeExceptions(plan, batch, /*isNew=*/false, &mCounts.updated);
+}
+
+int CalEventWriter::writeExceptions(CalPagePlan* plan, Batch* batch, bool isNew, int* count) {
     Bulk<PlannedInstance> bulk;
     for (PlannedInstance& planned : plan->instances) {
-        if (planned.record && planned.childId != 0 && !batch->skipped.contains(&planned)) {
+        if (planned.record && (planned.childId == 0) == isNew && !batch->skipped.contains(&planned)) {
             bulk.add(&planned, planned.childId, expectedSeriesVersion(planned.row.original_event_id));
         }
     }
-    if (bulk.empty()) return kOk;
-    if (calendar_db_replace_records(bulk.list(), bulk.ids().data(), bulk.ids().size(), bulk.options()) !=
-        PLATFORM_ERROR_NONE) {
-        SYNC_ERR("updateEvents fail");
-        return kFailed;
-    }
-    const int version = lastChangeVersion();
-    bulk.finish(CALENDAR_EVENT_ID, &batch->skipped, [&](PlannedInstance* planned, int id) {
-        planned->row.event_id = id;
-        planned->row.version = version;
+    return writeBulk(&bulk, isNew, &batch->skipped, [&](const PlannedInstance* planned, int, int version) {
         batch->seriesVersions[planned->row.original_event_id] = version;
-        ++mCounts.updated;
+        ++*count;
     });
-    return kOk;
 }
 
 int CalEventWriter::deleteExceptions(const std::vector<PlannedInstance*>& instances, Batch* batch) {

@@ -56,6 +56,7 @@ private:
     void resolveSeries(CalPagePlan* plan, Batch* batch);
     [[nodiscard]] int insertException(CalPagePlan* plan, Batch* batch);
     [[nodiscard]] int updateException(CalPagePlan* plan, Batch* batch);
+    [[nodiscard]] int writeExceptions(CalPagePlan* plan, Batch* batch, bool isNew, int* count);
     [[nodiscard]] int deleteExceptions(const std::vector<PlannedInstance*>& instances, Batch* batch);
     [[nodiscard]] int writeExceptionDates(CalPagePlan* plan, Batch* batch);
     [[nodiscard]] int writeRows(CalPagePlan* plan, const Batch& batch);

@@ -26,6 +26,7 @@ public:
                 SYNC_ERR("This is not event json");
             } else if (CalJsonParser::checkException(json, &info) != kOk) {
                 SYNC_ERR("checkException fail");
+                SYNC_ERR("event(%s) is left out", entry->id.c_str());
             } else if (info.kind == ExceptionKind::kOrdinary) {
                 planEvent(*entry);
             } else {
@@ -49,7 +50,8 @@ private:
         if (CalJsonParser::convertEvent(jsonObjectOf(entry.json), out) != kOk ||
             calendar_record_set_int(out->get(), CALENDAR_EVENT_BOOK_ID, mSnapshot.book().calendar_id) !=
                 PLATFORM_ERROR_NONE) {
-            SYNC_ERR("%s: event(%s)", failureText, entry.id.c_str());
+            SYNC_ERR("%s", failureText);
+            SYNC_ERR("event(%s) is left out", entry.id.c_str());
             return false;
         }
         return true;

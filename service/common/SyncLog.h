@@ -13,6 +13,11 @@ inline constexpr const char* kSyncLogTag = "VANTOR_PIM_SYNC_SERVICE";
     dlog_print(DLOG_ERROR, kSyncLogTag, "%s: %s(%d) > \033[31m* Critical * " format "\033[0m", \
                __FILE_NAME__, __func__, __LINE__ __VA_OPT__(, ) __VA_ARGS__)
 
+// As SYNC_ERR, under the name of another function: for helpers that log for the operation they serve.
+#define SYNC_ERR_AS(function, format, ...)                                                     \
+    dlog_print(DLOG_ERROR, kSyncLogTag, "%s: %s(%d) > \033[31m* Critical * " format "\033[0m", \
+               __FILE_NAME__, function, __LINE__ __VA_OPT__(, ) __VA_ARGS__)
+
 // What a run did, for people who read the log.
 #define SYNC_INFO(format, ...)                                                          \
     dlog_print(DLOG_INFO, kSyncLogTag, "%s: %s(%d) > " format, __FILE_NAME__, __func__, \

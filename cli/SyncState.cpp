@@ -5,7 +5,9 @@
 #include "platform/settings.h"
 
 SyncState::SyncState(int accountId, vantor_pim_sync_type_e kind)
-    : mPrefix("memory/vantor-pim-sync/" + std::to_string(accountId) + "/" + sync_client::kindName(kind) +
+    : mAccountId(accountId),
+      mKind(kind),
+      mPrefix("memory/vantor-pim-sync/" + std::to_string(accountId) + "/" + sync_client::kindName(kind) +
               "/") {}
 
 std::string SyncState::failure() const {

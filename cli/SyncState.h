@@ -26,9 +26,13 @@ public:
     [[nodiscard]] int nextAlarm() const { return number("next_alarm").value_or(0); }
 
     [[nodiscard]] std::string endedKey() const { return mPrefix + "ended"; }
+    [[nodiscard]] int accountId() const { return mAccountId; }
+    [[nodiscard]] vantor_pim_sync_type_e kind() const { return mKind; }
 
 private:
     [[nodiscard]] std::optional<int> number(const char* name) const;
 
+    int mAccountId;
+    vantor_pim_sync_type_e mKind;
     std::string mPrefix;
 };

@@ -7,6 +7,7 @@
 
 #include "DaemonLink.h"
 #include "Failure.h"
+#include "SyncClient.h"
 #include "SyncState.h"
 #include "platform/error.h"
 #include "platform/settings.h"
@@ -14,6 +15,8 @@
 namespace {
 
 constexpr unsigned kLivenessPeriodMs = 300;
+// So many looks in a row at a daemon that runs no sync and says nothing of one that ended: it cannot write its keys.
+constexpr int kSilentLooks = 10;
 
 // Being called is enough: it wakes the main context, and the loop looks at the key itself.
 void wake(keynode_t*, void*) {}
@@ -64,10 +67,20 @@ void SyncWait::untilEnded(const SyncState& state, int run) const {
     const Watch watch(state.endedKey());
     Ticker ticker;
     bool isAlive = true;
+    int silentLooks = 0;
     while (state.ended() < run) {
         if (!isAlive) throw Failure("the daemon ended before the sync did; its log tells why");
         g_main_context_iteration(nullptr, /*may_block=*/TRUE);
         // Looked at before the key is read again: a daemon may end right after a sync that ended well.
-        if (ticker.take()) isAlive = isSameDaemon();
+        if (!ticker.take()) continue;
+        isAlive = isSameDaemon();
+        const bool isRunning =
+            isAlive && sync_client::state(state.accountId(), state.kind()) == SYNC_AGENT_STATE_IN_PROGRESS;
+        silentLooks = isRunning ? 0 : silentLooks + 1;
+        if (isAlive && silentLooks > kSilentLooks) {
+            throw Failure(
+                "the sync has ended but the daemon could not publish how; free some storage, its log tells "
+                "more");
+        }
     }
 }

@@ -41,6 +41,7 @@ int vantor_pim_sync_initialize(void) {
 
 int vantor_pim_sync_finalize(void) {
     link().disconnect();
+    NotificationReceiveManager::getInstance().detachAllListeners();
     return 0;
 }
 

@@ -162,7 +162,10 @@ int AccountDBHelper::updateAccount(const vantor_pim_sync_account_s& record) {
     if (!stored) return kFailed;
     const int read = mDatabase.readRow("select * FROM account_table WHERE account_id=?", {record.account_id},
                                        [&stored](const Row& row) { fillRecord(row, stored.get()); });
-    if (read != kOk) return read;
+    if (read != kOk) {
+        SYNC_ERR("execDb() failed");
+        return read;
+    }
     Account account(*stored);
     account.update(&record);
     return updateAccount(account);
@@ -215,19 +218,23 @@ int AccountDBHelper::getSecureKey(int accountId, std::string* key) {
     char path[1024];
     snprintf(name, sizeof name, "%d_%s", accountId, "file");
     snprintf(path, sizeof path, "%s%s", platform::rootedPath(kTrustedFolder).c_str(), name);
+    // The reasons of our own have an error number too, so that the log never says "Success".
     struct stat info {};
-    if (stat(path, &info) != 0 || info.st_size < 1) {
-        SYNC_ERR("stat(%s) failed : %s", path, strerror(errno));
+    int error = stat(path, &info) != 0 ? errno : 0;
+    if (error == 0 && info.st_size < 1) error = ENODATA;
+    if (error != 0) {
+        SYNC_ERR("stat(%s) failed : %s", path, strerror(error));
         return kFailed;
     }
     constexpr off_t kMaxTokenBytes = 64 * 1024;
-    const std::unique_ptr<FILE, int (*)(FILE*)> file(
-        S_ISREG(info.st_mode) && info.st_size <= kMaxTokenBytes ? fopen(path, "re") : nullptr, fclose);
+    const bool isToken = S_ISREG(info.st_mode) && info.st_size <= kMaxTokenBytes;
+    const std::unique_ptr<FILE, int (*)(FILE*)> file(isToken ? fopen(path, "re") : nullptr, fclose);
     if (!file) {
-        SYNC_ERR("fopen(%s) failed : %s", path, strerror(errno));
+        SYNC_ERR("fopen(%s) failed : %s", path, strerror(isToken ? errno : EINVAL));
         return kFailed;
     }
     std::string content(static_cast<size_t>(info.st_size), '\0');
+    errno = ENODATA;
     if (fread(content.data(), 1, content.size(), file.get()) == 0) {
         SYNC_ERR("fread(%s) failed : %s", path, strerror(errno));
         return kFailed;

@@ -14,6 +14,7 @@ public:
     int doUpSync() override;
     int doDownSync() override;
     int doStop() override;
+    void abandonRun() override { mpWorker->abandon(); }
     [[nodiscard]] vantor_pim_sync_type_e getType() const override { return VANTOR_PIM_SYNC_TYPE_CALENDAR; }
 
 protected:

@@ -37,3 +37,8 @@ std::shared_ptr<INotificationListener> NotificationReceiveManager::detachListene
     vantor_pim_sync_type_e type, vantor_pim_sync_state_changed_cb callback, void* userData) {
     return receiverOf(type).detachListener(callback, userData);
 }
+
+void NotificationReceiveManager::detachAllListeners() {
+    mpCalNotificationReceiver->detachAllListeners();
+    mpCtNotificationReceiver->detachAllListeners();
+}

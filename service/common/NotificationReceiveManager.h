@@ -17,6 +17,8 @@ public:
     std::shared_ptr<INotificationListener> detachListener(vantor_pim_sync_type_e type,
                                                           vantor_pim_sync_state_changed_cb callback,
                                                           void* userData);
+    // Of both kinds. None of them is called again.
+    void detachAllListeners();
 
 private:
     NotificationReceiver& receiverOf(vantor_pim_sync_type_e type);

@@ -42,7 +42,7 @@ size_t readFully(int fd, void* buffer, size_t size) {
 
 }  // namespace
 
-NotificationReceiver::NotificationReceiver(const char* path) : mPath(platform::rootedPath(checked(path))) {}
+NotificationReceiver::NotificationReceiver(const char* path) : mPath(checked(path)) {}
 
 NotificationReceiver::~NotificationReceiver() {
     if (mNotificationWd != -1) unsubscribe();
@@ -69,6 +69,11 @@ std::shared_ptr<INotificationListener> NotificationReceiver::detachListener(
     return detached;
 }
 
+void NotificationReceiver::detachAllListeners() {
+    mListeners.clear();
+    if (mNotificationWd != -1) unsubscribe();
+}
+
 int NotificationReceiver::initialize() {
     if (++mInitializeCount > 1) return kOk;
     mINotifyFd = inotify_init();
@@ -88,10 +93,11 @@ int NotificationReceiver::initialize() {
 void NotificationReceiver::subscribe() {
     initialize();
     if (mNotificationWd == -1) {
-        mNotificationWd = inotify_add_watch(mINotifyFd, mPath.c_str(), IN_ACCESS);
+        const std::string path = platform::rootedPath(mPath);
+        mNotificationWd = inotify_add_watch(mINotifyFd, path.c_str(), IN_ACCESS);
         SYNC_ASSERT(mNotificationWd != -1);
         // Replaces the mask: from here on only the closing of a written file is told.
-        const int ret = inotify_add_watch(mINotifyFd, mPath.c_str(), IN_CLOSE_WRITE);
+        const int ret = inotify_add_watch(mINotifyFd, path.c_str(), IN_CLOSE_WRITE);
         SYNC_ASSERT(ret == mNotificationWd);
     }
     mSubscribed.push_back(this);

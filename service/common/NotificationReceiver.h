@@ -23,6 +23,7 @@ public:
     // The first listener with this callback and data, or NULL. The last one ends the watch.
     std::shared_ptr<INotificationListener> detachListener(vantor_pim_sync_state_changed_cb callback,
                                                           void* userData);
+    void detachAllListeners();
 
 private:
     int initialize();

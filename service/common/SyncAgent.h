@@ -50,6 +50,8 @@ public:
     virtual int doUpSync() = 0;
     virtual int doDownSync() = 0;
     virtual int doStop() = 0;
+    // For the end of the daemon: tells a running operation to end and does not wait. Its result reaches nobody.
+    virtual void abandonRun() = 0;
     [[nodiscard]] virtual vantor_pim_sync_type_e getType() const = 0;
 
     SyncAgent(const SyncAgent&) = delete;

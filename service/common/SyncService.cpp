@@ -64,7 +64,7 @@ bool SyncService::exists() {
 
 SyncService::SyncService() {
     initializeAccount();
-    if (CalDataManager::getInstance().prepareSync() != kOk) SYNC_ERR("not prepare sync");
+    prepareDataManagers();
     (void)initialize();
     curl_global_init(CURL_GLOBAL_ALL);
     setUpCryptoLocks();
@@ -78,6 +78,12 @@ void SyncService::initializeAccount() {
         SYNC_ASSERT_TEXT(false, "ret == ACCOUNT_ERROR_NONE");
     }
     queryAccounts([](account_h, void*) { return true; }, nullptr);
+}
+
+// Before there is an agent, and on the main thread: change callbacks can only be registered there. The managers of other data
+// kinds have their place here, after the calendar's.
+void SyncService::prepareDataManagers() {
+    if (CalDataManager::getInstance().prepareSync() != kOk) SYNC_ERR("not prepare sync");
 }
 
 int SyncService::initialize() {
@@ -97,7 +103,7 @@ int SyncService::initialize() {
         if (onDevice.contains(id)) continue;
         SYNC_ERR("removed account[%d]", id);
         (void)store.deleteAccount(id);
-        deleteAccountData(id);
+        for (const Kind& kind : kKinds) deleteData(kind, id);
     }
     std::list<std::unique_ptr<Account>> accounts;
     if (store.getAllAccounts(&accounts) != kOk) {
@@ -131,11 +137,11 @@ void SyncService::setUpCryptoLocks() {
 }
 
 void SyncService::catchUp() {
-    const auto now = static_cast<int>(time(nullptr));
+    const int64_t now = time(nullptr);
     for (const Kind& kind : kKinds) {
         for (const auto& [id, agent] : this->*kind.agents) {
             const Account& account = *mAccounts.at(id);
-            const int period = (account.*kind.period)();
+            const int64_t period = (account.*kind.period)();
             int last = 0;
             const bool known = AccountDBHelper::getInstance().getSyncTime(id, kind.type, &last) == kOk;
             if ((account.*kind.isOn)() && known && period > 0 && now - last >= period * kSecondsPerMinute) {
@@ -148,8 +154,11 @@ void SyncService::catchUp() {
 
 void SyncService::quiesce() {
     account_unsubscribe_notification(std::exchange(mSubscription, nullptr));
-    mCalendarAgents.clear();
-    mContactsAgents.clear();
+    // All are told before the first is waited for: a transfer notices only within a second.
+    for (const Kind& kind : kKinds) {
+        for (const auto& [id, agent] : this->*kind.agents) agent->abandonRun();
+    }
+    for (const Kind& kind : kKinds) (this->*kind.agents).clear();
 }
 
 // --- accounts
@@ -218,8 +227,9 @@ void SyncService::unschedule(SyncAgent* agent) {
     agent->runStatus().setNextAlarm(0);
 }
 
-void SyncService::deleteAccountData(int accountId) {
-    (void)CalDataManager::getInstance().deleteAccount(accountId);
+void SyncService::deleteData(const Kind& kind, int accountId) {
+    if (kind.type == VANTOR_PIM_SYNC_TYPE_CALENDAR)
+        (void)CalDataManager::getInstance().deleteAccount(accountId);
 }
 
 int SyncService::updateAccount(const vantor_pim_sync_account_s* record) {
@@ -275,14 +285,21 @@ int SyncService::removeAccount(int accountId) {
         SYNC_ERR("account not exist (account_id=[%d])", accountId);
         return kFailed;
     }
-    (void)AccountDBHelper::getInstance().deleteAccount(accountId);
+    // An account that stays in the store would come back with the next start, so it stays in the map as well and can be removed
+    // again.
+    if (AccountDBHelper::getInstance().deleteAccount(accountId) != kOk) return kFailed;
     mAccounts.erase(accountId);
     return kOk;
 }
 
 int SyncService::removeKind(const Kind& kind, int accountId) {
     SyncAgent* agent = findAgent(kind, accountId);
-    if (agent == nullptr) return kOk;
+    if (agent == nullptr) {
+        // What was downloaded before the option was switched off goes with the account. Of an id that is not ours nothing goes:
+        // it may be another provider's.
+        if (mAccounts.contains(accountId)) deleteData(kind, accountId);
+        return kOk;
+    }
     if (agent->waitForResult(kRemovalTimeoutMs) != 0) {
         if (kind.type == VANTOR_PIM_SYNC_TYPE_CALENDAR) {
             SYNC_ERR("Unable to stop Calendar sync of an account (account_id=[%d])", accountId);
@@ -293,8 +310,7 @@ int SyncService::removeKind(const Kind& kind, int accountId) {
     }
     unschedule(agent);
     (this->*kind.agents).erase(accountId);
-    if (kind.type == VANTOR_PIM_SYNC_TYPE_CALENDAR)
-        (void)CalDataManager::getInstance().deleteAccount(accountId);
+    deleteData(kind, accountId);
     return kOk;
 }
 

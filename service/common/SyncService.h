@@ -54,6 +54,7 @@ private:
 
     SyncService();
     void initializeAccount();
+    static void prepareDataManagers();
     int initialize();
     void setUpCryptoLocks();
 
@@ -68,7 +69,8 @@ private:
     SyncAgent* findAgent(const Kind& kind, int accountId);
     static void schedule(const Kind& kind, const Account& account, SyncAgent* agent);
     static void unschedule(SyncAgent* agent);
-    static void deleteAccountData(int accountId);
+    // What the device keeps of the account's data of this kind.
+    static void deleteData(const Kind& kind, int accountId);
     // The agent that a command is for, by the checks that all commands share.
     int checkedAgent(int accountId, int type, SyncAgent** agent);
     // What a daemon that was away owes: syncs whose time has passed, changes that were not sent.

@@ -32,6 +32,8 @@ public:
     [[nodiscard]] int start(SyncDirector* director, IResultListener* listener);
     // The director goes on until it returns by itself; its result arrives through onSyncStopped. -1 when idle.
     [[nodiscard]] int stop(IResultListener* listener);
+    // Tells a running director to stop, ahead of the destruction that waits for it.
+    void abandon() { mIsInProgress = false; }
     // True when no request is in progress or the running one was stopped.
     [[nodiscard]] bool isStopped() override { return !mIsInProgress; }
 

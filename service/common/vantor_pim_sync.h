@@ -53,7 +53,7 @@ typedef struct {
 
 typedef void (*vantor_pim_sync_state_changed_cb)(vantor_pim_sync_type_e type, void* user_data);
 
-/* Made by every call that needs it; in a client this connects to the daemon. */
+/* Made by every call that needs it; in a client this connects to the daemon, and finalize disconnects and drops all callbacks. */
 VANTOR_PIM_SYNC_EXPORT int vantor_pim_sync_initialize(void);
 VANTOR_PIM_SYNC_EXPORT int vantor_pim_sync_finalize(void);
 

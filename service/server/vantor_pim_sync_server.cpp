@@ -1,6 +1,7 @@
 // The daemon's entry: opens the service socket, brings the service up, runs the main loop until SIGTERM or SIGINT.
 #include <glib-object.h>
 #include <malloc.h>
+#include <sys/stat.h>
 
 #include <cstdio>
 #include <string_view>
@@ -15,6 +16,8 @@ namespace {
 
 constexpr unsigned kSocketGroup = 6005;
 constexpr unsigned kSocketMode = 0660;
+// Whoever starts the daemon: the modes that the stores ask for hold, and nobody else may ever write.
+constexpr mode_t kFileCreationMask = 0002;
 
 // A page comes and goes many times in a sync. Memory that is given back to the kernel and fetched again for each costs more than
 // the page's own work, and an arena a thread keeps as much again for each account.
@@ -37,6 +40,7 @@ void initializeTypes() {
 
 static int __server_main() {
     tuneMemory();
+    umask(kFileCreationMask);
     initializeTypes();
     (void)pims_ipc_svc_init(kServiceSocket, kSocketGroup, kSocketMode);
     if (!vantor_pim_sync_server_ipc_register()) return 0;

@@ -90,6 +90,29 @@ TEST(AccountDBHelper, KeepsAccountsAndSyncTimes) {
     EXPECT_FALSE(store.hasAccount(7));
 }
 
+TEST(AccountDBHelper, AFullDiskIsToldAndLeavesWhatWasThere) {
+    const TestRoot root;
+    ASSERT_EQ(AccountDBHelper().insertAccount(Account(fields(7))), 0);
+    // A disk that is full for whoever opens a store from here on.
+    const auto allowTwoPages = [](sqlite3* database, const char**, const struct sqlite3_api_routines*) {
+        return sqlite3_exec(database, "PRAGMA max_page_count = 2", nullptr, nullptr, nullptr);
+    };
+    auto* const extension = reinterpret_cast<void (*)()>(+allowTwoPages);
+    ASSERT_EQ(sqlite3_auto_extension(extension), SQLITE_OK);
+    AccountDBHelper store;
+    std::string large(10'000, 'e');
+    for (const int id : {7, 8}) {
+        vantor_pim_sync_account_s record = fields(id);
+        record.email = large.data();
+        EXPECT_EQ(id == 7 ? store.updateAccount(record) : store.insertAccount(Account(record)), -28) << id;
+    }
+    sqlite3_cancel_auto_extension(extension);
+    std::list<int> ids;
+    ASSERT_EQ(AccountDBHelper().getAllAccountIds(&ids), 0);
+    EXPECT_EQ(ids, std::list<int>{7});
+    EXPECT_EQ(store.updateSyncTime(7, 0, 111), 0) << "what needs no room goes on";
+}
+
 TEST(AccountDBHelper, TokensComeFromTheirFiles) {
     const TestRoot root;
     AccountDBHelper store;
@@ -105,6 +128,11 @@ TEST(AccountDBHelper, TokensComeFromTheirFiles) {
         EXPECT_EQ(store.getSecureKey(7, &token), row.result) << row.content;
         EXPECT_EQ(token, row.token);
     }
+    std::filesystem::create_directory(
+        root.at("/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted/8_file"));
+    std::string untouched = "before";
+    EXPECT_EQ(store.getSecureKey(8, &untouched), -1) << "a folder is no token";
+    EXPECT_EQ(untouched, "before");
     ASSERT_EQ(store.insertAccount(Account(fields(7))), 0);
     std::list<std::unique_ptr<Account>> accounts;
     EXPECT_DEATH((void)store.getAllAccounts(&accounts), "get token fail");

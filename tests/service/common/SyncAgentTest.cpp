@@ -38,6 +38,7 @@ public:
     int doUpSync() override { return did("up"); }
     int doDownSync() override { return did("down"); }
     int doStop() override { return did("stop"); }
+    void abandonRun() override {}
     [[nodiscard]] vantor_pim_sync_type_e getType() const override { return VANTOR_PIM_SYNC_TYPE_CALENDAR; }
     [[nodiscard]] bool hasSomethingToSend() override { return somethingToSend; }
 

@@ -5,62 +5,17 @@
 #include <sys/un.h>
 #include <unistd.h>
 
-#include <fstream>
-#include <memory>
-#include <thread>
+#include <climits>
+#include <ctime>
 
 #include "common/AccountDBHelper.h"
-#include "common/vantor_pim_sync_ipc_marshal.h"
-#include "e2e/Process.h"
-#include "platform/account.h"
 #include "platform/error.h"
+#include "platform/keys.h"
 #include "platform/root.h"
 #include "platform/settings.h"
-#include "support/TestRoot.h"
+#include "support/Daemon.h"
 
 namespace {
-
-constexpr const char* kPackage = "com.morvane.vantor-service-account-lite";
-
-struct Destroy {
-    void operator()(pims_ipc_s* ipc) const noexcept { pims_ipc_destroy(ipc); }
-    void operator()(pims_ipc_data_s* data) const noexcept { pims_ipc_data_destroy(data); }
-};
-using Ipc = std::unique_ptr<pims_ipc_s, Destroy>;
-using Data = std::unique_ptr<pims_ipc_data_s, Destroy>;
-
-class Daemon {
-public:
-    explicit Daemon(const TestRoot& root) : mLog(root.path() / "daemon.log") { start(); }
-    void start() {
-        process = std::make_unique<Process>(std::vector<std::string>{VPS_BIN_DIR "/vantor-pim-sync"},
-                                            Environment{}, mLog);
-    }
-    // A connection once the daemon answers.
-    Ipc connect() {
-        for (int i = 0; i < 2000 && !process->wait(0); ++i) {
-            pims_ipc_h ipc = nullptr;
-            if (pims_ipc_create(kServiceSocket, &ipc) == 0) return Ipc(ipc);
-            std::this_thread::sleep_for(std::chrono::milliseconds(5));
-        }
-        return nullptr;
-    }
-    [[nodiscard]] std::string log() const {
-        std::ifstream file(mLog);
-        return {std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
-    }
-    std::unique_ptr<Process> process;
-
-private:
-    std::string mLog;
-};
-
-void addAccount(const TestRoot& root, int id) {
-    ASSERT_EQ(account_insert(id, kPackage, "me@x"), 0);
-    std::ofstream(root.at("/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted/") /
-                  (std::to_string(id) + "_file"))
-        << "token";
-}
 
 // The sizes and first int of a reply's items.
 struct Reply {
@@ -71,13 +26,13 @@ struct Reply {
 
 Reply call(pims_ipc_h ipc, const char* command, const std::vector<int>& arguments,
            const char* module = kServiceModule) {
-    const Data request(pims_ipc_data_create_with_size(64, 0));
+    const IpcData request(pims_ipc_data_create_with_size(64, 0));
     for (const int argument : arguments)
         EXPECT_EQ(vantor_pim_sync_ipc_marshal_int(argument, request.get()), 0);
     pims_ipc_data_h raw = nullptr;
     Reply reply;
     reply.code = pims_ipc_call(ipc, module, command, request.get(), &raw, 10'000);
-    const Data data(raw);
+    const IpcData data(raw);
     int number = 0;
     while (raw != nullptr && vantor_pim_sync_ipc_unmarshal_int(raw, &number) == 0)
         reply.numbers.push_back(number);
@@ -98,7 +53,7 @@ int rawConnection() {
 
 TEST(Daemon, AnswersTheEightCommands) {
     const TestRoot root;
-    addAccount(root, 7);
+    addDeviceAccount(root, 7);
     Daemon daemon(root);
     const Ipc ipc = daemon.connect();
     ASSERT_TRUE(ipc) << daemon.log();
@@ -127,11 +82,11 @@ TEST(Daemon, AnswersTheEightCommands) {
     account.calsync = true;
     account.calserver = server.data();
     const auto send = [&](const char* command) {
-        const Data request(pims_ipc_data_create_with_size(64, 0));
+        const IpcData request(pims_ipc_data_create_with_size(64, 0));
         EXPECT_EQ(vantor_pim_sync_ipc_marshal_sync_account(&account, request.get()), 0);
         pims_ipc_data_h raw = nullptr;
         EXPECT_EQ(pims_ipc_call(ipc.get(), kServiceModule, command, request.get(), &raw, 10'000), 0);
-        const Data reply(raw);
+        const IpcData reply(raw);
         int result = -99;
         EXPECT_EQ(vantor_pim_sync_ipc_unmarshal_int(raw, &result), 0);
         return result;
@@ -151,7 +106,7 @@ TEST(Daemon, AnswersTheEightCommands) {
 
 TEST(Daemon, BadClientsDisturbNobody) {
     const TestRoot root;
-    addAccount(root, 7);
+    addDeviceAccount(root, 7);
     Daemon daemon(root);
     const Ipc ipc = daemon.connect();
     ASSERT_TRUE(ipc);
@@ -177,7 +132,7 @@ TEST(Daemon, LivesAndDies) {
         Daemon none(root);
         EXPECT_EQ(none.process->wait(5000), 0) << "no account, nothing to do";
     }
-    addAccount(root, 7);
+    addDeviceAccount(root, 7);
     Daemon daemon(root);
     ASSERT_TRUE(daemon.connect());
     {
@@ -197,8 +152,8 @@ TEST(Daemon, LivesAndDies) {
 
 TEST(Daemon, StartsWithWhatTheDeviceStillHas) {
     const TestRoot root;
-    addAccount(root, 7);
-    addAccount(root, 8);
+    addDeviceAccount(root, 7);
+    addDeviceAccount(root, 8);
     vantor_pim_sync_account_s account{};
     account.calsync = true;
     for (account.account_id = 7; account.account_id <= 9; ++account.account_id) {
@@ -218,6 +173,77 @@ TEST(Daemon, StartsWithWhatTheDeviceStillHas) {
     daemon.start();
     EXPECT_EQ(daemon.process->wait(5000), 128 + SIGABRT) << "it cannot run without an account's token";
     EXPECT_NE(daemon.log().find("account 8 has no readable refresh token"), std::string::npos);
+}
+
+namespace {
+
+// An account that syncs with `server`, in the daemon's store.
+void storeAccount(const TestRoot& root, int id, std::string server, int period, time_t lastSync) {
+    addDeviceAccount(root, id);
+    vantor_pim_sync_account_s account{};
+    account.account_id = id;
+    account.calsync = true;
+    account.calserver = server.data();
+    account.calperiod = period;
+    ASSERT_EQ(AccountDBHelper::getInstance().insertAccount(Account(account)), 0);
+    ASSERT_EQ(AccountDBHelper::getInstance().updateSyncTime(id, 0, static_cast<int>(lastSync)), 0);
+}
+
+int statusOf(int accountId) {
+    account_h account = nullptr;
+    account_sync_state_e status = ACCOUNT_SYNC_INVALID;
+    EXPECT_EQ(account_create(&account), 0);
+    EXPECT_EQ(account_query_account_by_account_id(accountId, &account), 0);
+    EXPECT_EQ(account_get_sync_support(account, &status), 0);
+    account_destroy(account);
+    return status;
+}
+
+}  // namespace
+
+TEST(Daemon, SyncsWhatIsOverdueAndWhatASettingAsksForAndEndsInTheMiddleOfIt) {
+    const TestRoot root;
+    const SilentServer server;
+    for (const char* name : {"vantor.tovik.client.id", "vantor.tovik.client.secret"})
+        ASSERT_EQ(key_storage_set(name, "value"), 0);
+    storeAccount(root, 7, server.url, 15, time(nullptr) - 16 * 60);
+    storeAccount(root, 8, server.url, 15, time(nullptr));
+    storeAccount(root, 9, server.url, INT_MAX, 0);
+    storeAccount(root, 10, server.url, 0, 0);
+    Daemon daemon(root);
+    const Ipc ipc = daemon.connect();
+    ASSERT_TRUE(ipc) << daemon.log();
+    const auto state = [&](int id) { return call(ipc.get(), "get_state", {id, 0}).numbers.back(); };
+    EXPECT_EQ(state(7), SYNC_AGENT_STATE_IN_PROGRESS);
+    for (const int id : {8, 9, 10}) EXPECT_EQ(state(id), SYNC_AGENT_STATE_READY) << id;
+
+    ASSERT_EQ(account_update_sync_status_by_id(7, ACCOUNT_SYNC_STATUS_IDLE), 0);
+    EXPECT_TRUE(eventually([] { return statusOf(7) == ACCOUNT_SYNC_STATUS_RUNNING; }))
+        << "a sync that goes on is not idle, whoever says so";
+
+    ASSERT_EQ(vconf_set_int("db/private/com.morvane.calendar/calendar-sync", 1), 0);
+    for (const int id : {8, 9, 10}) {
+        EXPECT_TRUE(eventually([&] { return state(id) == SYNC_AGENT_STATE_IN_PROGRESS; })) << id;
+    }
+    daemon.process->kill(SIGTERM);
+    EXPECT_EQ(daemon.process->wait(3000), 0) << "however many syncs there are";
+}
+
+TEST(Daemon, PowerSavingTakesTheScheduleAwayAndGivesItBack) {
+    const TestRoot root;
+    storeAccount(root, 7, "127.0.0.1", 15, time(nullptr));
+    Daemon daemon(root);
+    ASSERT_TRUE(daemon.connect()) << daemon.log();
+    const auto isScheduled = [] {
+        int alarm = -1;
+        (void)vconf_get_int("memory/vantor-pim-sync/7/calendar/next_alarm", &alarm);
+        return alarm > time(nullptr);
+    };
+    EXPECT_TRUE(eventually(isScheduled));
+    for (const int mode : {2, 0, 2, 1}) {
+        ASSERT_EQ(vconf_set_int("db/setting/psmode", mode), 0);
+        EXPECT_TRUE(eventually([&] { return isScheduled() == (mode != 2); })) << mode;
+    }
 }
 
 TEST(Daemon, ARootThatIsTooLongIsToldPlainly) {

@@ -30,6 +30,7 @@ std::unique_ptr<Record> Record::clone() const {
     auto copy = std::make_unique<Record>(*mView);
     copy->mValues = mValues;
     copy->mPresent = mPresent;
+    copy->readExceptions = readExceptions;
     for (size_t i = 0; i < mChildren.size(); ++i) {
         for (const auto& child : mChildren[i]) copy->mChildren[i].push_back(child->clone());
     }

@@ -50,6 +50,8 @@ public:
     // Whether both say the same in every property that a user can set, attendees and the like included, exceptions not.
     [[nodiscard]] bool hasSameContent(const Record& other) const;
 
+    std::vector<int> readExceptions;  // ids of the exceptions that the record was read with
+
 private:
     const View* mView;
     std::vector<Value> mValues;       // by position in the view

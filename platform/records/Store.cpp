@@ -193,25 +193,33 @@ int Store::begin() {
             return code;
         }
         mTrusted.clear();
+        const auto own = lastVersions().find(this);
+        mVersionBefore = own != lastVersions().end() ? std::optional(own->second) : std::nullopt;
+        mHolder = std::this_thread::get_id();
     }
     ++mDepth;
     return PLATFORM_ERROR_NONE;
 }
 
 int Store::end(bool commit) {
+    if (mHolder != std::this_thread::get_id()) return PLATFORM_ERROR_INVALID_PARAMETER;
     const std::unique_lock<std::recursive_mutex> held(mMutex, std::adopt_lock);  // taken by begin()
-    if (mDepth == 0) return PLATFORM_ERROR_INVALID_PARAMETER;
     if (--mDepth > 0) {
         // An inner part that failed takes the whole with it at the outermost end.
         mFailed = mFailed || !commit;
         return PLATFORM_ERROR_NONE;
     }
+    mHolder = std::thread::id();
     mTrusted.clear();
     int code = PLATFORM_ERROR_NONE;
     const bool failed = std::exchange(mFailed, false);
     if (commit && !failed) code = codeOf(mConnection.run("COMMIT"));
-    if (mConnection.inTransaction()) (void)mConnection.run("ROLLBACK");
     if (commit && failed) code = PLATFORM_ERROR_FAILED;
+    if (mConnection.inTransaction()) (void)mConnection.run("ROLLBACK");
+    if (!commit || code != PLATFORM_ERROR_NONE) {
+        lastVersions().erase(this);
+        if (mVersionBefore) lastVersions()[this] = *mVersionBefore;
+    }
     return code;
 }
 

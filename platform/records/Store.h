@@ -4,13 +4,16 @@
 // Errors: platform/error.h; every refusal of SQLite is logged once.
 #pragma once
 
+#include <atomic>
 #include <functional>
 #include <map>
 #include <memory>
 #include <mutex>
+#include <optional>
 #include <set>
 #include <span>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "../base/StoreWatch.h"
@@ -132,11 +135,13 @@ private:
     const int64_t mWriterId;
 
     std::recursive_mutex mMutex;
-    Connection mConnection;  // guarded by mMutex, as all below up to the callbacks
+    std::atomic<std::thread::id> mHolder;  // the thread of the open transaction
+    Connection mConnection;                // guarded by mMutex, as all below up to the callbacks
     std::string mPath;
     int mConnects = 0;
-    int mDepth = 0;                // of begin()
-    bool mFailed = false;          // an inner transaction was undone
+    int mDepth = 0;                     // of begin()
+    bool mFailed = false;               // an inner transaction was undone
+    std::optional<int> mVersionBefore;  // the thread's last version when the open transaction began
     std::set<RecordKey> mTrusted;  // written, or checked against an expected version, in the open transaction
 
     std::vector<Watcher> mWatchers;  // main thread, as the next two

@@ -40,7 +40,8 @@ std::string conditionOf(const Query& query, std::vector<Value>* values) {
     return condition;
 }
 
-std::string tailOf(const Query& query, int offset, int limit) {
+// Adds its values to those of the condition.
+std::string tailOf(const Query& query, int offset, int limit, std::vector<Value>* values) {
     std::string tail = " ORDER BY ";
     if (query.sortIndex >= 0) {
         tail += std::string(query.view->properties[static_cast<size_t>(query.sortIndex)].column) +
@@ -48,8 +49,8 @@ std::string tailOf(const Query& query, int offset, int limit) {
     }
     tail += "id";
     if (limit > 0 || offset > 0) {
-        tail += " LIMIT " + std::to_string(limit > 0 ? limit : -1) + " OFFSET " +
-                std::to_string(std::max(offset, 0));
+        tail += " LIMIT ? OFFSET ?";
+        values->insert(values->end(), {int64_t{limit > 0 ? limit : -1}, int64_t{std::max(offset, 0)}});
     }
     return tail;
 }
@@ -76,7 +77,8 @@ int Store::query(const Query& query, int offset, int limit, RecordList* out) {
     std::vector<Value> values;
     const std::string condition = conditionOf(query, &values);
     std::vector<std::unique_ptr<Record>> found;
-    const int code = readRecords(query, condition, values, tailOf(query, offset, limit), &found);
+    const std::string tail = tailOf(query, offset, limit, &values);
+    const int code = readRecords(query, condition, values, tail, &found);
     if (code != PLATFORM_ERROR_NONE) return code;
     out->records.reserve(out->records.size() + found.size());
     for (auto& record : found) out->records.push_back(record.release());
@@ -137,11 +139,17 @@ int Store::readChildren(const View& view, const Query& query, const std::string&
             Query exceptions(view);
             exceptions.projection.assign(view.properties.size(), true);
             exceptions.projection[i] = false;
+            // The index knows exceptions only.
+            const std::string series = view.columnOf(view.seriesProperty);
             const std::string condition =
-                std::string(" WHERE ") + view.columnOf(view.seriesProperty) + " IN (" + selectIds + ")";
+                " WHERE " + series + " <> 0 AND " + series + " IN (" + selectIds + ")";
             const int code = readRecords(exceptions, condition, values, " ORDER BY id", &children);
             if (code != PLATFORM_ERROR_NONE) return code;
-            for (const auto& record : children) parents.push_back(record->seriesId());
+            for (const auto& record : children) {
+                parents.push_back(record->seriesId());
+                if (const auto parent = byId->find(record->seriesId()); parent != byId->end())
+                    parent->second->readExceptions.push_back(record->id());
+            }
         } else {
             std::string columns = "parent, id";
             for (const Property& column : child.properties) columns += std::string(", ") + column.column;

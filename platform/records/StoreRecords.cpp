@@ -227,6 +227,10 @@ int Store::updateExceptions(Write& write, Record& record) {
         if (code != PLATFORM_ERROR_NONE) return code;
     }
     for (const auto& [id, exception] : left) {
+        // Only what the writer saw and took out: another may have added some since.
+        if (std::find(record.readExceptions.begin(), record.readExceptions.end(), id) ==
+            record.readExceptions.end())
+            continue;
         if (const int code = removeOne(write, view, id, kAnyVersion); code != PLATFORM_ERROR_NONE)
             return code;
     }
@@ -276,8 +280,9 @@ int Store::removeItem(Write& write, const View& view, int id, const Stored& stor
                              .step();
         if (!isDone(code)) return codeOf(code);
         if (view.hasSeries()) {
-            Statement exceptions = mConnection.prepare("DELETE FROM " + table + " WHERE " +
-                                                       view.columnOf(view.seriesProperty) + " = ?");
+            const std::string series = view.columnOf(view.seriesProperty);
+            Statement exceptions = mConnection.prepare("DELETE FROM " + table + " WHERE " + series +
+                                                       " <> 0 AND " + series + " = ?");
             if (const int removed = exceptions.bind(int64_t{id}).step(); !isDone(removed))
                 return codeOf(removed);
         }

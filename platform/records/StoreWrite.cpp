@@ -17,6 +17,11 @@ Store::Write::Write(Store& store, const record_write_options_s& options)
         mBegun = PLATFORM_ERROR_DATABASE;
         return;
     }
+    // SQLite undoes a transaction by itself, as on a full disk. What came after must not be kept without what came before.
+    if (mNested && !mStore.mConnection.inTransaction()) {
+        mBegun = PLATFORM_ERROR_DATABASE;
+        return;
+    }
     mBegun = mStore.codeOf(mStore.mConnection.run(mNested ? "SAVEPOINT call" : "BEGIN IMMEDIATE"));
     if (mBegun != PLATFORM_ERROR_NONE) return;
     if (!mNested) mStore.mTrusted.clear();

@@ -315,12 +315,15 @@ TEST(CalendarStore, ReplacingASeriesKeepsItsExceptionsAndDates) {
     CalendarRecord added = make(_calendar_event);
     ASSERT_EQ(calendar_record_set_str(added.get(), CALENDAR_EVENT_RECURRENCE_ID, "20260309"), 0);
     ASSERT_EQ(calendar_record_add_child_record(now.get(), CALENDAR_EVENT_EXCEPTIONS, added.release()), 0);
+    const int others = insert(exceptionOf(series, "20260310"));
     ASSERT_EQ(calendar_db_update_record(now.get()), 0);
+    EXPECT_EQ(number(others, CALENDAR_EVENT_ORIGINAL_EVENT_ID), series) << "added since the record was read";
     calendar_record_h raw = nullptr;
     EXPECT_EQ(calendar_db_get_record(_calendar_event, child, &raw), PLATFORM_ERROR_NOT_FOUND);
     ASSERT_EQ(remove(series), 0);
-    EXPECT_EQ(calendar_db_get_record(_calendar_event, child + 1, &raw), PLATFORM_ERROR_NOT_FOUND);
-    EXPECT_GT(insert(event(book, "later")), child + 1) << "ids are not used again";
+    EXPECT_EQ(calendar_db_get_record(_calendar_event, others, &raw), PLATFORM_ERROR_NOT_FOUND);
+    EXPECT_EQ(calendar_db_get_record(_calendar_event, others + 1, &raw), PLATFORM_ERROR_NOT_FOUND);
+    EXPECT_GT(insert(event(book, "later")), others + 1) << "ids are not used again";
 }
 
 TEST(CalendarStore, WhatIsRefusedLeavesNothing) {
@@ -348,6 +351,32 @@ TEST(CalendarStore, WhatIsRefusedLeavesNothing) {
               PLATFORM_ERROR_INVALID_PARAMETER);
     ASSERT_EQ(calendar_db_end_transaction(false), 0);
     EXPECT_EQ(version(), before);
+    int own = 0;
+    ASSERT_EQ(calendar_db_get_last_change_version(&own), 0);
+    EXPECT_EQ(own, before) << "what was undone is no change";
+    EXPECT_EQ(calendar_db_end_transaction(true), PLATFORM_ERROR_INVALID_PARAMETER);
+}
+
+TEST(CalendarStore, WhatFollowsATransactionThatSqliteUndidIsNotKept) {
+    const TestRoot root;
+    const Connected store;
+    const int book = addBook();
+    sqlite3* other = nullptr;
+    ASSERT_EQ(sqlite3_open(root.at(kFile).c_str(), &other), SQLITE_OK);
+    ASSERT_EQ(sqlite3_exec(other,
+                           "CREATE TRIGGER full BEFORE INSERT ON events WHEN new.summary = 'too much' "
+                           "BEGIN SELECT RAISE(ROLLBACK, 'full'); END",
+                           nullptr, nullptr, nullptr),
+              SQLITE_OK);
+    sqlite3_close(other);
+    ASSERT_EQ(calendar_db_begin_transaction(), 0);
+    insert(event(book, "before"));
+    EXPECT_NE(calendar_db_insert_record(event(book, "too much").get(), nullptr), 0);
+    EXPECT_NE(calendar_db_insert_record(event(book, "after").get(), nullptr), 0);
+    EXPECT_NE(calendar_db_end_transaction(true), 0);
+    EXPECT_THAT(feed(book, 0), testing::IsEmpty());
+    insert(event(book, "again"));
+    EXPECT_EQ(feed(book, 0).size(), 1U);
 }
 
 TEST(CalendarStore, ProcessesWriteAtOnceAndEachKnowsItsOwnVersion) {

@@ -24,6 +24,8 @@ ReadOnlyDatabase::ReadOnlyDatabase(const char* path) : mPath(platform::rootedPat
     for (const char* sql : {"PRAGMA query_only=1", "PRAGMA journal_mode=PERSIST"}) {
         sqlite3_exec(mHandle.get(), sql, nullptr, nullptr, nullptr);
     }
+    // A daemon that starts makes the file first and its tables, all together, a moment later.
+    if (!step(prepare("SELECT 1 FROM sqlite_master LIMIT 1"))) mHandle.reset();
 }
 
 SqliteStatement ReadOnlyDatabase::prepare(const char* sql) const {

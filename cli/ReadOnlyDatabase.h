@@ -14,8 +14,8 @@ using SqliteStatement = std::unique_ptr<sqlite3_stmt, SqliteDeleter>;
 
 class ReadOnlyDatabase {
 public:
-    // A path of the system below the root. A missing file is a database without rows: isOpen() is false. A Failure when
-    // it is there and cannot be read.
+    // A path of the system below the root. A missing file, or one that has no tables yet, is a database without rows:
+    // isOpen() is false. A Failure when it is there and cannot be read.
     explicit ReadOnlyDatabase(const char* path);
 
     [[nodiscard]] bool isOpen() const { return mHandle != nullptr; }

@@ -5,6 +5,7 @@
 #include <unistd.h>
 
 #include <chrono>
+#include <memory>
 #include <thread>
 #include <utility>
 
@@ -48,6 +49,23 @@ private:
     sqlite3_stmt* mpStatement;
 };
 
+struct CloseDatabase {
+    void operator()(sqlite3* handle) const noexcept { db_util_close(handle); }
+};
+using ShortConnection = std::unique_ptr<sqlite3, CloseDatabase>;
+
+// False only for a store that nobody finished making: one that cannot be read is somebody's data.
+bool hasTables(const std::string& path) {
+    sqlite3* opened = nullptr;
+    if (db_util_open(path.c_str(), &opened, 0) != SQLITE_OK) return true;
+    const ShortConnection database(opened);
+    bool found = false;
+    const auto note = [](void* any, int, char**, char**) { return *static_cast<bool*>(any) = true, 0; };
+    const int code =
+        sqlite3_exec(database.get(), "SELECT 1 FROM sqlite_master LIMIT 1", note, &found, nullptr);
+    return found || code != SQLITE_OK;
+}
+
 }  // namespace
 
 int SyncDatabase::Param::bind(sqlite3_stmt* statement, int index) const {
@@ -79,11 +97,14 @@ int SyncDatabase::openDb() {
     const std::lock_guard lock(mMutex);
     const std::string path = platform::rootedPath(mPath);
     const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    if (fd != -1) {
-        close(fd);
-    } else if (const int result = makeDb(); result != kOk) {
-        SYNC_ERR("makeDb fail");
-        return result;
+    const bool isThere = fd != -1;
+    if (isThere) close(fd);
+    // A daemon that was killed while it made the store left a file without tables.
+    if (!isThere || (mpHandle == nullptr && !hasTables(path))) {
+        if (const int result = makeDb(); result != kOk) {
+            SYNC_ERR("makeDb fail");
+            return result;
+        }
     }
     if (mpHandle != nullptr) return kOk;
     if (db_util_open(path.c_str(), &mpHandle, 0) != SQLITE_OK) {
@@ -95,19 +116,21 @@ int SyncDatabase::openDb() {
 
 int SyncDatabase::makeDb() {
     const std::string path = platform::rootedPath(mPath);
-    sqlite3* database = nullptr;
-    if (const int code = db_util_open(path.c_str(), &database, 0); code != SQLITE_OK) {
+    sqlite3* opened = nullptr;
+    const int code = db_util_open(path.c_str(), &opened, 0);
+    const ShortConnection database(opened);
+    if (code != SQLITE_OK) {
         SYNC_ERR("db_util_open() Failed(%d)", code);
         return kFailed;
     }
-    for (const char* text : mSchema) {
-        char* message = nullptr;
-        if (sqlite3_exec(database, text, nullptr, nullptr, &message) != SQLITE_OK) {
-            SYNC_ERR("remake calendar DB file is Failed : %s", message != nullptr ? message : "");
-            sqlite3_free(message);
-        }
+    // All tables or none: a reader or the next start never sees half a store.
+    std::string schema = "BEGIN IMMEDIATE;";
+    for (const char* text : mSchema) schema.append(text).append(";");
+    schema += "COMMIT;";
+    if (sqlite3_exec(database.get(), schema.c_str(), nullptr, nullptr, nullptr) != SQLITE_OK) {
+        SYNC_ERR("remake calendar DB file is Failed : %s", sqlite3_errmsg(database.get()));
+        return kFailed;  // closing undoes what was begun
     }
-    db_util_close(database);
     if (const int result = createWithMode(path); result != kOk) return result;
     return createWithMode(path + "-journal");
 }

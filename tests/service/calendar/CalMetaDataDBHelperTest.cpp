@@ -63,6 +63,18 @@ TEST(CalMetaDataDBHelper, TheFirstReadMakesTheFilesAndFindsNothing) {
     EXPECT_EQ(store.getAllCalendarbookUri(1, &uris), kOk);
 }
 
+TEST(CalMetaDataDBHelper, AStoreThatNobodyFinishedMakingIsMadeAgain) {
+    const TestRoot root;
+    std::filesystem::create_directories(root.at(kFile).parent_path());
+    std::ofstream(root.at(kFile)).close();
+    CalMetaDataDBHelper store;
+    EXPECT_EQ(store.insertEvent(eventRow(1, 1, "a")), kOk);
+    CalMetaDataDBHelper again;
+    std::string uri;
+    EXPECT_EQ(again.getEventUri(1, &uri), kOk);
+    EXPECT_EQ(uri, "a");
+}
+
 TEST(CalMetaDataDBHelper, DeletionsCascade) {
     const TestRoot root;
     CalMetaDataDBHelper store;

@@ -139,7 +139,8 @@ std::string Store::tableText(const View& view) const {
     if (view.role == Role::kChild) text += ", parent INTEGER NOT NULL";
     if (view.role != Role::kChild)
         text +=
-            ", created_version INTEGER NOT NULL, version INTEGER NOT NULL, synced_version INTEGER NOT NULL";
+            ", created_version INTEGER NOT NULL, version INTEGER NOT NULL, synced_version INTEGER NOT NULL, "
+            "own_version INTEGER NOT NULL";
     for (const Property& property : view.properties) {
         if (property.column != nullptr && !property.readOnly) {
             text += std::string(", ") + property.column + " " + sqlType(property.type) + " NOT NULL";

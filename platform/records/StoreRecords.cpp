@@ -107,8 +107,8 @@ int Store::insertOne(Write& write, Record& record, int expected) {
 
 int Store::insertRow(Write& write, Record& record, int bookId) {
     const View& view = record.view();
-    std::string columns = "created_version, version, synced_version";
-    std::string places = "?, ?, ?";
+    std::string columns = "created_version, version, own_version, synced_version";
+    std::string places = "?, ?, ?, ?";
     for (const Property& property : view.properties) {
         if (!isColumn(property)) continue;
         columns += std::string(", ") + property.column;
@@ -117,7 +117,7 @@ int Store::insertRow(Write& write, Record& record, int bookId) {
     Statement statement = mConnection.prepare(std::string("INSERT INTO ") + view.table + "(" + columns +
                                               ") VALUES(" + places + ")");
     const int64_t version = write.version();
-    statement.bind(version).bind(version).bind(write.bySync() ? version : int64_t{0});
+    statement.bind(version).bind(version).bind(version).bind(write.bySync() ? version : int64_t{0});
     if (view.bookProperty != 0) record.setNumber(view.bookProperty, bookId);
     for (size_t i = 0; i < view.properties.size(); ++i) {
         if (isColumn(view.properties[i])) statement.bind(record.valueAt(i));
@@ -162,7 +162,7 @@ int Store::writeChildren(Record& record, int id, ChildWrite how) {
 
 int Store::writeColumns(Write& write, const View& view, int id, const Record& record, bool bySync,
                         const MayWrite& mayWrite) {
-    std::string columns = "version = ?";
+    std::string columns = "version = ?, own_version = ?";
     if (bySync) columns += ", synced_version = ?";
     for (size_t i = 0; i < view.properties.size(); ++i) {
         if (isColumn(view.properties[i]) && mayWrite(view.properties[i], i)) {
@@ -171,7 +171,7 @@ int Store::writeColumns(Write& write, const View& view, int id, const Record& re
     }
     Statement statement =
         mConnection.prepare(std::string("UPDATE ") + view.table + " SET " + columns + " WHERE id = ?");
-    statement.bind(int64_t{write.version()});
+    statement.bind(int64_t{write.version()}).bind(int64_t{write.version()});
     if (bySync) statement.bind(int64_t{write.version()});
     for (size_t i = 0; i < view.properties.size(); ++i) {
         if (isColumn(view.properties[i]) && mayWrite(view.properties[i], i))

@@ -1,6 +1,6 @@
 #include "calendar/CalBookSnapshot.h"
 
-#include <iterator>
+#include <algorithm>
 
 #include "calendar/CalRecordAccess.h"
 #include "common/SyncLog.h"
@@ -12,47 +12,44 @@ using sync_result::kOk;
 
 namespace {
 
-constexpr unsigned kStateProperties[] = {
-    CALENDAR_EVENT_ID,
-    CALENDAR_EVENT_VERSION,
-    CALENDAR_EVENT_SYNCED_VERSION,
-    CALENDAR_EVENT_ORIGINAL_EVENT_ID,
-    CALENDAR_EVENT_UID,
-    CALENDAR_EVENT_SYNC_DATA2,
-    CALENDAR_EVENT_RECURRENCE_ID,
-};
-
-int readRecordStates(int bookId, std::unordered_map<int, CalRecordState>* states) {
+int readRecordStates(const CalItemKind& kind, int bookId, std::unordered_map<int, CalRecordState>* states) {
+    std::vector<unsigned> properties = {kind.id, kind.version, kind.syncedVersion, kind.uid, kind.etag};
+    if (kind.hasSeries())
+        properties.insert(properties.end(), {kind.ownVersion, kind.seriesId, kind.recurrenceId});
     calendar_query_h rawQuery = nullptr;
-    if (calendar_query_create(_calendar_event, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
+    if (calendar_query_create(kind.view, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
     const CalendarQuery query(rawQuery);
     calendar_list_h rawList = nullptr;
-    if (calendar_query_add_filter_int(query.get(), CALENDAR_EVENT_BOOK_ID, bookId) != PLATFORM_ERROR_NONE ||
-        calendar_query_set_projection(query.get(), kStateProperties, std::size(kStateProperties)) !=
+    if (calendar_query_add_filter_int(query.get(), kind.bookId, bookId) != PLATFORM_ERROR_NONE ||
+        calendar_query_set_projection(query.get(), properties.data(), properties.size()) !=
             PLATFORM_ERROR_NONE ||
         calendar_db_get_records_with_query(query.get(), 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("get_records_with_query fail");
         return kFailed;
     }
     const CalendarList list(rawList);
-    cal_record::forEach(list.get(), [states](calendar_record_h record) {
+    cal_record::forEach(list.get(), [&kind, states](calendar_record_h record) {
         CalRecordState state;
-        state.version = intOf(record, CALENDAR_EVENT_VERSION);
-        state.syncedVersion = intOf(record, CALENDAR_EVENT_SYNCED_VERSION);
-        state.originalEventId = intOf(record, CALENDAR_EVENT_ORIGINAL_EVENT_ID);
-        state.uid = textOf(record, CALENDAR_EVENT_UID);
-        state.etag = textOf(record, CALENDAR_EVENT_SYNC_DATA2);
-        state.recurrenceId = textOf(record, CALENDAR_EVENT_RECURRENCE_ID);
-        states->emplace(intOf(record, CALENDAR_EVENT_ID), std::move(state));
+        state.version = intOf(record, kind.version);
+        state.ownVersion = intOf(record, kind.ownVersion);
+        state.syncedVersion = intOf(record, kind.syncedVersion);
+        state.uid = textOf(record, kind.uid);
+        state.etag = textOf(record, kind.etag);
+        if (kind.hasSeries()) {
+            state.originalEventId = intOf(record, kind.seriesId);
+            state.recurrenceId = textOf(record, kind.recurrenceId);
+        }
+        states->emplace(intOf(record, kind.id), std::move(state));
     });
     return kOk;
 }
 
-// Events that a user deleted since the book's changes were last examined.
-int readUnseenDeletions(const CalBookMetaData& book, std::unordered_set<int>* eventIds) {
+// Items that a user deleted since the book's changes were last examined.
+int readUnseenDeletions(const CalItemKind& kind, const CalBookMetaData& book,
+                        std::unordered_set<int>* eventIds) {
     calendar_list_h rawList = nullptr;
     int current = 0;
-    if (calendar_db_get_changes_by_version(_calendar_event, book.calendar_id, book.sync_version, &rawList,
+    if (calendar_db_get_changes_by_version(kind.view, book.calendar_id, book.sync_version, &rawList,
                                            &current) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("db_get_changes_by_version fail");
         return kFailed;
@@ -69,11 +66,11 @@ int readUnseenDeletions(const CalBookMetaData& book, std::unordered_set<int>* ev
 
 }  // namespace
 
-int CalBookSnapshot::load(CalMetaDataDBHelper& metaData, const CalBookMetaData& book) {
+int CalBookSnapshot::load(CalItemStore& store, const CalBookMetaData& book) {
     mBook = book;
     // Rows before records: a record that appears in between is the user's own and has no row to be compared with.
-    if (metaData.getAllEvents(book.calendar_id, &mRows) != kOk) return kFailed;
-    if (readRecordStates(book.calendar_id, &mRecords) != kOk) return kFailed;
+    if (store.getAllItems(book.calendar_id, &mRows) != kOk) return kFailed;
+    if (readRecordStates(mKind, book.calendar_id, &mRecords) != kOk) return kFailed;
 
     std::unordered_set<int> withRow;
     bool someMissing = false;
@@ -87,7 +84,21 @@ int CalBookSnapshot::load(CalMetaDataDBHelper& metaData, const CalBookMetaData& 
             mOrphans.emplace(state.uid, eventId);
         }
     }
-    return someMissing ? readUnseenDeletions(book, &mDeletedByUser) : kOk;
+    readUnconfirmed();
+    return someMissing ? readUnseenDeletions(mKind, book, &mDeletedByUser) : kOk;
+}
+
+void CalBookSnapshot::readUnconfirmed() {
+    for (size_t i = 0; i < mRows.size(); ++i) {
+        const CalEventMetaData& row = mRows[i];
+        if (!row.uri.empty() || row.etag != kUnconfirmedEtag || row.original_event_id != 0) continue;
+        calendar_record_h raw = nullptr;
+        if (calendar_db_get_record(mKind.view, row.event_id, &raw) != PLATFORM_ERROR_NONE) continue;
+        const CalendarRecord record(raw);
+        // The version comes with the content: an edit after this look is still to be found.
+        mRecords[row.event_id].version = intOf(raw, mKind.version);
+        mUnconfirmed.emplace(mKind.comparable(raw), i);
+    }
 }
 
 void CalBookSnapshot::index(size_t position) {
@@ -123,6 +134,11 @@ int CalBookSnapshot::orphan(const std::string& uri) const {
     return found == mOrphans.end() ? 0 : found->second;
 }
 
+const CalEventMetaData* CalBookSnapshot::unconfirmed(const std::string& body) const {
+    const auto found = mUnconfirmed.find(body);
+    return found == mUnconfirmed.end() ? nullptr : &mRows[found->second];
+}
+
 std::vector<const CalEventMetaData*> CalBookSnapshot::knownToServer() const {
     std::vector<const CalEventMetaData*> rows;
     rows.reserve(mByUri.size());
@@ -140,7 +156,21 @@ bool CalBookSnapshot::hasLocalChange(const CalEventMetaData& row) const {
     if (row.event_id <= 0) return false;
     const CalRecordState* state = record(row.event_id);
     if (state == nullptr) return mDeletedByUser.contains(row.event_id);
-    return state->version != row.version && !state->isEnginesOwnWrite();
+    // What only its exceptions brought to a series is their change, not its own.
+    return state->ownVersion > std::max(row.version, state->syncedVersion);
+}
+
+bool CalBookSnapshot::hasChangedInstance(int seriesEventId) const {
+    for (auto found = mInstances.lower_bound({seriesEventId, std::string()});
+         found != mInstances.end() && found->first.first == seriesEventId; ++found) {
+        if (hasLocalChange(mRows[found->second])) return true;
+    }
+    return false;
+}
+
+bool CalBookSnapshot::hasUnseenChange(const CalEventMetaData& row) const {
+    const CalRecordState* state = record(row.event_id);
+    return state != nullptr && state->version > std::max(row.version, state->syncedVersion);
 }
 
 void CalBookSnapshot::put(const CalEventMetaData& row) {
@@ -159,6 +189,8 @@ void CalBookSnapshot::put(const CalEventMetaData& row) {
     }
     index(position);
     mOrphans.erase(row.uri);
+    std::erase_if(mUnconfirmed,
+                  [&](const auto& entry) { return mRows[entry.second].event_id == row.event_id; });
 }
 
 void CalBookSnapshot::setVersion(int seriesEventId, int version) {

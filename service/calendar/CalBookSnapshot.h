@@ -9,11 +9,13 @@
 #include <utility>
 #include <vector>
 
-#include "calendar/CalMetaDataDBHelper.h"
+#include "calendar/CalItemKind.h"
+#include "calendar/CalItemStore.h"
 
-// The state of an event record on the device.
+// The state of a record on the device.
 struct CalRecordState {
     int version = 0;        // of its last write (a series: also of its exceptions)
+    int ownVersion = 0;     // of its last write, exceptions left out
     int syncedVersion = 0;  // of the sync's own last write, 0 when it never wrote it
     int originalEventId = 0;
     std::string uid;
@@ -25,9 +27,12 @@ struct CalRecordState {
 
 class CalBookSnapshot {
 public:
-    // Reads the rows and records of `book`.
-    [[nodiscard]] int load(CalMetaDataDBHelper& metaData, const CalBookMetaData& book);
+    explicit CalBookSnapshot(const CalItemKind& kind) : mKind(kind) {}
 
+    // Reads the rows and records of `book`.
+    [[nodiscard]] int load(CalItemStore& store, const CalBookMetaData& book);
+
+    [[nodiscard]] const CalItemKind& kind() const { return mKind; }
     [[nodiscard]] const CalBookMetaData& book() const { return mBook; }
 
     // The row of an ordinary event or series, or of an instance by its own uri; NULL when unknown.
@@ -38,6 +43,9 @@ public:
     [[nodiscard]] const CalRecordState* record(int eventId) const;
     // The id of a record that the sync once wrote for `uri` and that has no row, 0 when none.
     [[nodiscard]] int orphan(const std::string& uri) const;
+    // The row of an item that may have reached the server and that says the same as `body`, NULL when none.
+    [[nodiscard]] const CalEventMetaData* unconfirmed(const std::string& body) const;
+    [[nodiscard]] bool hasUnconfirmed() const { return !mUnconfirmed.empty(); }
     // Rows that the server knows by a uri of their own: what a complete list may delete.
     [[nodiscard]] std::vector<const CalEventMetaData*> knownToServer() const;
 
@@ -45,6 +53,10 @@ public:
     [[nodiscard]] bool isLost(const CalEventMetaData& row) const;
     // Whether the device's record holds a change that has not been sent: a mark, or a version that nobody but a user wrote.
     [[nodiscard]] bool hasLocalChange(const CalEventMetaData& row) const;
+    // The same of any instance of a series.
+    [[nodiscard]] bool hasChangedInstance(int seriesEventId) const;
+    // Whether a user wrote the record, or an exception of the series, since the change walk last looked.
+    [[nodiscard]] bool hasUnseenChange(const CalEventMetaData& row) const;
 
     // Keeps the snapshot in step with what a page wrote.
     void put(const CalEventMetaData& row);
@@ -56,13 +68,16 @@ private:
     using InstanceKey = std::pair<int, std::string>;
 
     void index(size_t position);
+    void readUnconfirmed();
 
+    const CalItemKind& mKind;
     CalBookMetaData mBook;
     std::vector<CalEventMetaData> mRows;
     std::unordered_map<std::string, size_t> mByUri;
     std::unordered_map<int, size_t> mByEventId;  // ordinary events
     std::map<InstanceKey, size_t> mInstances;
     std::unordered_map<int, CalRecordState> mRecords;
-    std::unordered_map<std::string, int> mOrphans;  // by server id
-    std::unordered_set<int> mDeletedByUser;         // not examined yet
+    std::unordered_map<std::string, int> mOrphans;    // by server id
+    std::unordered_set<int> mDeletedByUser;           // not examined yet
+    std::multimap<std::string, size_t> mUnconfirmed;  // rows by what their records say
 };

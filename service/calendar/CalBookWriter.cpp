@@ -1,8 +1,8 @@
-// The calendar (book) half of CalDataManager.
+// The half of CalManager that keeps books.
 #include <cstdio>
 #include <map>
 
-#include "calendar/CalDataManager.h"
+#include "calendar/CalManager.h"
 #include "calendar/CalRecordAccess.h"
 #include "calendar/CalTransaction.h"
 #include "common/SyncLog.h"
@@ -14,8 +14,7 @@ using sync_result::kOk;
 
 namespace {
 
-constexpr int kEventBook = 1;  // CALENDAR_BOOK_STORE_TYPE
-constexpr int kWritable = 0;   // CALENDAR_BOOK_MODE
+constexpr int kWritable = 0;  // CALENDAR_BOOK_MODE
 constexpr int kReadOnly = 1;
 
 // "#0a141e" as the record's "10.20.30.255"; empty when the text is no colour.
@@ -37,7 +36,7 @@ bool fillBook(calendar_record_h record, const CalListInfo& entry) {
            calendar_record_set_str(record, CALENDAR_BOOK_COLOR, color.c_str()) == PLATFORM_ERROR_NONE;
 }
 
-int makeBookRecord(int accountId, const CalListInfo& entry, CalendarRecord* out) {
+int makeBookRecord(const CalItemKind& kind, int accountId, const CalListInfo& entry, CalendarRecord* out) {
     calendar_record_h raw = nullptr;
     if (calendar_record_create(_calendar_book, &raw) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("record create fail");
@@ -45,7 +44,7 @@ int makeBookRecord(int accountId, const CalListInfo& entry, CalendarRecord* out)
     }
     CalendarRecord record(raw);
     if (calendar_record_set_int(raw, CALENDAR_BOOK_ACCOUNT_ID, accountId) != PLATFORM_ERROR_NONE ||
-        calendar_record_set_int(raw, CALENDAR_BOOK_STORE_TYPE, kEventBook) != PLATFORM_ERROR_NONE ||
+        calendar_record_set_int(raw, CALENDAR_BOOK_STORE_TYPE, kind.storeType) != PLATFORM_ERROR_NONE ||
         calendar_record_set_str(raw, CALENDAR_BOOK_SYNC_DATA1, entry.id.c_str()) != PLATFORM_ERROR_NONE ||
         !fillBook(raw, entry)) {
         SYNC_ERR("record set fail");
@@ -55,14 +54,14 @@ int makeBookRecord(int accountId, const CalListInfo& entry, CalendarRecord* out)
     return kOk;
 }
 
-// The account's event books in the calendar service: id -> server id.
-int readBooks(int accountId, std::map<int, std::string>* books) {
+// The account's books in the calendar service: id -> server id.
+int readBooks(const CalItemKind& kind, int accountId, std::map<int, std::string>* books) {
     calendar_query_h rawQuery = nullptr;
     if (calendar_query_create(_calendar_book, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
     const CalendarQuery query(rawQuery);
     calendar_list_h rawList = nullptr;
     if (calendar_query_add_filter_int(rawQuery, CALENDAR_BOOK_ACCOUNT_ID, accountId) != PLATFORM_ERROR_NONE ||
-        calendar_query_add_filter_int(rawQuery, CALENDAR_BOOK_STORE_TYPE, kEventBook) !=
+        calendar_query_add_filter_int(rawQuery, CALENDAR_BOOK_STORE_TYPE, kind.storeType) !=
             PLATFORM_ERROR_NONE ||
         calendar_db_get_records_with_query(rawQuery, 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("get_records_with_query fail");
@@ -87,36 +86,42 @@ int deleteBookRecords(const std::vector<int>& ids) {
 
 }  // namespace
 
-int CalDataManager::insertCalendarbook(int accountId, const CalListInfo& entry) {
-    CalMetaDataDBHelper* metaData = prepared();
+CalItemStore* CalManager::prepared() {
+    CalItemStore* store = prepareStore();
+    if (store == nullptr) SYNC_ERR("not prepare sync");
+    return store;
+}
+
+int CalManager::insertBook(int accountId, const CalListInfo& entry) {
+    CalItemStore* store = prepared();
     CalendarRecord record;
-    if (metaData == nullptr || makeBookRecord(accountId, entry, &record) != kOk) return kFailed;
+    if (store == nullptr || makeBookRecord(mKind, accountId, entry, &record) != kOk) return kFailed;
     CalBookMetaData row;
     if (calendar_db_insert_record(record.get(), &row.calendar_id, {.by_sync = true}) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("db_insert_record fail");
+        SYNC_ERR("%s", mKind.texts.insertBookRecord);
         return kFailed;
     }
     row.account_id = accountId;
     row.uri = entry.id;
     row.etag = entry.etag;
     if (calendar_db_get_last_change_version(&row.sync_version) != PLATFORM_ERROR_NONE ||
-        metaData->insertCalendarbook(row) != kOk) {
+        store->books().insert(row) != kOk) {
         SYNC_ERR("metaDB insertcalendarbook fail");
         return kFailed;
     }
     return kOk;
 }
 
-int CalDataManager::updateCalendarbooks(int accountId, const CalList& entries) {
-    CalMetaDataDBHelper* metaData = prepared();
-    if (metaData == nullptr) return kFailed;
+int CalManager::updateBooks(int accountId, const CalList& entries) {
+    CalItemStore* store = prepared();
+    if (store == nullptr) return kFailed;
     calendar_list_h rawList = nullptr;
     if (calendar_list_create(&rawList) != PLATFORM_ERROR_NONE) return kFailed;
     const CalendarList list(rawList);
     std::vector<CalBookMetaData> rows;
     for (const CalListInfoPtr& entry : entries) {
         CalBookMetaData row;
-        if (metaData->getCalendarbook(accountId, entry->id, &row) != kOk) continue;
+        if (store->books().get(accountId, entry->id, &row) != kOk) continue;
         calendar_record_h raw = nullptr;
         if (calendar_db_get_record(_calendar_book, row.calendar_id, &raw) != PLATFORM_ERROR_NONE) {
             SYNC_ERR("db_get_record fail");
@@ -138,7 +143,7 @@ int CalDataManager::updateCalendarbooks(int accountId, const CalList& entries) {
     }
     int result = kOk;
     for (const CalBookMetaData& row : rows) {
-        if (metaData->updateCalendarbook(row) != kOk) {
+        if (store->books().update(row) != kOk) {
             SYNC_ERR("metaDB updatecalendarbook fail");
             result = kFailed;
         }
@@ -146,70 +151,59 @@ int CalDataManager::updateCalendarbooks(int accountId, const CalList& entries) {
     return result;
 }
 
-int CalDataManager::updateCalendarbookUri(int calendarId, const std::string& uri, const std::string& etag) {
-    CalMetaDataDBHelper* metaData = prepared();
-    if (metaData == nullptr) return kFailed;
-    if (metaData->updateCalendarbookUri(calendarId, uri, etag) != kOk) {
-        SYNC_ERR("metaDB updatecalendarbook fail");
-        return kFailed;
-    }
-    return kOk;
-}
-
-int CalDataManager::getCalendarbookEtag(int accountId, const std::string& uri, std::string* etag) {
-    CalMetaDataDBHelper* metaData = prepared();
+int CalManager::deleteBook(int accountId, const std::string& uri) {
+    CalItemStore* store = prepared();
     CalBookMetaData row;
-    if (metaData == nullptr || metaData->getCalendarbook(accountId, uri, &row) != kOk) return kFailed;
-    *etag = row.etag;
-    return kOk;
-}
-
-int CalDataManager::deleteCalendarbook(int accountId, const std::string& uri) {
-    CalMetaDataDBHelper* metaData = prepared();
-    CalBookMetaData row;
-    if (metaData == nullptr || metaData->getCalendarbook(accountId, uri, &row) != kOk) return kFailed;
-    std::vector<CalEventMetaData> events;
-    if (metaData->getAllEvents(row.calendar_id, &events) != kOk) return kFailed;
-    for (const CalEventMetaData& event : events) {
-        if (event.dirty == 0) continue;
-        SYNC_ERR(
-            "calendar(%s) is no longer on the server, event(%d, %s) goes with its change that was not sent",
-            uri.c_str(), event.event_id, event.uri.c_str());
+    if (store == nullptr || store->books().get(accountId, uri, &row) != kOk) return kFailed;
+    std::vector<CalEventMetaData> items;
+    if (store->getAllItems(row.calendar_id, &items) != kOk) return kFailed;
+    for (const CalEventMetaData& item : items) {
+        if (item.dirty == 0) continue;
+        SYNC_ERR("%s(%s) is no longer on the server, %s(%d, %s) goes with its change that was not sent",
+                 mKind.bookName, uri.c_str(), mKind.itemName, item.event_id, item.uri.c_str());
     }
     const int code = calendar_db_delete_record(_calendar_book, row.calendar_id, {.by_sync = true});
     if (code != PLATFORM_ERROR_NONE && code != PLATFORM_ERROR_NOT_FOUND) {
         SYNC_ERR("db_delete_records fail");
         return kFailed;
     }
-    return metaData->deleteCalendarbook(accountId, uri);
+    return store->books().remove(accountId, uri);
 }
 
-int CalDataManager::reconcileCalendarbooks(int accountId) {
-    CalMetaDataDBHelper* metaData = prepared();
+bool CalManager::isReadOnly(int calendarId) {
+    calendar_record_h raw = nullptr;
+    if (calendar_db_get_record(_calendar_book, calendarId, &raw) != PLATFORM_ERROR_NONE) return false;
+    const CalendarRecord record(raw);
+    return intOf(raw, CALENDAR_BOOK_MODE) == kReadOnly;
+}
+
+int CalManager::reconcileBooks(int accountId) {
+    CalItemStore* store = prepared();
     std::map<int, std::string> books;
     std::list<int> known;
-    if (metaData == nullptr || readBooks(accountId, &books) != kOk ||
-        metaData->getAllCalendarbookIds(accountId, &known) != kOk) {
+    if (store == nullptr || readBooks(mKind, accountId, &books) != kOk ||
+        store->books().getIds(accountId, &known) != kOk) {
         return kFailed;
     }
     for (const int calendarId : known) {
         if (books.erase(calendarId) != 0) continue;
         std::string uri;
-        if (metaData->getCalendarbookUri(calendarId, &uri) != kOk) return kFailed;
-        SYNC_ERR("calendar(%s) was deleted on the device, the download makes it again", uri.c_str());
-        if (metaData->deleteCalendarbook(accountId, uri) != kOk) return kFailed;
+        if (store->books().getUri(calendarId, &uri) != kOk) return kFailed;
+        SYNC_ERR("%s(%s) was deleted on the device, the download makes it again", mKind.bookName,
+                 uri.c_str());
+        if (store->books().remove(calendarId) != kOk) return kFailed;
     }
     for (const auto& [calendarId, uri] : books) {
         if (uri.empty()) continue;
         CalBookMetaData row;
-        if (metaData->getCalendarbook(accountId, uri, &row) == kOk) continue;
-        SYNC_ERR("calendar(%s) is taken over from an interrupted sync", uri.c_str());
+        if (store->books().get(accountId, uri, &row) == kOk) continue;
+        SYNC_ERR("%s(%s) is taken over from an interrupted sync", mKind.bookName, uri.c_str());
         // Version 0: every change of the book is still to be examined. No etag: the book is compared as changed.
         row = CalBookMetaData{};
         row.calendar_id = calendarId;
         row.account_id = accountId;
         row.uri = uri;
-        if (metaData->insertCalendarbook(row) != kOk) {
+        if (store->books().insert(row) != kOk) {
             SYNC_ERR("metaDB insertcalendarbook fail");
             return kFailed;
         }
@@ -217,24 +211,32 @@ int CalDataManager::reconcileCalendarbooks(int accountId) {
     return kOk;
 }
 
-int CalDataManager::deleteAccount(int accountId) {
-    CalMetaDataDBHelper* metaData = prepared();
-    if (metaData == nullptr) return kFailed;
+int CalManager::deleteAccount(int accountId) {
+    CalItemStore* store = prepared();
+    if (store == nullptr) return kFailed;
     std::list<int> known;
-    if (metaData->getCalendarbookIds(accountId, &known) != kOk) {
-        SYNC_ERR("getCalendarbookIds fail");
+    if (store->books().getIds(accountId, &known) != kOk) {
+        SYNC_ERR("%s", mKind.texts.bookIds);
         return kFailed;
     }
     // Books of an interrupted download have no row yet.
     std::map<int, std::string> books;
-    if (readBooks(accountId, &books) != kOk) return kFailed;
+    if (readBooks(mKind, accountId, &books) != kOk) return kFailed;
     for (const int calendarId : known) books.emplace(calendarId, std::string());
     std::vector<int> ids;
+    ids.reserve(books.size());
     for (const auto& [calendarId, uri] : books) ids.push_back(calendarId);
     if (deleteBookRecords(ids) != kOk) return kFailed;
-    if (const int result = metaData->deleteAccount(accountId); result != kOk) {
-        SYNC_ERR("metaDB deleteAccount fail(%d)", result);
+    return deleteBookRows(*store, accountId, ids);
+}
+
+int CalManager::getRecord(int itemId, CalendarRecord* record) {
+    if (prepared() == nullptr) return kFailed;
+    calendar_record_h raw = nullptr;
+    if (calendar_db_get_record(mKind.view, itemId, &raw) != PLATFORM_ERROR_NONE) {
+        SYNC_ERR("db_get_record fail");
         return kFailed;
     }
+    record->reset(raw);
     return kOk;
 }

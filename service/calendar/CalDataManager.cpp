@@ -1,14 +1,12 @@
 #include "calendar/CalDataManager.h"
 
-#include <unordered_set>
 #include <utility>
 
-#include "calendar/CalEventWriter.h"
+#include "calendar/CalItemWriter.h"
 #include "calendar/CalRecordAccess.h"
 #include "common/SyncLog.h"
 
 using cal_record::intOf;
-using cal_record::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 
@@ -16,9 +14,9 @@ namespace {
 
 // Loads a book's snapshot and writes one item as a page of its own.
 int writeOne(CalMetaDataDBHelper& metaData, const CalBookMetaData& book, const CalListInfoPtr& event) {
-    CalBookSnapshot snapshot;
+    CalBookSnapshot snapshot(kEventKind);
     if (snapshot.load(metaData, book) != kOk) return kFailed;
-    CalEventWriter writer(&metaData, &snapshot);
+    CalItemWriter writer(&metaData, &snapshot);
     CalListPage page;
     page.entries.push_back(event);
     const int written = writer.writePage(page);
@@ -61,14 +59,47 @@ int CalDataManager::prepareSync() {
     return kOk;
 }
 
-CalMetaDataDBHelper* CalDataManager::prepared() {
-    if (prepareSync() == kOk) return mpMetaData.get();
-    SYNC_ERR("not prepare sync");
-    return nullptr;
+bool CalDataManager::isBookChanged(int accountId, const CalListInfo& entry) {
+    std::string etag;
+    return getCalendarbookEtag(accountId, entry.id, &etag) != kOk || etag != entry.etag;
+}
+
+int CalDataManager::deleteBookRows(CalItemStore& store, int accountId,
+                                   const std::vector<int>& /*calendarIds*/) {
+    const int result = store.books().removeAccount(accountId);
+    if (result != kOk) SYNC_ERR("metaDB deleteAccount fail(%d)", result);
+    return result;
+}
+
+int CalDataManager::updateCalendarbookUri(int calendarId, const std::string& uri, const std::string& etag) {
+    CalMetaDataDBHelper* metaData = preparedStore();
+    if (metaData == nullptr) return kFailed;
+    if (metaData->books().updateUri(calendarId, uri, etag) != kOk) {
+        SYNC_ERR("metaDB updatecalendarbook fail");
+        return kFailed;
+    }
+    return kOk;
+}
+
+int CalDataManager::getCalendarbookEtag(int accountId, const std::string& uri, std::string* etag) {
+    CalMetaDataDBHelper* metaData = preparedStore();
+    CalBookMetaData row;
+    if (metaData == nullptr || metaData->getCalendarbook(accountId, uri, &row) != kOk) return kFailed;
+    *etag = row.etag;
+    return kOk;
+}
+
+void CalDataManager::changedDBCallback(const char* view, void* userData) {
+    auto* self = static_cast<CalDataManager*>(userData);
+    if (self == nullptr || self->metaData() == nullptr) {
+        SYNC_ERR("fail");
+        return;
+    }
+    if (std::string_view(view) != _calendar_book) self->sendChanges();
 }
 
 int CalDataManager::insertEvent(int accountId, const std::string& bookUri, const CalListInfoPtr& event) {
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     if (metaData == nullptr) return kFailed;
     CalBookMetaData book;
     if (metaData->getCalendarbook(accountId, bookUri, &book) != kOk) {
@@ -79,7 +110,7 @@ int CalDataManager::insertEvent(int accountId, const std::string& bookUri, const
 }
 
 int CalDataManager::updateEvent(int accountId, const std::string& bookUri, const CalListInfoPtr& event) {
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     if (metaData == nullptr) return kFailed;
     CalBookMetaData book;
     CalEventMetaData row;
@@ -92,7 +123,7 @@ int CalDataManager::updateEvent(int accountId, const std::string& bookUri, const
 }
 
 int CalDataManager::deleteEvent(int calendarId, const std::string& uri) {
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     if (metaData == nullptr) return kFailed;
     CalEventMetaData row;
     if (metaData->getEvent(calendarId, uri, &row) != kOk) {
@@ -110,14 +141,7 @@ int CalDataManager::deleteEvent(int calendarId, const std::string& uri) {
 }
 
 int CalDataManager::getEvent(int eventId, CalendarRecord* record) {
-    if (prepared() == nullptr) return kFailed;
-    calendar_record_h raw = nullptr;
-    if (calendar_db_get_record(_calendar_event, eventId, &raw) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("db_get_record fail");
-        return kFailed;
-    }
-    record->reset(raw);
-    return kOk;
+    return getRecord(eventId, record);
 }
 
 int CalDataManager::updateEventUri(int eventId, const std::string& uri, const std::string& etag) {
@@ -141,7 +165,7 @@ int CalDataManager::updateExceptionEventUri(int originalEventId, const std::stri
 
 template <class Read, class Write>
 int CalDataManager::updateRow(Read read, Write write, const std::string& uri, const std::string& etag) {
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     if (metaData == nullptr) return kFailed;
     SyncTransaction transaction(metaData->database());
     CalEventMetaData row;
@@ -162,7 +186,7 @@ int CalDataManager::updateRow(Read read, Write write, const std::string& uri, co
 
 template <class... Params, class... Args>
 int CalDataManager::forward(int (CalMetaDataDBHelper::*operation)(Params...), Args&&... args) {
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     return metaData == nullptr ? kFailed : (metaData->*operation)(std::forward<Args>(args)...);
 }
 
@@ -197,11 +221,11 @@ int CalDataManager::getEventId(int calendarId, const std::string& uri, int* even
     return forward(&CalMetaDataDBHelper::getEventId, calendarId, uri, eventId);
 }
 int CalDataManager::getEventEtag(int eventId, std::string* etag) {
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     return metaData == nullptr ? kFailed : metaData->getEventEtag(eventId, etag);
 }
 int CalDataManager::getEventEtag(int calendarId, const std::string& uri, std::string* etag) {
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     return metaData == nullptr ? kFailed : metaData->getEventEtag(calendarId, uri, etag);
 }
 int CalDataManager::getAllDirtyEventIds(const std::string& bookUri, std::list<int>* eventIds) {
@@ -225,13 +249,10 @@ int CalDataManager::hasExceptionEvent(int originalEventId) {
 int CalDataManager::getAllExceptionEvents(int originalEventId, std::list<std::string>* recurrenceIds) {
     return forward(&CalMetaDataDBHelper::getAllExceptionEvents, originalEventId, recurrenceIds);
 }
-int CalDataManager::countPending(int accountId, int* dirty, int* deleted) {
-    return forward(&CalMetaDataDBHelper::countPending, accountId, dirty, deleted);
-}
 int CalDataManager::getExceptionEventUri(int originalEventId, const std::string& recurrenceId,
                                          std::string* uri) {
     CalEventMetaData row;
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     if (metaData == nullptr || metaData->getEvent(CalInstanceKey{originalEventId, recurrenceId}, &row) != kOk)
         return kFailed;
     *uri = row.uri;
@@ -240,7 +261,7 @@ int CalDataManager::getExceptionEventUri(int originalEventId, const std::string&
 int CalDataManager::getExceptionEventEtag(int originalEventId, const std::string& recurrenceId,
                                           std::string* etag) {
     CalEventMetaData row;
-    CalMetaDataDBHelper* metaData = prepared();
+    CalMetaDataDBHelper* metaData = preparedStore();
     if (metaData == nullptr || metaData->getEvent(CalInstanceKey{originalEventId, recurrenceId}, &row) != kOk)
         return kFailed;
     *etag = row.etag;

@@ -16,27 +16,30 @@
 
 #include "calendar/CalBookSnapshot.h"
 #include "calendar/CalListInfo.h"
+#include "calendar/CalManager.h"
 #include "calendar/CalMetaDataDBHelper.h"
 #include "platform/calendar.h"
 
-class CalDataManager {
+class CalDataManager : public CalManager {
 public:
     static CalDataManager& getInstance();
 
-    CalDataManager() = default;
-    ~CalDataManager();
-    CalDataManager(const CalDataManager&) = delete;
-    CalDataManager& operator=(const CalDataManager&) = delete;
+    CalDataManager() : CalManager(kEventKind) {}
+    ~CalDataManager() override;
 
     // Connects to the calendar service, makes the metadata store, registers the change callback. Later calls return at once.
     [[nodiscard]] int prepareSync();
 
     // --- calendars
-    [[nodiscard]] int insertCalendarbook(int accountId, const CalListInfo& entry);
-    // Writes name, colour and access role of known books in one batch, and their rows' etags.
-    [[nodiscard]] int updateCalendarbooks(int accountId, const CalList& entries);
-    // The book with its events, on the device and in the metadata store.
-    [[nodiscard]] int deleteCalendarbook(int accountId, const std::string& uri);
+    [[nodiscard]] int insertCalendarbook(int accountId, const CalListInfo& entry) {
+        return insertBook(accountId, entry);
+    }
+    [[nodiscard]] int updateCalendarbooks(int accountId, const CalList& entries) {
+        return updateBooks(accountId, entries);
+    }
+    [[nodiscard]] int deleteCalendarbook(int accountId, const std::string& uri) {
+        return deleteBook(accountId, uri);
+    }
     [[nodiscard]] int updateCalendarbookUri(int calendarId, const std::string& uri, const std::string& etag);
     [[nodiscard]] int getCalendarbookUri(int calendarId, std::string* uri);
     [[nodiscard]] int getCalendarbookId(int accountId, const std::string& uri, int* calendarId);
@@ -47,12 +50,10 @@ public:
     [[nodiscard]] int getAllDeletedCalendarbookIds(int accountId, std::list<int>* calendarIds);
     [[nodiscard]] int clearDirtyCalendarbook(int calendarId);
     [[nodiscard]] int clearDeletedCalendarbook(int calendarId);
-    // Makes rows and books agree before a comparison: rows of books that were deleted on the device go, a book of the account
-    // without a row (a download that was cut off) gets its row again.
-    [[nodiscard]] int reconcileCalendarbooks(int accountId);
-    [[nodiscard]] int deleteAccount(int accountId);
+    // By etag.
+    [[nodiscard]] bool isBookChanged(int accountId, const CalListInfo& entry) override;
 
-    // --- events. One item; the sync writes pages through CalEventWriter, which these use.
+    // --- events. One item; the sync writes pages through CalItemWriter, which these use.
     [[nodiscard]] int insertEvent(int accountId, const std::string& bookUri, const CalListInfoPtr& event);
     [[nodiscard]] int updateEvent(int accountId, const std::string& bookUri, const CalListInfoPtr& event);
     [[nodiscard]] int deleteEvent(int calendarId, const std::string& uri);
@@ -77,27 +78,24 @@ public:
                                               const std::string& uri, const std::string& etag);
 
     // --- local changes
-    // Whether the calendar service has a change of the book that the sync has not examined, its own writes left out.
-    [[nodiscard]] bool setChanged(int calendarId);
-    // Brings the dirty and deleted marks up to date.
-    [[nodiscard]] int setCalendarbookChanged(int calendarId);
-    [[nodiscard]] int setAccountChanged(int accountId);
-    // Marks that wait, or changes not examined yet.
-    [[nodiscard]] bool hasSomethingToSend(int accountId);
-    [[nodiscard]] int countPending(int accountId, int* dirty, int* deleted);
+    [[nodiscard]] int setCalendarbookChanged(int calendarId) { return setBookChanged(calendarId); }
     static void changedDBCallback(const char* view, void* userData);
 
     // The store, prepared.
     [[nodiscard]] CalMetaDataDBHelper* metaData() { return mpMetaData.get(); }
 
+protected:
+    CalItemStore* prepareStore() override {
+        return prepareSync() == sync_result::kOk ? mpMetaData.get() : nullptr;
+    }
+    int deleteBookRows(CalItemStore& store, int accountId, const std::vector<int>& calendarIds) override;
+
 private:
-    // The store, or NULL ("not prepare sync" logged).
-    CalMetaDataDBHelper* prepared();
+    CalMetaDataDBHelper* preparedStore() { return prepared() != nullptr ? mpMetaData.get() : nullptr; }
     template <class... Params, class... Args>
     int forward(int (CalMetaDataDBHelper::*operation)(Params...), Args&&... args);
     template <class Read, class Write>
     int updateRow(Read read, Write write, const std::string& uri, const std::string& etag);
-    [[nodiscard]] bool anyBookChanged(int accountId);
 
     std::mutex mPrepareMutex;
     bool mConnected = false;                          // guarded by mPrepareMutex

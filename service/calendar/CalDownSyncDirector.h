@@ -1,11 +1,11 @@
-// CalDownSyncDirector: brings one account's server calendars and events down to the device.
+// CalDownSyncDirector: brings one account's server calendars and events, task lists and tasks down to the device.
 // Owner: the calendar agent; lives as long as it.   Threads: run() on the worker, one at a time.
 //
-// Steps of a run, each waiting for the one before:
-//   1. make the rows of the account's books agree with the device's books
-//   2. fetch the calendar list; compare by id and etag; a list that would delete much is fetched twice
+// Steps of a run, first for calendars, then for task lists ("books"), each waiting for the one before:
+//   1. make the rows of the account's books agree with the device's books; mark what was changed on the device
+//   2. fetch the list of books; compare with what is known; a list that would delete much is fetched twice
 //   3. delete books that are gone, update those that changed
-//   4. compare the events of each known book, page by page; a complete list then deletes
+//   4. compare the items of each known book, page by page; a complete list then deletes
 //   5. create new books and fill them
 #pragma once
 
@@ -13,12 +13,12 @@
 #include <string>
 #include <vector>
 
-#include "calendar/CalDownSyncTasks.h"
+#include "calendar/CalSyncSide.h"
 #include "common/SyncCurl.h"
 #include "common/SyncDirector.h"
 
 class Account;
-class CalEventWriter;
+class CalItemWriter;
 
 class CalDownSyncDirector : public SyncDirector, private IProgressObserver {
 public:
@@ -30,7 +30,9 @@ public:
     [[nodiscard]] std::string lastFailure() const override;
 
     // Calendars and events.
-    [[nodiscard]] int syncCalendar();
+    [[nodiscard]] int syncCalendar() { return syncBooks(mEvents); }
+    // Task lists and tasks.
+    [[nodiscard]] int syncTodo() { return syncBooks(mTodos); }
 
 private:
     // What is to be done with the account's books.
@@ -41,27 +43,32 @@ private:
         CalList fresh;
         std::vector<std::string> gone;
     };
-    enum class EventPageMode { kComparing = 0, kFirstTime = 1 };
+    enum class PageMode { kComparing = 0, kFirstTime = 1 };
 
     int onProgress(double downloadTotal, double downloaded, double uploadTotal, double uploaded) override;
     [[nodiscard]] bool isStopped() const;
     // Remembers why the run failed (the first reason) and gives `result` back.
     int fail(int result, const std::string& text);
 
-    [[nodiscard]] int fetchCalendars(CalListPage* listed);
-    [[nodiscard]] int planBooks(BookPlan* plan);
-    [[nodiscard]] int proveBookDeletions(BookPlan* plan);
-    [[nodiscard]] int deleteBooks(const BookPlan& plan);
-    [[nodiscard]] int insertBooks(const BookPlan& plan);
-    // Compares the events of each calendar; one that fails does not keep the others, unless the server is out of reach.
-    [[nodiscard]] int syncEvents(const CalList& calendars, EventPageMode mode);
-    [[nodiscard]] int syncEventPage(const std::string& calendarUri, EventPageMode mode);
-    [[nodiscard]] int secondLook(const std::string& calendarUri, CalEventWriter* writer);
+    [[nodiscard]] int syncBooks(CalSyncSide& side);
+    [[nodiscard]] int fetchBooks(CalSyncSide& side, CalListPage* listed);
+    [[nodiscard]] int planBooks(CalSyncSide& side, BookPlan* plan);
+    [[nodiscard]] int proveBookDeletions(CalSyncSide& side, BookPlan* plan);
+    [[nodiscard]] int deleteBooks(CalSyncSide& side, const BookPlan& plan);
+    [[nodiscard]] int insertBooks(CalSyncSide& side, const BookPlan& plan);
+    // Compares the items of each book; one that fails does not keep the others, unless the server is out of reach.
+    [[nodiscard]] int syncItems(CalSyncSide& side, const CalList& books, PageMode mode);
+    [[nodiscard]] int syncPage(CalSyncSide& side, const std::string& bookUri, PageMode mode);
+    [[nodiscard]] int writePages(CalSyncSide& side, const std::string& bookUri,
+                                 const CalBookSnapshot& snapshot, CalItemWriter* writer, int* written);
+    [[nodiscard]] int deleteProven(CalSyncSide& side, const std::string& bookUri,
+                                   const CalBookSnapshot& snapshot, CalItemWriter* writer, int* written);
+    [[nodiscard]] int secondLook(CalSyncSide& side, const std::string& bookUri, CalItemWriter* writer);
 
     Account* const mpAccount;
     IStopQuery* const mpStopQuery;
     std::shared_ptr<HttpShare> mpShare;
-    CalDownSyncBookListTask mBookListTask;
-    CalDownSyncEventListTask mEventListTask;
+    CalEventSide mEvents;
+    CalTodoSide mTodos;
     std::string mFailure;  // worker thread while a run is going on, main thread after it
 };

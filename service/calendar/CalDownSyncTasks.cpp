@@ -11,13 +11,13 @@ using sync_result::kOk;
 
 namespace {
 
-constexpr long kHttpOkFirst = 200;
-constexpr long kHttpOkLast = 299;
 constexpr const char* kCalendars = "/calendar/v3/calendars/";
+constexpr const char* kLists = "/tasks/v1/lists/";
 
 std::string withToken(std::string path, const std::string& pageToken) {
-    if (!pageToken.empty()) path += "&pageToken=" + url_text::queryValue(pageToken);
-    return path;
+    if (pageToken.empty()) return path;
+    path += path.find('?') == std::string::npos ? '?' : '&';
+    return path + "pageToken=" + url_text::queryValue(pageToken);
 }
 
 }  // namespace
@@ -26,11 +26,10 @@ CalRequestTask::CalRequestTask(Account* account, IProgressObserver* observer,
                                std::shared_ptr<HttpShare> share)
     : mCurl(account, observer, std::move(share)) {}
 
-int CalRequestTask::fetch(const std::string& path, const char* unreadableText, ListOperation read,
-                          CalListPage* page) {
+int CalRequestTask::request(Send send, const std::string& path, const char* unreadableText) {
     mFailure.clear();
     std::string reply;
-    if (const int result = mCurl.get(path, &reply); result != kOk) {
+    if (const int result = (mCurl.*send)(path, &reply); result != kOk) {
         SYNC_ERR("CalCurl get fail(%d)", result);
         mFailure = "the server could not be reached or gave no usable answer";
         return result;
@@ -39,7 +38,7 @@ int CalRequestTask::fetch(const std::string& path, const char* unreadableText, L
     SYNC_DBG("%s: status %ld, %zu bytes", path.c_str(), status, reply.size());
     const int parsed = mParser.setString(reply);
     const int errorCode = parsed == kOk ? mParser.checkData() : 0;
-    if (status < kHttpOkFirst || status > kHttpOkLast || errorCode != 0) {
+    if (!http_status::isSuccess(status) || errorCode != 0) {
         const long code = errorCode != 0 ? errorCode : status;
         SYNC_ERR("CalCurl get fail(%d)", kFailed);
         SYNC_ERR("the server answered %ld to %s", code, path.c_str());
@@ -49,8 +48,13 @@ int CalRequestTask::fetch(const std::string& path, const char* unreadableText, L
     if (parsed != kOk) {
         SYNC_ERR("%s", unreadableText);
         mFailure = "the server's answer could not be read";
-        return kFailed;
     }
+    return parsed;
+}
+
+int CalRequestTask::fetch(Send send, const std::string& path, const char* unreadableText, ListOperation read,
+                          CalListPage* page) {
+    if (const int result = request(send, path, unreadableText); result != kOk) return result;
     CalListPage result;
     if ((mParser.*read)(&result) != kOk) {
         mFailure = "the server's answer has not the expected shape";
@@ -61,12 +65,14 @@ int CalRequestTask::fetch(const std::string& path, const char* unreadableText, L
 }
 
 int CalDownSyncBookListTask::getList(const std::string& pageToken, CalListPage* page) {
-    return fetch(withToken("/calendar/v3/users/me/calendarList?maxResults=100000000", pageToken),
+    return fetch(&CalCurl::get,
+                 withToken("/calendar/v3/users/me/calendarList?maxResults=100000000", pageToken),
                  "setString fail", &CalJsonParser::getBookList, page);
 }
 
 int CalDownSyncEventListTask::getList(const std::string& calendarId, CalListPage* page) {
-    return fetch(kCalendars + url_text::segment(calendarId) +
+    return fetch(&CalCurl::get,
+                 kCalendars + url_text::segment(calendarId) +
                      "/events?fields=items(etag%2Cid%2Csummary)&maxResults=100000000",
                  "set string fail", &CalJsonParser::getEventList, page);
 }
@@ -75,11 +81,33 @@ int CalDownSyncEventListTask::getListPage(const std::string& calendarId, const s
                                           CalListPage* page) {
     const std::string path = kCalendars + url_text::segment(calendarId) +
                              "/events?fields=items(etag%2Cid%2Csummary)%2CnextPageToken&maxResults=50";
-    return fetch(withToken(path, pageToken), "set string fail", &CalJsonParser::getEventListPage, page);
+    return fetch(&CalCurl::get, withToken(path, pageToken), "set string fail",
+                 &CalJsonParser::getEventListPage, page);
 }
 
 int CalDownSyncEventListTask::getAllPage(const std::string& calendarId, const std::string& pageToken,
                                          CalListPage* page) {
-    return fetch(withToken(kCalendars + url_text::segment(calendarId) + "/events?maxResults=50", pageToken),
+    return fetch(&CalCurl::get,
+                 withToken(kCalendars + url_text::segment(calendarId) + "/events?maxResults=50", pageToken),
                  "set string fail", &CalJsonParser::getEventAllPage, page);
+}
+
+int CalDownSyncTodoBookListTask::getList(const std::string& pageToken, CalListPage* page) {
+    return fetch(&CalCurl::getTodo, withToken("/tasks/v1/users/@me/lists", pageToken), "setString fail",
+                 &CalJsonParser::getTodoBookList, page);
+}
+
+int CalDownSyncTodoListTask::getListPage(const std::string& listId, const std::string& pageToken,
+                                         CalListPage* page) {
+    const std::string path = kLists + url_text::segment(listId) +
+                             "/tasks?fields=items(etag%2Cid%2Ctitle)%2CnextPageToken&maxResults=50";
+    return fetch(&CalCurl::getTodo, withToken(path, pageToken), "setString fail",
+                 &CalJsonParser::getTodoListPage, page);
+}
+
+int CalDownSyncTodoTask::get(const std::string& listId, const std::string& taskId, JsonNodePtr* task) {
+    const std::string path = kLists + url_text::segment(listId) + "/tasks/" + url_text::segment(taskId);
+    if (const int result = request(&CalCurl::getTodo, path, "setString fail"); result != kOk) return result;
+    *task = mParser.takeRoot();
+    return kOk;
 }

@@ -8,8 +8,9 @@
 
 #include "calendar/CalCurl.h"
 #include "calendar/CalJsonParser.h"
+#include "common/HttpStatus.h"
 
-// What every task does: one request, one parsed reply.
+// What every task does: one request, one checked reply.
 class CalRequestTask {
 public:
     CalRequestTask(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share);
@@ -18,11 +19,16 @@ public:
     [[nodiscard]] const std::string& failure() const { return mFailure; }
     // Whether the last request had no answer at all.
     [[nodiscard]] bool unreachable() const { return mCurl.lastHttpStatus() == 0; }
+    // Whether the server does not know what was asked for.
+    [[nodiscard]] bool notFound() const { return mCurl.lastHttpStatus() == http_status::kNotFound; }
 
 protected:
     using ListOperation = int (CalJsonParser::*)(CalListPage*) const;
-    [[nodiscard]] int fetch(const std::string& path, const char* unreadableText, ListOperation read,
-                            CalListPage* page);
+    using Send = int (CalCurl::*)(const std::string& path, std::string* response);
+    // Sends and parses.
+    [[nodiscard]] int request(Send send, const std::string& path, const char* unreadableText);
+    [[nodiscard]] int fetch(Send send, const std::string& path, const char* unreadableText,
+                            ListOperation read, CalListPage* page);
 
     CalCurl mCurl;
     CalJsonParser mParser;
@@ -49,4 +55,24 @@ public:
     // Whole events in pages of 50.
     [[nodiscard]] int getAllPage(const std::string& calendarId, const std::string& pageToken,
                                  CalListPage* page);
+};
+
+class CalDownSyncTodoBookListTask : public CalRequestTask {
+public:
+    using CalRequestTask::CalRequestTask;
+    [[nodiscard]] int getList(const std::string& pageToken, CalListPage* page);
+};
+
+class CalDownSyncTodoListTask : public CalRequestTask {
+public:
+    using CalRequestTask::CalRequestTask;
+    // Ids, etags and titles in pages of 50.
+    [[nodiscard]] int getListPage(const std::string& listId, const std::string& pageToken, CalListPage* page);
+};
+
+class CalDownSyncTodoTask : public CalRequestTask {
+public:
+    using CalRequestTask::CalRequestTask;
+    // The whole task.
+    [[nodiscard]] int get(const std::string& listId, const std::string& taskId, JsonNodePtr* task);
 };

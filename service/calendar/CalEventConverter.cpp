@@ -35,6 +35,15 @@ constexpr TextMember kTextMembers[] = {
     {"etag", CALENDAR_EVENT_SYNC_DATA2},
 };
 
+template <size_t N>
+bool setTexts(JsonObject* item, const TextMember (&members)[N], calendar_record_h record) {
+    for (const TextMember& member : members) {
+        const std::optional<std::string> value = json_access::text(item, member.name);
+        if (value && !setText(record, member.property, *value)) return false;
+    }
+    return true;
+}
+
 // "start" and "end" write the same zone field, so the end's zone stays.
 bool parseTime(JsonObject* event, const char* name, unsigned property, calendar_record_h record) {
     JsonObject* time = json_access::object(event, name);
@@ -137,14 +146,8 @@ int CalJsonParser::convertEvent(JsonObject* event, CalendarRecord* out) {
         return kFailed;
     }
     CalendarRecord record(raw);
-    for (const TextMember& member : kTextMembers) {
-        const std::optional<std::string> value = json_access::text(event, member.name);
-        if (value && !setText(raw, member.property, *value)) {
-            SYNC_ERR("fail");
-            return kFailed;
-        }
-    }
-    if (!setStates(event, raw) || !parseTime(event, "start", CALENDAR_EVENT_START, raw) ||
+    if (!setTexts(event, kTextMembers, raw) || !setStates(event, raw) ||
+        !parseTime(event, "start", CALENDAR_EVENT_START, raw) ||
         !parseTime(event, "end", CALENDAR_EVENT_END, raw) || !setOrganizer(event, raw)) {
         SYNC_ERR("fail");
         return kFailed;
@@ -157,6 +160,42 @@ int CalJsonParser::convertEvent(JsonObject* event, CalendarRecord* out) {
     JsonArray* overrides = json_access::array(json_access::object(event, "reminders"), "overrides");
     if (overrides != nullptr && parseReminders(overrides, raw) != kOk) return kFailed;
     if (!setText(raw, CALENDAR_EVENT_SYNC_DATA1, selfDeclined ? "declined" : "not_declined")) {
+        SYNC_ERR("fail");
+        return kFailed;
+    }
+    *out = std::move(record);
+    return kOk;
+}
+
+int CalJsonParser::convertTodo(JsonObject* task, CalendarRecord* out) {
+    constexpr TextMember kTodoMembers[] = {{"id", CALENDAR_TODO_UID},
+                                           {"title", CALENDAR_TODO_SUMMARY},
+                                           {"notes", CALENDAR_TODO_NOTE},
+                                           {"etag", CALENDAR_TODO_SYNC_DATA2}};
+    calendar_record_h raw = nullptr;
+    if (task == nullptr || calendar_record_create(_calendar_todo, &raw) != PLATFORM_ERROR_NONE) {
+        SYNC_ERR("calendar record create fail");
+        return kFailed;
+    }
+    CalendarRecord record(raw);
+    bool set = setTexts(task, kTodoMembers, raw);
+    const std::string status = json_access::textOr(task, "status", "");
+    set = set &&
+          setInt(
+              raw, CALENDAR_TODO_STATUS,
+              cal_mapping::valueOf(cal_mapping::kTodoStatus, status).value_or(cal_mapping::kTodoNeedsAction));
+    if (const std::optional<std::string> due = json_access::text(task, "due")) {
+        const std::optional<calendar_time_s> time = cal_time::parseDateTime(*due, "");
+        set = set && time && setInt(raw, CALENDAR_TODO_HAS_DUE, 1) &&
+              setText(raw, CALENDAR_TODO_SYNC_DATA1, std::string(cal_mapping::kServerHasDue)) &&
+              calendar_record_set_caltime(raw, CALENDAR_TODO_DUE, *time) == PLATFORM_ERROR_NONE;
+    }
+    if (const std::optional<std::string> completed = json_access::text(task, "completed")) {
+        const std::optional<calendar_time_s> time = cal_time::parseDateTime(*completed, "");
+        set = set && time &&
+              calendar_record_set_lli(raw, CALENDAR_TODO_COMPLETED_TIME, time->utime) == PLATFORM_ERROR_NONE;
+    }
+    if (!set) {
         SYNC_ERR("fail");
         return kFailed;
     }

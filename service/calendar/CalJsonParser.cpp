@@ -76,6 +76,10 @@ JsonObject* jsonObjectOf(const JsonNodePtr& node) {
     return json_access::objectIn(node.get());
 }
 
+JsonObject* CalJsonParser::root() const {
+    return jsonObjectOf(mpRoot);
+}
+
 int CalJsonParser::setString(std::string_view body) {
     if (!json_syntax::isValid(body)) {
         SYNC_ERR("load fail");

@@ -30,8 +30,15 @@ public:
 
     // One event as a new event record. The record's uid is the event's id, its SYNC_DATA2 the event's etag.
     [[nodiscard]] static int convertEvent(JsonObject* event, CalendarRecord* out);
+    // One task as a new to-do record, marked like the event's.
+    [[nodiscard]] static int convertTodo(JsonObject* task, CalendarRecord* out);
     // -1 ("checkException fail" at the caller) when "originalStartTime" is there but cannot be read.
     [[nodiscard]] static int checkException(JsonObject* event, ExceptionInfo* out);
+
+    // The document's object, or NULL. It ends with the parser.
+    [[nodiscard]] JsonObject* root() const;
+    // The document, to be kept.
+    [[nodiscard]] JsonNodePtr takeRoot() { return std::move(mpRoot); }
 
 private:
     JsonNodePtr mpRoot;

@@ -1,10 +1,11 @@
-// The half of CalDataManager that finds out what was changed on the device.
+// The half of CalManager that finds out what was changed on the device.
 //
 // A change is the sync's own when its version is the one stored in the row, or when the record says that the sync wrote it
 // last (the row may be missing after a crash; the next download takes such a record over).
+#include <algorithm>
 #include <unordered_map>
 
-#include "calendar/CalDataManager.h"
+#include "calendar/CalManager.h"
 #include "calendar/CalRecordAccess.h"
 #include "common/SyncLog.h"
 #include "common/SyncService.h"
@@ -25,17 +26,39 @@ struct ChangedChild {
 };
 
 struct LocalChange {
-    int eventId = 0;
+    int itemId = 0;
     int status = RECORD_UPDATED;
     int version = 0;
-    bool ownWrite = false;
-    bool knownToSync = false;  // the sync wrote the record at some time
+    int ownVersion = 0;  // of the item itself, its exceptions left out
+    int syncedVersion = 0;
     std::vector<ChangedChild> children;
+
+    [[nodiscard]] bool ownWrite() const { return syncedVersion == version; }
+    // The sync wrote the record at some time.
+    [[nodiscard]] bool knownToSync() const { return syncedVersion != 0; }
 };
 
-int readChanges(int calendarId, int since, std::vector<LocalChange>* changes, int* current) {
+bool readChange(calendar_record_h record, LocalChange* change) {
+    const std::pair<unsigned, int*> fields[] = {
+        {CALENDAR_UPDATED_INFO_ID, &change->itemId},
+        {CALENDAR_UPDATED_INFO_MODIFIED_STATUS, &change->status},
+        {CALENDAR_UPDATED_INFO_VERSION, &change->version},
+        {CALENDAR_UPDATED_INFO_SYNCED_VERSION, &change->syncedVersion},
+    };
+    for (const auto& [property, value] : fields) {
+        if (calendar_record_get_int(record, property, value) != PLATFORM_ERROR_NONE) {
+            SYNC_ERR("record_get_int fail");
+            return false;
+        }
+    }
+    change->ownVersion = change->version;
+    return true;
+}
+
+int readChanges(const CalItemKind& kind, int calendarId, int since, std::vector<LocalChange>* changes,
+                int* current) {
     calendar_list_h rawList = nullptr;
-    if (calendar_db_get_changes_by_version(_calendar_event, calendarId, since, &rawList, current) !=
+    if (calendar_db_get_changes_by_version(kind.view, calendarId, since, &rawList, current) !=
         PLATFORM_ERROR_NONE) {
         SYNC_ERR("db_get_changes_by_version fail");
         return kFailed;
@@ -45,34 +68,23 @@ int readChanges(int calendarId, int since, std::vector<LocalChange>* changes, in
          code = calendar_list_next(rawList)) {
         calendar_record_h record = nullptr;
         LocalChange change;
-        int synced = 0;
         if (calendar_list_get_current_record_p(rawList, &record) != PLATFORM_ERROR_NONE) {
             SYNC_ERR("list_get_current_record_p fail");
-        } else if (calendar_record_get_int(record, CALENDAR_UPDATED_INFO_ID, &change.eventId) !=
-                       PLATFORM_ERROR_NONE ||
-                   calendar_record_get_int(record, CALENDAR_UPDATED_INFO_MODIFIED_STATUS, &change.status) !=
-                       PLATFORM_ERROR_NONE ||
-                   calendar_record_get_int(record, CALENDAR_UPDATED_INFO_VERSION, &change.version) !=
-                       PLATFORM_ERROR_NONE ||
-                   calendar_record_get_int(record, CALENDAR_UPDATED_INFO_SYNCED_VERSION, &synced) !=
-                       PLATFORM_ERROR_NONE) {
-            SYNC_ERR("record_get_int fail");
-        } else {
-            change.ownWrite = synced == change.version;
-            change.knownToSync = synced != 0;
+        } else if (readChange(record, &change)) {
             changes->push_back(std::move(change));
         }
     }
     return kOk;
 }
 
-void readChildren(LocalChange* change) {
+void readSeries(LocalChange* change) {
     calendar_record_h raw = nullptr;
-    if (calendar_db_get_record(_calendar_event, change->eventId, &raw) != PLATFORM_ERROR_NONE) {
+    if (calendar_db_get_record(_calendar_event, change->itemId, &raw) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("db_get_record fail");
         return;
     }
     const CalendarRecord record(raw);
+    change->ownVersion = intOf(raw, CALENDAR_EVENT_OWN_VERSION);
     unsigned count = 0;
     if (calendar_record_get_child_record_count(raw, CALENDAR_EVENT_EXCEPTIONS, &count) !=
         PLATFORM_ERROR_NONE) {
@@ -97,36 +109,57 @@ void readChildren(LocalChange* change) {
 // Marks the rows of one book; runs inside the store's transaction and touches nothing else.
 class Marker {
 public:
-    Marker(CalMetaDataDBHelper& store, int calendarId, const std::vector<CalEventMetaData>& rows)
-        : mStore(store), mCalendarId(calendarId) {
+    Marker(const CalItemKind& kind, CalItemStore& store, const CalBookMetaData& book,
+           const std::vector<CalEventMetaData>& rows)
+        : mKind(kind), mStore(store), mBook(book), mIsReadOnly(CalManager::isReadOnly(book.calendar_id)) {
         for (const CalEventMetaData& row : rows) {
-            if (row.original_event_id == 0) mRows.emplace(row.event_id, row);
+            if (row.original_event_id == 0) {
+                mRows.emplace(row.event_id, row);
+            } else {
+                mInstances.emplace(std::pair(row.original_event_id, row.recurrence_id), row);
+            }
         }
     }
 
     void mark(const LocalChange& change) {
-        const auto known = mRows.find(change.eventId);
-        const CalEventMetaData* row = known != mRows.end() ? &known->second : nullptr;
+        const auto known = mRows.find(change.itemId);
+        CalEventMetaData* row = known != mRows.end() ? &known->second : nullptr;
         if (row != nullptr && row->version == change.version) return;
+        if (mIsReadOnly) return pass(change, row);
         if (change.status == RECORD_DELETED) {
-            if (mStore.updateEventDeleted(change.eventId, 1) != kOk) SYNC_ERR("MetaDB update deleted fail");
+            if (mStore.markDeleted(change.itemId, 1) != kOk) SYNC_ERR("MetaDB update deleted fail");
         } else if (row != nullptr) {
-            if (mStore.updateEventDirty(change.eventId, 1) != kOk) SYNC_ERR("MetaDB update dirty fail");
-            markChildren(*row, change);
-        } else if (!change.knownToSync) {
+            markChanged(change, *row);
+        } else if (!change.knownToSync()) {
             markNew(change);
         }
         // A record of the sync that has no row is taken over by the next download, as changed.
     }
 
 private:
+    // Nobody will take it. The item counts as seen, so that the server's next change of it comes down.
+    void pass(const LocalChange& change, CalEventMetaData* row) {
+        SYNC_ERR("%s(%s) is read-only, the device's change of %s(%d) is not sent", mKind.bookName,
+                 mBook.uri.c_str(), mKind.itemName, change.itemId);
+        if (row == nullptr || change.status == RECORD_DELETED) return;
+        row->version = change.version;
+        if (mStore.updateItem(*row) != kOk) SYNC_ERR("MetaDB update dirty fail");
+    }
+
+    void markChanged(const LocalChange& change, CalEventMetaData& row) {
+        if (change.ownVersion > std::max(row.version, change.syncedVersion)) row.dirty = 1;
+        row.version = change.version;
+        if (mStore.updateItem(row) != kOk) SYNC_ERR("MetaDB update dirty fail");
+        markChildren(row, change);
+    }
+
     void markNew(const LocalChange& change) {
         CalEventMetaData row;
-        row.event_id = change.eventId;
-        row.calendar_id = mCalendarId;
+        row.event_id = change.itemId;
+        row.calendar_id = mBook.calendar_id;
         row.version = change.version;
         row.dirty = 1;
-        if (mStore.insertEvent(row) != kOk) {
+        if (mStore.insertItem(row) != kOk) {
             SYNC_ERR("MetaDB insert fail");
             return;
         }
@@ -135,120 +168,118 @@ private:
 
     void markChildren(const CalEventMetaData& series, const LocalChange& change) {
         for (const ChangedChild& child : change.children) {
-            CalEventMetaData row;
-            const bool known =
-                mStore.getEvent(CalInstanceKey{series.event_id, child.recurrenceId}, &row) == kOk;
-            if (child.ownWrite || (known && row.event_id == child.eventId && row.version == child.version))
-                continue;
-            if (!known) {
-                row = CalEventMetaData{.calendar_id = mCalendarId,
-                                       .version = child.version,
-                                       .original_event_id = series.event_id,
-                                       .exception_type = 1,
-                                       .sequence = series.sequence,
-                                       .recurrence_id = child.recurrenceId,
-                                       .uri = series.uri,
-                                       .etag = series.etag};
-            }
+            const auto known = mInstances.find({series.event_id, child.recurrenceId});
+            const bool isKnown = known != mInstances.end();
+            const bool isSeen =
+                isKnown && known->second.event_id == child.eventId && known->second.version >= child.version;
+            if (child.ownWrite || isSeen) continue;
+            CalEventMetaData row = isKnown ? known->second
+                                           : CalEventMetaData{.calendar_id = mBook.calendar_id,
+                                                              .original_event_id = series.event_id,
+                                                              .exception_type = 1,
+                                                              .sequence = series.sequence,
+                                                              .recurrence_id = child.recurrenceId,
+                                                              .uri = series.uri,
+                                                              .etag = series.etag};
             // A cancelled instance that a user brought back has a record again.
             row.event_id = child.eventId;
+            row.version = child.version;
             row.dirty = 1;
-            if ((known ? mStore.updateExceptionEvent(row) : mStore.insertEvent(row)) != kOk) {
+            if ((isKnown ? mStore.updateItem(row) : mStore.insertItem(row)) != kOk)
                 SYNC_ERR("MetaDB insert fail");
-            }
         }
     }
 
-    CalMetaDataDBHelper& mStore;
-    const int mCalendarId;
-    std::unordered_map<int, CalEventMetaData> mRows;  // ordinary events
+    const CalItemKind& mKind;
+    CalItemStore& mStore;
+    const CalBookMetaData& mBook;
+    const bool mIsReadOnly;
+    std::unordered_map<int, CalEventMetaData> mRows;                     // ordinary items
+    std::map<std::pair<int, std::string>, CalEventMetaData> mInstances;  // by series and recurrence id
 };
 
 }  // namespace
 
-bool CalDataManager::setChanged(int calendarId) {
-    CalMetaDataDBHelper* metaData = prepared();
-    if (metaData == nullptr) return false;
+bool CalManager::setChanged(int calendarId) {
+    CalItemStore* store = prepared();
+    if (store == nullptr) return false;
     int since = 0;
-    (void)metaData->getCalendarbookVersion(calendarId, &since);
+    (void)store->books().getVersion(calendarId, &since);
     std::vector<LocalChange> changes;
     int current = 0;
-    if (readChanges(calendarId, since, &changes, &current) != kOk) return false;
-    for (const LocalChange& change : changes) {
-        if (!change.ownWrite) return true;
-    }
-    return false;
+    if (readChanges(mKind, calendarId, since, &changes, &current) != kOk) return false;
+    return std::any_of(changes.begin(), changes.end(),
+                       [](const LocalChange& change) { return !change.ownWrite(); });
 }
 
-int CalDataManager::setCalendarbookChanged(int calendarId) {
-    CalMetaDataDBHelper* metaData = prepared();
-    if (metaData == nullptr) return kFailed;
-    int since = 0;
-    (void)metaData->getCalendarbookVersion(calendarId, &since);
+int CalManager::setBookChanged(int calendarId) {
+    CalItemStore* store = prepared();
+    CalBookMetaData book;
+    if (store == nullptr || store->books().get(calendarId, &book) != kOk) return kFailed;
     std::vector<LocalChange> changes;
     int current = 0;
-    if (readChanges(calendarId, since, &changes, &current) != kOk) return kFailed;
-    if (current <= since) return kOk;
-    std::erase_if(changes, [](const LocalChange& change) { return change.ownWrite; });
+    if (readChanges(mKind, calendarId, book.sync_version, &changes, &current) != kOk) return kFailed;
+    if (current <= book.sync_version) return kOk;
+    std::erase_if(changes, [](const LocalChange& change) { return change.ownWrite(); });
     // Everything is read from the calendar service before the transaction begins.
     for (LocalChange& change : changes) {
-        if (change.status != RECORD_DELETED) readChildren(&change);
+        if (mKind.hasSeries() && change.status != RECORD_DELETED) readSeries(&change);
     }
     std::vector<CalEventMetaData> rows;
-    if (!changes.empty() && metaData->getAllEvents(calendarId, &rows) != kOk) return kFailed;
+    if (!changes.empty() && store->getAllItems(calendarId, &rows) != kOk) return kFailed;
+    Marker marker(mKind, *store, book, rows);
 
     // The version moves first, but only together with the marks: a walk that was cut off is walked again.
-    SyncTransaction transaction(metaData->database());
-    if (!transaction.begun() || metaData->updateCalendarbookVersion(calendarId, current) != kOk)
-        return kFailed;
-    Marker marker(*metaData, calendarId, rows);
+    SyncTransaction transaction(store->database());
+    if (!transaction.begun() || store->books().updateVersion(calendarId, current) != kOk) return kFailed;
     for (const LocalChange& change : changes) marker.mark(change);
     return transaction.commit();
 }
 
-int CalDataManager::setAccountChanged(int accountId) {
+int CalManager::setAccountChanged(int accountId) {
+    CalItemStore* store = prepared();
     std::list<int> calendarIds;
-    if (getAllCalendarbookIds(accountId, &calendarIds) != kOk) {
-        SYNC_ERR("getCalendarbookIds fail[%d]", accountId);
+    if (store == nullptr || store->books().getIds(accountId, &calendarIds) != kOk) {
+        SYNC_ERR("%s[%d]", mKind.texts.bookIds, accountId);
         return kFailed;
     }
     int result = kOk;
     for (const int calendarId : calendarIds) {
-        if (setCalendarbookChanged(calendarId) != kOk) result = kFailed;
+        if (setBookChanged(calendarId) == kOk) continue;
+        result = kFailed;
+        SYNC_ERR("%s[%d]", mKind.texts.bookChanged, calendarId);
     }
     return result;
 }
 
-bool CalDataManager::anyBookChanged(int accountId) {
+bool CalManager::anyBookChanged(int accountId) {
+    CalItemStore* store = prepared();
     std::list<int> calendarIds;
-    if (getAllCalendarbookIds(accountId, &calendarIds) != kOk) {
-        SYNC_ERR("getCalendarbookIds fail[%d]", accountId);
+    if (store == nullptr || store->books().getIds(accountId, &calendarIds) != kOk) {
+        SYNC_ERR("%s[%d]", mKind.texts.bookIds, accountId);
         return false;
     }
-    for (const int calendarId : calendarIds) {
-        if (setChanged(calendarId)) return true;
-    }
-    return false;
+    return std::any_of(calendarIds.begin(), calendarIds.end(), [this](int id) { return setChanged(id); });
 }
 
-bool CalDataManager::hasSomethingToSend(int accountId) {
+int CalManager::countPending(int accountId, int* dirty, int* deleted) {
+    CalItemStore* store = prepared();
+    return store == nullptr ? kFailed : store->countPending(accountId, dirty, deleted);
+}
+
+bool CalManager::hasSomethingToSend(int accountId) {
     int dirty = 0;
     int deleted = 0;
     if (countPending(accountId, &dirty, &deleted) == kOk && dirty + deleted > 0) return true;
     return anyBookChanged(accountId);
 }
 
-void CalDataManager::changedDBCallback(const char* view, void* userData) {
-    auto* self = static_cast<CalDataManager*>(userData);
-    if (self == nullptr || self->metaData() == nullptr) {
-        SYNC_ERR("fail");
-        return;
-    }
-    if (std::string_view(view) == _calendar_book) return;
+void CalManager::sendChanges() {
     std::list<int> accountIds;
-    if (self->metaData()->getAllAccountIds(&accountIds) != kOk) return;
+    CalItemStore* store = prepared();
+    if (store == nullptr || store->books().getAccountIds(&accountIds) != kOk) return;
     for (const int accountId : accountIds) {
-        if (!self->anyBookChanged(accountId)) continue;
+        if (!anyBookChanged(accountId)) continue;
         (void)SyncService::getInstance().startUpSync(accountId, VANTOR_PIM_SYNC_TYPE_CALENDAR);
     }
 }

@@ -37,6 +37,13 @@ inline constexpr NameOf kFrequency[] = {{4, "YEARLY"}, {3, "MONTHLY"}, {2, "WEEK
 inline constexpr NameOf kWeekday[] = {{1, "SU"}, {2, "MO"}, {3, "TU"}, {4, "WE"},
                                       {5, "TH"}, {6, "FR"}, {7, "SA"}};
 
+// Unknown values go out as "needsAction", unknown words come in as it.
+inline constexpr int kTodoNeedsAction = 1;
+inline constexpr int kTodoCompleted = 2;
+inline constexpr NameOf kTodoStatus[] = {{kTodoNeedsAction, "needsAction"}, {kTodoCompleted, "completed"}};
+inline constexpr std::string_view kTodoStatusOther = "needsAction";
+inline constexpr std::string_view kServerHasDue = "due";  // CALENDAR_TODO_SYNC_DATA1
+
 inline constexpr int kAttendeeOrganizer = 3;
 inline constexpr int kMeetingOwn = 1;
 inline constexpr int kMeetingOther = 2;
@@ -75,6 +82,9 @@ inline constexpr LossyRow kLossyRows[] = {
     {"recurrence", "every element but the first", ""},
     {"reminders.useDefault", "true", ""},
     {"reminders.overrides.method", "email", ""},
+    {"completed", "2026-03-01T10:00:30Z",
+     "2026-03-01T10:00:00Z"},  // seconds of a time, once the device sends it
+    {"recurrence", "of an event that is no longer a series on the device", "stays"},
 };
 
 }  // namespace cal_mapping

@@ -3,7 +3,7 @@
 
 #include <string>
 
-// A calendar of an account that the sync mirrors.
+// A calendar, or a task list, of an account that the sync mirrors.
 struct CalBookMetaData {
     int id = 0;
     int calendar_id = 0;  // the platform's book
@@ -28,8 +28,23 @@ struct CalEventMetaData {
     int exception_type = 0;  // 0 ordinary, 1 an exception found locally
     int sequence = 0;
     std::string recurrence_id;
-    std::string uri;  // the server's event id; empty until uploaded or downloaded
-    std::string etag;
+    std::string uri;   // the server's event id; empty until uploaded or downloaded
+    std::string etag;  // without a uri: kUnconfirmedEtag or empty
+};
+
+// Marks a row without uri whose item may have reached the server: it was sent, or was about to be, and no answer told.
+inline constexpr const char* kUnconfirmedEtag = "unconfirmed";
+
+// A to-do.
+struct CalTodoMetaData {
+    int id = 0;
+    int todo_id = 0;
+    int calendar_id = 0;
+    int version = 0;
+    int dirty = 0;
+    int deleted = 0;
+    std::string uri;   // as of the event
+    std::string etag;  // likewise
 };
 
 // Addresses the row of one instance of a series.

@@ -12,10 +12,11 @@
 #include <string>
 #include <vector>
 
+#include "calendar/CalItemStore.h"
 #include "calendar/CalMetaData.h"
 #include "common/SyncDatabase.h"
 
-class CalMetaDataDBHelper {
+class CalMetaDataDBHelper : public CalItemStore {
 public:
     CalMetaDataDBHelper();
 
@@ -33,10 +34,6 @@ public:
     [[nodiscard]] int getAllDirtyEventIds(const std::string& bookUri, std::list<int>* eventIds);
     [[nodiscard]] int getAllDeletedEventIds(const std::string& bookUri, std::list<int>* eventIds);
     [[nodiscard]] int getAllEventUri(const std::string& bookUri, std::list<std::string>* uris);
-    // All rows of one book, read once for a comparing sync or a change walk.
-    [[nodiscard]] int getAllEvents(int calendarId, std::vector<CalEventMetaData>* rows);
-    // Dirty and deleted rows of one account's books (those of read-only books are the caller's to judge).
-    [[nodiscard]] int countPending(int accountId, int* dirty, int* deleted);
 
     // --- events: writes, each in a transaction of its own or in the thread's open one
     [[nodiscard]] int insertEvent(const CalEventMetaData& row);
@@ -46,34 +43,79 @@ public:
     [[nodiscard]] int updateEventDeleted(int eventId, int deleted);
     [[nodiscard]] int deleteEvent(int calendarId, const std::string& uri);
 
-    // --- calendars: reads
-    [[nodiscard]] int getCalendarbookId(int accountId, const std::string& uri, int* calendarId);
-    [[nodiscard]] int getCalendarbookUri(int calendarId, std::string* uri);
-    [[nodiscard]] int getCalendarbook(int calendarId, CalBookMetaData* row);
-    [[nodiscard]] int getCalendarbook(int accountId, const std::string& uri, CalBookMetaData* row);
-    [[nodiscard]] int getCalendarbookVersion(int calendarId, int* version);
+    // --- calendars
+    [[nodiscard]] int getCalendarbookId(int accountId, const std::string& uri, int* calendarId) {
+        return mBooks.getId(accountId, uri, calendarId);
+    }
+    [[nodiscard]] int getCalendarbookUri(int calendarId, std::string* uri) {
+        return mBooks.getUri(calendarId, uri);
+    }
+    [[nodiscard]] int getCalendarbook(int calendarId, CalBookMetaData* row) {
+        return mBooks.get(calendarId, row);
+    }
+    [[nodiscard]] int getCalendarbook(int accountId, const std::string& uri, CalBookMetaData* row) {
+        return mBooks.get(accountId, uri, row);
+    }
+    [[nodiscard]] int getCalendarbookVersion(int calendarId, int* version) {
+        return mBooks.getVersion(calendarId, version);
+    }
     [[nodiscard]] int getCalendarbookEtag(const std::string& uri, std::string* etag);
-    [[nodiscard]] int getCalendarbookIds(int accountId, std::list<int>* calendarIds);
-    [[nodiscard]] int getAllCalendarbookIds(int accountId, std::list<int>* calendarIds);
-    [[nodiscard]] int getAllDirtyCalendarbookIds(int accountId, std::list<int>* calendarIds);
-    [[nodiscard]] int getAllDeletedCalendarbookIds(int accountId, std::list<int>* calendarIds);
-    [[nodiscard]] int getAllCalendarbookUri(int accountId, std::list<std::string>* uris);
-    [[nodiscard]] int getAllAccountIds(std::list<int>* accountIds);
+    [[nodiscard]] int getCalendarbookIds(int accountId, std::list<int>* ids) {
+        return mBooks.getIds(accountId, ids);
+    }
+    [[nodiscard]] int getAllCalendarbookIds(int accountId, std::list<int>* ids) {
+        return mBooks.getIds(accountId, ids);
+    }
+    [[nodiscard]] int getAllDirtyCalendarbookIds(int accountId, std::list<int>* ids) {
+        return mBooks.getDirtyIds(accountId, ids);
+    }
+    [[nodiscard]] int getAllDeletedCalendarbookIds(int accountId, std::list<int>* ids) {
+        return mBooks.getDeletedIds(accountId, ids);
+    }
+    [[nodiscard]] int getAllCalendarbookUri(int accountId, std::list<std::string>* uris) {
+        return mBooks.getUris(accountId, uris);
+    }
+    [[nodiscard]] int getAllAccountIds(std::list<int>* accountIds) {
+        return mBooks.getAccountIds(accountIds);
+    }
+    [[nodiscard]] int insertCalendarbook(const CalBookMetaData& row) { return mBooks.insert(row); }
+    [[nodiscard]] int updateCalendarbook(const CalBookMetaData& row) { return mBooks.update(row); }
+    [[nodiscard]] int updateCalendarbookVersion(int calendarId, int version) {
+        return mBooks.updateVersion(calendarId, version);
+    }
+    [[nodiscard]] int updateCalendarbookDirty(int calendarId, int dirty) {
+        return mBooks.updateDirty(calendarId, dirty);
+    }
+    [[nodiscard]] int updateCalendarbookDeleted(int calendarId, int deleted) {
+        return mBooks.updateDeleted(calendarId, deleted);
+    }
+    [[nodiscard]] int deleteCalendarbook(int accountId, const std::string& uri) {
+        return mBooks.remove(accountId, uri);
+    }
+    [[nodiscard]] int deleteAccount(int accountId) { return mBooks.removeAccount(accountId); }
 
-    // --- calendars: writes
-    [[nodiscard]] int insertCalendarbook(const CalBookMetaData& row);
-    [[nodiscard]] int updateCalendarbook(const CalBookMetaData& row);
-    // "UPDATE calendarbooksync_table SET uri=?, etag=? WHERE calendar_id=?"
-    [[nodiscard]] int updateCalendarbookUri(int calendarId, const std::string& uri, const std::string& etag);
-    [[nodiscard]] int updateCalendarbookVersion(int calendarId, int version);
-    [[nodiscard]] int updateCalendarbookDirty(int calendarId, int dirty);
-    [[nodiscard]] int updateCalendarbookDeleted(int calendarId, int deleted);
-    [[nodiscard]] int deleteCalendarbook(int accountId, const std::string& uri);
-    [[nodiscard]] int deleteAccount(int accountId);
-
-    // For SyncTransaction: one transaction over several writes.
-    SyncDatabase& database() { return mDatabase; }
+    // --- CalItemStore
+    [[nodiscard]] int getAllItems(int calendarId, std::vector<CalEventMetaData>* rows) override;
+    [[nodiscard]] int getItem(int itemId, CalEventMetaData* row) override { return getEvent(itemId, row); }
+    [[nodiscard]] int insertItem(const CalEventMetaData& row) override { return insertEvent(row); }
+    [[nodiscard]] int updateItem(const CalEventMetaData& row) override {
+        return row.original_event_id != 0 ? updateExceptionEvent(row) : updateEvent(row);
+    }
+    [[nodiscard]] int deleteItem(int calendarId, const std::string& uri) override {
+        return deleteEvent(calendarId, uri);
+    }
+    [[nodiscard]] int forgetItem(int itemId) override;
+    [[nodiscard]] int markDirty(int itemId, int dirty) override { return updateEventDirty(itemId, dirty); }
+    [[nodiscard]] int markDeleted(int itemId, int deleted) override {
+        return updateEventDeleted(itemId, deleted);
+    }
+    [[nodiscard]] int countPending(int accountId, int* dirty, int* deleted) override {
+        return mBooks.countPending("eventsync_table", accountId, dirty, deleted);
+    }
+    [[nodiscard]] CalBookRows& books() override { return mBooks; }
+    SyncDatabase& database() override { return mDatabase; }
 
 private:
     SyncDatabase mDatabase;
+    CalBookRows mBooks;
 };

@@ -14,7 +14,7 @@ namespace {
 
 class Planner {
 public:
-    explicit Planner(const CalBookSnapshot& snapshot) : mSnapshot(snapshot) {}
+    explicit Planner(const CalBookSnapshot& snapshot) : mSnapshot(snapshot), mKind(snapshot.kind()) {}
 
     CalPagePlan plan(const CalList& entries) {
         // Series before instances: a page may list an instance ahead of the series that it also brings.
@@ -22,8 +22,10 @@ public:
         for (const CalListInfoPtr& entry : entries) {
             ExceptionInfo info;
             JsonObject* json = jsonObjectOf(entry->json);
-            if (json == nullptr) {
-                SYNC_ERR("This is not event json");
+            if (!mKind.hasSeries()) {
+                planEvent(*entry);
+            } else if (json == nullptr) {
+                SYNC_ERR("%s", mKind.texts.notJson);
             } else if (CalJsonParser::checkException(json, &info) != kOk) {
                 SYNC_ERR("checkException fail");
                 SYNC_ERR("event(%s) is left out", entry->id.c_str());
@@ -47,14 +49,15 @@ private:
     }
 
     bool convertJson2Record(const CalListInfo& entry, const char* failureText, CalendarRecord* out) const {
-        if (CalJsonParser::convertEvent(jsonObjectOf(entry.json), out) != kOk ||
-            calendar_record_set_int(out->get(), CALENDAR_EVENT_BOOK_ID, mSnapshot.book().calendar_id) !=
+        JsonObject* json = jsonObjectOf(entry.json);
+        if (json != nullptr && mKind.convert(json, out) == kOk &&
+            calendar_record_set_int(out->get(), mKind.bookId, mSnapshot.book().calendar_id) ==
                 PLATFORM_ERROR_NONE) {
-            SYNC_ERR("%s", failureText);
-            SYNC_ERR("event(%s) is left out", entry.id.c_str());
-            return false;
+            return true;
         }
-        return true;
+        SYNC_ERR("%s", json == nullptr ? mKind.texts.notJson : failureText);
+        SYNC_ERR("%s(%s) is left out", mKind.itemName, entry.id.c_str());
+        return false;
     }
 
     void planEvent(const CalListInfo& entry) {
@@ -66,6 +69,8 @@ private:
             planKnown(entry, *row);
         } else if (const int orphan = mSnapshot.orphan(entry.id)) {
             planOrphan(entry, orphan);
+        } else if (const CalEventMetaData* sent = unconfirmedRow(entry)) {
+            planSent(entry, *sent);
         } else {
             PlannedEvent planned;
             planned.row = newRow(entry);
@@ -80,18 +85,46 @@ private:
         planned.row.etag = entry.etag;
         planned.rowWrite = RowWrite::kUpdate;
         if (mSnapshot.isLost(row)) {
-            SYNC_ERR("event(%s) has lost its record, it is made again", entry.id.c_str());
+            SYNC_ERR("%s(%s) has lost its record, it is made again", mKind.itemName, entry.id.c_str());
             planned.row = newRow(entry);
             planned.rowWrite = RowWrite::kReplaceLost;
             if (!convertJson2Record(entry, "json parse fail", &planned.record)) return;
         } else if (row.etag == entry.etag) {
             return;
         } else if (mSnapshot.hasLocalChange(row)) {
-            SYNC_ERR("event(%s) was changed on both sides, the device's change wins", entry.id.c_str());
+            SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName,
+                     entry.id.c_str());
+        } else if (mSnapshot.hasUnseenChange(row)) {
+            SYNC_ERR("%s(%s) waits until the device's change of an instance has been seen", mKind.itemName,
+                     entry.id.c_str());
+            return;
         } else {
             planned.expectedVersion = mSnapshot.record(row.event_id)->version;
             if (!convertJson2Record(entry, "convert fail", &planned.record)) return;
         }
+        add(std::move(planned));
+    }
+
+    [[nodiscard]] const CalEventMetaData* unconfirmedRow(const CalListInfo& entry) const {
+        JsonObject* json = jsonObjectOf(entry.json);
+        if (!mSnapshot.hasUnconfirmed() || json == nullptr) return nullptr;
+        const CalEventMetaData* row = mSnapshot.unconfirmed(mKind.comparable(json));
+        return row != nullptr && !mTakenRows.contains(row->event_id) ? row : nullptr;
+    }
+
+    // Sent in an earlier run whose answer was lost.
+    void planSent(const CalListInfo& entry, const CalEventMetaData& sent) {
+        SYNC_INFO("%s(%s) is the device's %d, which was sent before", mKind.itemName, entry.id.c_str(),
+                  sent.event_id);
+        PlannedEvent planned;
+        planned.row = sent;
+        planned.row.uri = entry.id;
+        planned.row.etag = entry.etag;
+        planned.row.dirty = 0;
+        planned.row.version = mSnapshot.record(sent.event_id)->version;
+        planned.rowWrite = RowWrite::kUpdate;
+        planned.ownWrite = false;
+        mTakenRows.insert(sent.event_id);
         add(std::move(planned));
     }
 
@@ -102,7 +135,7 @@ private:
         planned.row.event_id = eventId;
         planned.row.version = state.version;
         if (!state.isEnginesOwnWrite()) {
-            SYNC_ERR("event(%s) is taken over with the device's change", entry.id.c_str());
+            SYNC_ERR("%s(%s) is taken over with the device's change", mKind.itemName, entry.id.c_str());
             planned.row.version = state.syncedVersion;
             planned.row.dirty = 1;
             planned.ownWrite = false;
@@ -136,17 +169,27 @@ private:
         planned.row.original_event_id = seriesId;
         planned.row.recurrence_id = info.recurrenceId;
         planned.row.sequence = info.sequence;
-        if (const CalEventMetaData* known = mSnapshot.instanceRow(seriesId, info.recurrenceId)) {
+        if (const CalEventMetaData* known = knownInstance(*entry, seriesId, info.recurrenceId)) {
+            planned.row.recurrence_id = known->recurrence_id;
             if (!planKnownInstance(*entry, info, *known, &planned)) return;
         } else if (const int orphan = mSnapshot.orphan(entry->id)) {
             planOrphanInstance(*entry, info, orphan, &planned);
         }
-        if (!planned.rowOnly && series != nullptr && mSnapshot.hasLocalChange(*series)) {
+        if (!planned.rowOnly && series != nullptr &&
+            (mSnapshot.hasLocalChange(*series) || mSnapshot.hasUnseenChange(*series))) {
             SYNC_ERR("event(%s) waits until the device's change of its series has been sent",
                      entry->id.c_str());
             return;
         }
         finishInstance(*entry, info, std::move(planned));
+    }
+
+    // By the server's id first: the time that it lists the instance with need not be spelt as the device's.
+    [[nodiscard]] const CalEventMetaData* knownInstance(const CalListInfo& entry, int seriesId,
+                                                        const std::string& recurrenceId) const {
+        const CalEventMetaData* row = mSnapshot.rowByUri(entry.id);
+        if (row != nullptr && row->original_event_id == seriesId && seriesId != 0) return row;
+        return mSnapshot.instanceRow(seriesId, recurrenceId);
     }
 
     // The series' row, unless this page makes the series anew.
@@ -199,7 +242,7 @@ private:
         } else {
             if (!convertJson2Record(entry, "json parse fail. but continue.", &planned.record)) return;
             if (calendar_record_set_str(planned.record.get(), CALENDAR_EVENT_RECURRENCE_ID,
-                                        info.recurrenceId.c_str()) != PLATFORM_ERROR_NONE) {
+                                        planned.row.recurrence_id.c_str()) != PLATFORM_ERROR_NONE) {
                 SYNC_ERR("fail");
                 return;
             }
@@ -208,12 +251,23 @@ private:
     }
 
     const CalBookSnapshot& mSnapshot;
+    const CalItemKind& mKind;
     CalPagePlan mPlan;
+    std::unordered_set<int> mTakenRows;            // of items that an earlier run sent
     std::unordered_set<std::string> mPlannedUris;  // ordinary events that this page writes or takes over
     std::set<std::pair<std::string, std::string>> mPlannedInstances;  // by series and recurrence id
 };
 
 }  // namespace
+
+bool needsContent(const CalListInfo& entry, const CalBookSnapshot& snapshot) {
+    if (const CalEventMetaData* row = snapshot.rowByUri(entry.id)) {
+        return snapshot.isLost(*row) || (row->etag != entry.etag && !snapshot.hasLocalChange(*row));
+    }
+    const int orphan = snapshot.orphan(entry.id);
+    const CalRecordState* state = orphan != 0 ? snapshot.record(orphan) : nullptr;
+    return state == nullptr || (state->isEnginesOwnWrite() && state->etag != entry.etag);
+}
 
 CalPagePlan planPage(const CalList& entries, const CalBookSnapshot& snapshot) {
     return Planner(snapshot).plan(entries);

@@ -3,6 +3,7 @@
 //
 //   server          device's row          device's record       plan
 //   listed          none                  none                  insert
+//   listed          sent, no answer       says the same         the row takes id and etag
 //   listed          none                  own, untouched        take over (its etag equal) or update
 //   listed          none                  own, user edited it   take over as dirty: the device's change wins
 //   etag equal      any                   any                   nothing; a lost record is inserted again
@@ -48,6 +49,9 @@ struct CalPagePlan {
     std::vector<PlannedInstance> instances;
     CalList waiting;  // instances whose series is not known yet
 };
+
+// Whether the plan for the entry takes its content, for lists that come without.
+[[nodiscard]] bool needsContent(const CalListInfo& entry, const CalBookSnapshot& snapshot);
 
 // An entry that cannot be converted is logged and left out.
 CalPagePlan planPage(const CalList& entries, const CalBookSnapshot& snapshot);

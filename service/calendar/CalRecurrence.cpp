@@ -5,11 +5,14 @@
 #include <string>
 
 #include "calendar/CalMappings.h"
+#include "calendar/CalRecordAccess.h"
 #include "calendar/CalTime.h"
 #include "common/JsonAccess.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 
+using cal_record::intOf;
+using cal_record::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 
@@ -110,6 +113,61 @@ int parse(JsonArray* recurrence, calendar_record_h record) {
         if (end > begin) parsePart(rule->substr(begin, end - begin), record);
         begin = end + 1;
     }
+    return kOk;
+}
+
+namespace {
+
+struct TextPart {
+    const char* name;
+    unsigned property;
+};
+constexpr TextPart kTextParts[] = {
+    {";BYDAY=", CALENDAR_EVENT_BYDAY},         {";BYMONTHDAY=", CALENDAR_EVENT_BYMONTHDAY},
+    {";BYYEARDAY=", CALENDAR_EVENT_BYYEARDAY}, {";BYWEEKNO=", CALENDAR_EVENT_BYWEEKNO},
+    {";BYMONTH=", CALENDAR_EVENT_BYMONTH},     {";BYSETPOS=", CALENDAR_EVENT_BYSETPOS},
+};
+
+bool addRange(calendar_record_h record, std::string* rule) {
+    const int range = intOf(record, CALENDAR_EVENT_RANGE_TYPE);
+    if (range == cal_mapping::kRangeCount) {
+        *rule += ";COUNT=" + std::to_string(intOf(record, CALENDAR_EVENT_COUNT));
+        return true;
+    }
+    if (range != cal_mapping::kRangeUntil) return true;
+    calendar_time_s until;
+    if (const int code = calendar_record_get_caltime(record, CALENDAR_EVENT_UNTIL, &until);
+        code != PLATFORM_ERROR_NONE) {
+        SYNC_ERR("get_caltime() fail (%x)", static_cast<unsigned>(code));
+        return false;
+    }
+    if (until.type == CALENDAR_TIME_LOCALTIME) {
+        char text[64];
+        std::snprintf(text, sizeof text, "%04d%02d%02dT000000Z", until.year, until.month, until.mday);
+        *rule += std::string(";UNTIL=") + text;
+        return true;
+    }
+    const std::optional<std::string> text = cal_time::recurrenceIdText(until.utime);
+    if (text) *rule += ";UNTIL=" + *text;
+    return text.has_value();
+}
+
+}  // namespace
+
+int build(calendar_record_h record, std::string* rule) {
+    const std::optional<std::string_view> frequency =
+        cal_mapping::nameOf(cal_mapping::kFrequency, intOf(record, CALENDAR_EVENT_FREQ));
+    if (!frequency) return kOk;
+    std::string text = "RRULE:FREQ=" + std::string(*frequency);
+    text += ";INTERVAL=" + std::to_string(intOf(record, CALENDAR_EVENT_INTERVAL));
+    for (const TextPart& part : kTextParts) {
+        const std::string value = textOf(record, part.property);
+        if (!value.empty()) text += part.name + value;
+    }
+    if (const auto day = cal_mapping::nameOf(cal_mapping::kWeekday, intOf(record, CALENDAR_EVENT_WKST)))
+        text += ";WKST=" + std::string(*day);
+    if (!addRange(record, &text)) return kFailed;
+    *rule = std::move(text);
     return kOk;
 }
 

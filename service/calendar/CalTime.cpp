@@ -57,6 +57,14 @@ std::optional<calendar_time_s> instant(const WallTime& time, const std::string& 
     return result;
 }
 
+}  // namespace
+
+bool isPlausible(const WallTime& time) {
+    const auto within = [](int value, int low, int high) { return value >= low && value <= high; };
+    return within(time.year, 0, 9999) && within(time.month, 1, 12) && within(time.day, 1, 31) &&
+           within(time.hour, 0, 24) && within(time.minute, 0, 59) && within(time.second, 0, 60);
+}
+
 std::optional<calendar_time_s> parseDateTime(const std::string& text, const std::string& timeZone) {
     WallTime time;
     char sign = '\0';
@@ -71,14 +79,6 @@ std::optional<calendar_time_s> parseDateTime(const std::string& text, const std:
     if (fields == kWithoutOffset) return instant(time, timeZone);
     if (offsetHours == 0) return instant(time, "");
     return instant(time, offsetZone(sign == '-' ? '+' : '-', offsetHours));
-}
-
-}  // namespace
-
-bool isPlausible(const WallTime& time) {
-    const auto within = [](int value, int low, int high) { return value >= low && value <= high; };
-    return within(time.year, 0, 9999) && within(time.month, 1, 12) && within(time.day, 1, 31) &&
-           within(time.hour, 0, 24) && within(time.minute, 0, 59) && within(time.second, 0, 60);
 }
 
 std::optional<int64_t> toSeconds(const WallTime& time, const char* zone, int firstDayOfWeek) {
@@ -100,22 +100,68 @@ std::optional<int64_t> toSeconds(const WallTime& time, const char* zone, int fir
     return static_cast<int64_t>(milliseconds / kMsPerSecond);
 }
 
-std::optional<std::string> recurrenceIdText(int64_t seconds) {
+// The wall time of an instant in GMT.
+static std::optional<WallTime> wallTime(int64_t seconds) {
     UCalendar* calendar = calendarOf("Etc/GMT");
     if (calendar == nullptr) return std::nullopt;
     UErrorCode error = U_ZERO_ERROR;
     ucal_setMillis(calendar, static_cast<double>(seconds) * kMsPerSecond, &error);
     const auto field = [&](UCalendarDateFields name) { return ucal_get(calendar, name, &error); };
-    const int year = field(UCAL_YEAR);
-    const int month = field(UCAL_MONTH) + 1;
-    const int day = field(UCAL_DATE);
-    const int hour = field(UCAL_HOUR_OF_DAY);
-    const int minute = field(UCAL_MINUTE);
-    const int second = field(UCAL_SECOND);
+    const WallTime time = {.year = field(UCAL_YEAR),
+                           .month = field(UCAL_MONTH) + 1,
+                           .day = field(UCAL_DATE),
+                           .hour = field(UCAL_HOUR_OF_DAY),
+                           .minute = field(UCAL_MINUTE),
+                           .second = field(UCAL_SECOND)};
     if (U_FAILURE(error)) return std::nullopt;
+    return time;
+}
+
+std::optional<std::string> recurrenceIdText(int64_t seconds) {
+    const std::optional<WallTime> time = wallTime(seconds);
+    if (!time) return std::nullopt;
     char text[64];
-    std::snprintf(text, sizeof text, "%04d%02d%02dT%02d%02d%02dZ", year, month, day, hour, minute, second);
+    std::snprintf(text, sizeof text, "%04d%02d%02dT%02d%02d%02dZ", time->year, time->month, time->day,
+                  time->hour, time->minute, time->second);
     return text;
+}
+
+std::optional<std::string> minuteText(int64_t seconds) {
+    const std::optional<WallTime> time = wallTime(seconds);
+    if (!time) return std::nullopt;
+    char text[64];
+    std::snprintf(text, sizeof text, "%04d-%02d-%02dT%02d:%02d:00Z", time->year, time->month, time->day,
+                  time->hour, time->minute);
+    return text;
+}
+
+std::string dateText(const calendar_time_s& time) {
+    char text[64];
+    std::snprintf(text, sizeof text, "%04d-%02d-%02d", time.year, time.month, time.mday);
+    return text;
+}
+
+std::optional<int64_t> toUtc(const calendar_time_s& time) {
+    if (time.type == CALENDAR_TIME_UTIME) return time.utime;
+    return toSeconds({time.year, time.month, time.mday, time.hour, time.minute, time.second}, "");
+}
+
+std::optional<OriginalStart> originalStart(const std::string& recurrenceId) {
+    WallTime time;
+    char zone = '\0';
+    const int fields = std::sscanf(recurrenceId.c_str(), "%4d%2d%2dT%2d%2d%2d%c", &time.year, &time.month,
+                                   &time.day, &time.hour, &time.minute, &time.second, &zone);
+    constexpr int kDate = 3;
+    constexpr int kDateTime = 7;
+    if ((fields != kDate && fields != kDateTime) || !isPlausible(time)) return std::nullopt;
+    char text[64];
+    if (fields == kDate) {
+        std::snprintf(text, sizeof text, "%04d-%02d-%02d", time.year, time.month, time.day);
+        return OriginalStart{"date", text};
+    }
+    std::snprintf(text, sizeof text, "%04d-%02d-%02dT%02d:%02d:%02dZ", time.year, time.month, time.day,
+                  time.hour, time.minute, time.second);
+    return OriginalStart{"dateTime", text};
 }
 
 std::optional<calendar_time_s> parse(JsonObject* time) {

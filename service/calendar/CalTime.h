@@ -35,6 +35,25 @@ struct WallTime {
 // A "start" or "end" object: {"date"} or {"dateTime"}, either with a "timeZone". Nothing when it cannot be read.
 [[nodiscard]] std::optional<calendar_time_s> parse(JsonObject* time);
 
+// A date and time as the service writes it. Nothing when it cannot be read.
+[[nodiscard]] std::optional<calendar_time_s> parseDateTime(const std::string& text,
+                                                           const std::string& timeZone);
+
+// The instant of a record's time; a wall time counts as GMT.
+[[nodiscard]] std::optional<int64_t> toUtc(const calendar_time_s& time);
+
+// "2014-05-01".
+[[nodiscard]] std::string dateText(const calendar_time_s& time);
+// "2014-05-01T10:00:00Z", the seconds always 00.
+[[nodiscard]] std::optional<std::string> minuteText(int64_t seconds);
+
+// A recurrence id as the member of an "originalStartTime": "date" or "dateTime" and its text. Nothing when it is no recurrence id.
+struct OriginalStart {
+    const char* member;
+    std::string text;
+};
+[[nodiscard]] std::optional<OriginalStart> originalStart(const std::string& recurrenceId);
+
 // "originalStartTime" as a recurrence id, appended to `target` with a comma when it holds one already.
 [[nodiscard]] int appendRecurrenceId(JsonObject* time, std::string* target);
 

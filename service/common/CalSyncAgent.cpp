@@ -1,6 +1,9 @@
 #include "common/CalSyncAgent.h"
 
+#include <initializer_list>
+
 #include "calendar/CalDataManager.h"
+#include "calendar/CalTodoDataManager.h"
 #include "common/Account.h"
 #include "common/SyncResult.h"
 
@@ -29,12 +32,21 @@ int CalSyncAgent::doStop() {
 }
 
 bool CalSyncAgent::hasSomethingToSend() {
-    return CalDataManager::getInstance().hasSomethingToSend(mpAccount->getAccountId());
+    const int accountId = mpAccount->getAccountId();
+    return CalDataManager::getInstance().hasSomethingToSend(accountId) ||
+           CalTodoDataManager::getInstance().hasSomethingToSend(accountId);
 }
 
 void CalSyncAgent::countPending(int* dirty, int* deleted) {
     *dirty = *deleted = 0;
-    (void)CalDataManager::getInstance().countPending(mpAccount->getAccountId(), dirty, deleted);
+    for (CalManager* manager : std::initializer_list<CalManager*>{&CalDataManager::getInstance(),
+                                                                  &CalTodoDataManager::getInstance()}) {
+        int dirtyOfKind = 0;
+        int deletedOfKind = 0;
+        if (manager->countPending(mpAccount->getAccountId(), &dirtyOfKind, &deletedOfKind) != kOk) continue;
+        *dirty += dirtyOfKind;
+        *deleted += deletedOfKind;
+    }
 }
 
 void CalSyncAgent::onSyncCompleted(SyncDirector* director, int result) {

@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "calendar/CalDataManager.h"
+#include "calendar/CalTodoDataManager.h"
 #include "common/AccountDBHelper.h"
 #include "common/CalSyncAgent.h"
 #include "common/SyncLog.h"
@@ -80,10 +81,11 @@ void SyncService::initializeAccount() {
     queryAccounts([](account_h, void*) { return true; }, nullptr);
 }
 
-// Before there is an agent, and on the main thread: change callbacks can only be registered there. The managers of other data
-// kinds have their place here, after the calendar's.
+// Before there is an agent, and on the main thread: change callbacks can only be registered there. The to-dos are kept by the
+// calendar service, which the calendar's manager connects.
 void SyncService::prepareDataManagers() {
     if (CalDataManager::getInstance().prepareSync() != kOk) SYNC_ERR("not prepare sync");
+    if (CalTodoDataManager::getInstance().prepareSync() != kOk) SYNC_ERR("not prepare sync");
 }
 
 int SyncService::initialize() {
@@ -228,8 +230,9 @@ void SyncService::unschedule(SyncAgent* agent) {
 }
 
 void SyncService::deleteData(const Kind& kind, int accountId) {
-    if (kind.type == VANTOR_PIM_SYNC_TYPE_CALENDAR)
-        (void)CalDataManager::getInstance().deleteAccount(accountId);
+    if (kind.type != VANTOR_PIM_SYNC_TYPE_CALENDAR) return;
+    (void)CalDataManager::getInstance().deleteAccount(accountId);
+    (void)CalTodoDataManager::getInstance().deleteAccount(accountId);
 }
 
 int SyncService::updateAccount(const vantor_pim_sync_account_s* record) {

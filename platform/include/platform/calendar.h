@@ -79,6 +79,7 @@ enum calendar_property_e : unsigned {
     CALENDAR_EVENT_SYNC_DATA2,      // str: for the sync engine (the server's etag of the engine's last write)
     CALENDAR_EVENT_VERSION,         // int, ro: version of the last write of the event or one of its children
     CALENDAR_EVENT_SYNCED_VERSION,  // int, ro: version of the sync engine's last write, 0 when none
+    CALENDAR_EVENT_OWN_VERSION,     // int, ro: version of the last write of the event itself
     CALENDAR_EVENT_ATTENDEES,       // children of _calendar_attendee
     CALENDAR_EVENT_ALARMS,          // children of _calendar_alarm
     CALENDAR_EVENT_EXCEPTIONS,      // children of _calendar_event
@@ -92,6 +93,7 @@ enum calendar_property_e : unsigned {
     CALENDAR_TODO_DUE,             // caltime
     CALENDAR_TODO_STATUS,          // int: 0 none, 1 needs action (default), 2 completed
     CALENDAR_TODO_COMPLETED_TIME,  // lli: seconds since 1970 UTC, 0 when not completed
+    CALENDAR_TODO_SYNC_DATA1,      // str: for the sync engine ("due" when the server's copy has a due time)
     CALENDAR_TODO_SYNC_DATA2,      // str: as of the event
     CALENDAR_TODO_VERSION,         // int, ro
     CALENDAR_TODO_SYNCED_VERSION,  // int, ro

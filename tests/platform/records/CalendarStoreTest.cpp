@@ -271,6 +271,8 @@ TEST(CalendarStore, AnExceptionIsAsOldAsItsSeries) {
                                         {.by_sync = true, .expected_versions = expected}),
               PLATFORM_ERROR_CONFLICT);
 
+    EXPECT_EQ(number(series, CALENDAR_EVENT_OWN_VERSION), seen) << "only its exceptions were written";
+
     // A user's edit of the series that nobody has seen stays a user's edit, whatever the sync does to the exceptions.
     touch(series, "user");
     touch(first, "sync", true);

@@ -303,7 +303,8 @@ TEST(CalMappings, GoBothWaysButForTheLossyRows) {
     check(kResponseStatus, {});
     check(kFrequency, {});
     check(kWeekday, {});
-    EXPECT_EQ(std::size(kLossyRows), 8U);
+    check(kTodoStatus, {});
+    EXPECT_EQ(std::size(kLossyRows), 10U);
     const CalendarRecord half = convert(std::string(R"("end":{"date":"2026-03-02"},"start":{"dateTime":")") +
                                         std::string(kLossyRows[2].wire) + R"("})");
     EXPECT_EQ(timeOf(half.get(), CALENDAR_EVENT_START).utime, 1772341200) << kLossyRows[2].device;

@@ -90,13 +90,13 @@ TEST(CalMetaDataDBHelper, DeletionsCascade) {
 
     ASSERT_EQ(store.deleteEvent(1, "s"), kOk);
     std::vector<CalEventMetaData> rows;
-    ASSERT_EQ(store.getAllEvents(1, &rows), kOk);
+    ASSERT_EQ(store.getAllItems(1, &rows), kOk);
     ASSERT_EQ(rows.size(), 1U);
     EXPECT_EQ(rows[0].event_id, 10);
 
     ASSERT_EQ(store.deleteAccount(8), kOk);
     rows.clear();
-    ASSERT_EQ(store.getAllEvents(2, &rows), kOk);
+    ASSERT_EQ(store.getAllItems(2, &rows), kOk);
     EXPECT_TRUE(rows.empty());
     std::list<int> accounts;
     ASSERT_EQ(store.getAllAccountIds(&accounts), kOk);
@@ -171,7 +171,7 @@ TEST(CalMetaDataDBHelper, ATransactionIsWholeAndShutsOthersOut) {
     }  // undone
     other.join();
     std::vector<CalEventMetaData> rows;
-    ASSERT_EQ(store.getAllEvents(1, &rows), kOk);
+    ASSERT_EQ(store.getAllItems(1, &rows), kOk);
     ASSERT_EQ(rows.size(), 1U);
     EXPECT_EQ(rows[0].uri, "b");
 }

@@ -81,17 +81,17 @@ CalendarFixture::CalendarFixture() {
 }
 
 void CalendarFixture::downloadPart(const std::vector<std::vector<Json>>& pages) {
-    CalBookSnapshot snapshot;
+    CalBookSnapshot snapshot(kEventKind);
     ASSERT_EQ(snapshot.load(*manager.metaData(), book), kOk);
-    CalEventWriter writer(manager.metaData(), &snapshot);
+    CalItemWriter writer(manager.metaData(), &snapshot);
     for (const std::vector<Json>& page : pages) EXPECT_EQ(writer.writePage(pageOf(page)), kOk);
 }
 
-CalEventWriter::Counts CalendarFixture::download(const std::vector<std::vector<Json>>& pages) {
-    CalBookSnapshot snapshot;
+CalItemWriter::Counts CalendarFixture::download(const std::vector<std::vector<Json>>& pages) {
+    CalBookSnapshot snapshot(kEventKind);
     EXPECT_EQ(manager.metaData()->getCalendarbook(kAccount, kCalendarUri, &book), kOk);
     EXPECT_EQ(snapshot.load(*manager.metaData(), book), kOk);
-    CalEventWriter writer(manager.metaData(), &snapshot);
+    CalItemWriter writer(manager.metaData(), &snapshot);
     for (const std::vector<Json>& page : pages) EXPECT_EQ(writer.writePage(pageOf(page)), kOk);
     EXPECT_EQ(writer.writeWaiting(), kOk);
     if (writer.listIsProof()) {
@@ -151,7 +151,7 @@ CalEventMetaData CalendarFixture::row(const std::string& uri) {
 
 size_t CalendarFixture::rowCount() {
     std::vector<CalEventMetaData> rows;
-    EXPECT_EQ(manager.metaData()->getAllEvents(book.calendar_id, &rows), kOk);
+    EXPECT_EQ(manager.metaData()->getAllItems(book.calendar_id, &rows), kOk);
     return rows.size();
 }
 

@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "calendar/CalDataManager.h"
-#include "calendar/CalEventWriter.h"
+#include "calendar/CalItemWriter.h"
 #include "support/TestRoot.h"
 
 using Json = nlohmann::json;
@@ -28,7 +28,7 @@ public:
     CalendarFixture();
 
     // Writes the pages as one complete list would be: pages, waiting instances, deletion.
-    CalEventWriter::Counts download(const std::vector<std::vector<Json>>& pages);
+    CalItemWriter::Counts download(const std::vector<std::vector<Json>>& pages);
     // Only the pages: a list that was not read to its end.
     void downloadPart(const std::vector<std::vector<Json>>& pages);
 

@@ -1,5 +1,5 @@
-// The deleting half of CalEventWriter: what a complete list no longer holds.
-#include "calendar/CalEventWriter.h"
+// The deleting half of CalItemWriter: what a complete list no longer holds.
+#include "calendar/CalItemWriter.h"
 #include "calendar/CalSeriesDates.h"
 #include "calendar/CalTransaction.h"
 #include "common/SyncLog.h"
@@ -7,13 +7,13 @@
 using sync_result::kFailed;
 using sync_result::kOk;
 
-void CalEventWriter::markListed(const CalListPage& page) {
+void CalItemWriter::markListed(const CalListPage& page) {
     if (page.unreadable > 0) mListIsProof = false;
     mListed.insert(page.idOnly.begin(), page.idOnly.end());
     for (const CalListInfoPtr& entry : page.entries) mListed.insert(entry->id);
 }
 
-std::vector<CalEventMetaData> CalEventWriter::unlisted() const {
+std::vector<CalEventMetaData> CalItemWriter::unlisted() const {
     std::vector<CalEventMetaData> rows;
     std::unordered_set<int> series;
     const std::vector<const CalEventMetaData*> known = mpSnapshot->knownToServer();
@@ -28,20 +28,21 @@ std::vector<CalEventMetaData> CalEventWriter::unlisted() const {
 
 // The unlisted rows that may go now. A change that the device has not sent yet keeps its item: the upload finds out that the
 // server has it no more, and the download after it lets it go.
-std::vector<CalEventMetaData> CalEventWriter::deletable() const {
+std::vector<CalEventMetaData> CalItemWriter::deletable() const {
     std::vector<CalEventMetaData> gone;
     std::unordered_set<int> keptSeries;
     const std::vector<CalEventMetaData> rows = unlisted();
-    const auto keep = [](const CalEventMetaData& row) {
+    const auto keep = [this](const CalEventMetaData& row) {
         SYNC_ERR(
-            "event(%s) is no longer on the server but was changed on the device, it stays until that has "
+            "%s(%s) is no longer on the server but was changed on the device, it stays until that has "
             "been sent",
-            row.uri.c_str());
+            mpSnapshot->kind().itemName, row.uri.c_str());
     };
     for (const CalEventMetaData& row : rows) {
         const bool deletedHere = row.deleted != 0 || mpSnapshot->record(row.event_id) == nullptr;
         if (row.original_event_id != 0) continue;
-        if (!deletedHere && mpSnapshot->hasLocalChange(row)) {
+        if (!deletedHere && (mpSnapshot->hasLocalChange(row) || mpSnapshot->hasUnseenChange(row) ||
+                             mpSnapshot->hasChangedInstance(row.event_id))) {
             keptSeries.insert(row.event_id);
             keep(row);
         } else {
@@ -62,7 +63,7 @@ std::vector<CalEventMetaData> CalEventWriter::deletable() const {
     return gone;
 }
 
-int CalEventWriter::deleteUnlisted() {
+int CalItemWriter::deleteUnlisted() {
     std::vector<CalEventMetaData> gone = deletable();
     if (gone.empty()) return kOk;
     Batch batch;
@@ -72,7 +73,7 @@ int CalEventWriter::deleteUnlisted() {
 }
 
 // Takes out of `gone` what could not be deleted because the device changed it meanwhile.
-int CalEventWriter::deleteRecords(std::vector<CalEventMetaData>* gone, Batch* batch) {
+int CalItemWriter::deleteRecords(std::vector<CalEventMetaData>* gone, Batch* batch) {
     CalTransaction transaction;
     if (!transaction.begun()) {
         SYNC_ERR("get svc fail");
@@ -92,8 +93,8 @@ int CalEventWriter::deleteRecords(std::vector<CalEventMetaData>* gone, Batch* ba
         }
     }
     const record_write_options_s options{.by_sync = true, .expected_versions = expected, .skipped = &skipped};
-    if (!ids.empty() &&
-        calendar_db_delete_records(_calendar_event, ids.data(), ids.size(), options) != PLATFORM_ERROR_NONE) {
+    if (!ids.empty() && calendar_db_delete_records(mpSnapshot->kind().view, ids.data(), ids.size(),
+                                                   options) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("db_delete_records fail");
         return kFailed;
     }
@@ -126,15 +127,15 @@ int CalEventWriter::deleteRecords(std::vector<CalEventMetaData>* gone, Batch* ba
     return kOk;
 }
 
-int CalEventWriter::deleteRows(const std::vector<CalEventMetaData>& gone, const Batch& batch) {
-    SyncTransaction transaction(mpMetaData->database());
+int CalItemWriter::deleteRows(const std::vector<CalEventMetaData>& gone, const Batch& batch) {
+    SyncTransaction transaction(mpStore->database());
     if (!transaction.begun()) {
         SYNC_ERR("begin trans fail");
         return kFailed;
     }
     for (const CalEventMetaData& row : gone) {
-        if (mpMetaData->deleteEvent(row.calendar_id, row.uri) != kOk) {
-            SYNC_ERR("metaDB deleteEvent fail");
+        if (mpStore->deleteItem(row.calendar_id, row.uri) != kOk) {
+            SYNC_ERR("%s", mpSnapshot->kind().texts.deleteRow);
             return kFailed;
         }
     }

@@ -1,4 +1,4 @@
-// CalEventWriter: writes the events of one book page by page: plan, records in one transaction of the calendar service, rows
+// CalItemWriter: writes the items of one book page by page: plan, records in one transaction of the calendar service, rows
 // in one transaction of the metadata store; and knows at the end what a complete list no longer holds.
 // Owner: one syncEventPage run or one single-item call.   Threads: one worker.
 // Errors: 0 or -1, logged. A page that could not be written leaves both stores as they were, or records without rows, which
@@ -12,17 +12,21 @@
 #include <vector>
 
 #include "calendar/CalBookSnapshot.h"
+#include "calendar/CalItemStore.h"
 #include "calendar/CalPagePlan.h"
 
-class CalEventWriter {
+class CalItemWriter {
 public:
     // Neither is owned; the snapshot is kept in step with what is written.
-    CalEventWriter(CalMetaDataDBHelper* metaData, CalBookSnapshot* snapshot);
+    CalItemWriter(CalItemStore* store, CalBookSnapshot* snapshot);
 
     // Counts the entries as listed and writes what is new or changed.
     [[nodiscard]] int writePage(const CalListPage& page);
     // Writes the instances that came before their series; those without a series are logged.
     [[nodiscard]] int writeWaiting();
+
+    // Takes the entries that are ours from an earlier run whose answer was lost, and nothing else.
+    [[nodiscard]] int adoptSent(const CalListPage& page);
 
     // --- after the last page
     // False when an item could not be read at all: then the list proves nothing.
@@ -44,15 +48,15 @@ public:
 private:
     // What one transaction over the records has done so far.
     struct Batch {
-        std::unordered_map<std::string, int> insertedIds;  // ordinary events, by uri
+        std::unordered_map<std::string, int> insertedIds;  // ordinary items, by uri
         std::map<int, int> seriesVersions;        // version that a child's or date's write gave to a series
         std::unordered_set<const void*> skipped;  // planned items whose record had moved on
     };
 
     [[nodiscard]] int write(CalPagePlan* plan);
     [[nodiscard]] int writeRecords(CalPagePlan* plan, Batch* batch);
-    [[nodiscard]] int insertEvents(CalPagePlan* plan, Batch* batch);
-    [[nodiscard]] int updateEvents(CalPagePlan* plan, Batch* batch);
+    [[nodiscard]] int insertItems(CalPagePlan* plan, Batch* batch);
+    [[nodiscard]] int updateItems(CalPagePlan* plan, Batch* batch);
     void resolveSeries(CalPagePlan* plan, Batch* batch);
     [[nodiscard]] int insertException(CalPagePlan* plan, Batch* batch);
     [[nodiscard]] int updateException(CalPagePlan* plan, Batch* batch);
@@ -67,7 +71,7 @@ private:
     [[nodiscard]] int deleteRecords(std::vector<CalEventMetaData>* gone, Batch* batch);
     [[nodiscard]] int deleteRows(const std::vector<CalEventMetaData>& gone, const Batch& batch);
 
-    CalMetaDataDBHelper* const mpMetaData;
+    CalItemStore* const mpStore;
     CalBookSnapshot* const mpSnapshot;
     std::unordered_set<std::string> mListed;
     CalList mWaiting;

@@ -1,4 +1,4 @@
-#include "calendar/CalEventWriter.h"
+#include "calendar/CalItemWriter.h"
 
 #include <utility>
 
@@ -47,7 +47,7 @@ public:
         std::unordered_set<size_t> left(mSkipped.begin(), mSkipped.end());
         for (size_t i = 0; i < mItems.size(); ++i) {
             if (left.contains(i)) {
-                SYNC_ERR("event(%s) was changed on the device meanwhile, it is left for the next sync",
+                SYNC_ERR("item(%s) was changed on the device meanwhile, it is left for the next sync",
                          mItems[i]->row.uri.c_str());
                 skipped->insert(mItems[i]);
             } else {
@@ -72,10 +72,10 @@ int lastChangeVersion() {
 
 }  // namespace
 
-CalEventWriter::CalEventWriter(CalMetaDataDBHelper* metaData, CalBookSnapshot* snapshot)
-    : mpMetaData(metaData), mpSnapshot(snapshot) {}
+CalItemWriter::CalItemWriter(CalItemStore* store, CalBookSnapshot* snapshot)
+    : mpStore(store), mpSnapshot(snapshot) {}
 
-int CalEventWriter::writePage(const CalListPage& page) {
+int CalItemWriter::writePage(const CalListPage& page) {
     if (page.unreadable > 0) mListIsProof = false;
     mListed.insert(page.idOnly.begin(), page.idOnly.end());
     CalList fresh;
@@ -83,7 +83,7 @@ int CalEventWriter::writePage(const CalListPage& page) {
         if (mListed.insert(entry->id).second) {
             fresh.push_back(entry);
         } else {
-            SYNC_ERR("event(%s) is listed twice, ignoring", entry->id.c_str());
+            SYNC_ERR("%s(%s) is listed twice, ignoring", mpSnapshot->kind().itemName, entry->id.c_str());
         }
     }
     CalPagePlan plan = planPage(fresh, *mpSnapshot);
@@ -91,7 +91,14 @@ int CalEventWriter::writePage(const CalListPage& page) {
     return write(&plan);
 }
 
-int CalEventWriter::writeWaiting() {
+int CalItemWriter::adoptSent(const CalListPage& page) {
+    CalPagePlan plan = planPage(page.entries, *mpSnapshot);
+    std::erase_if(plan.events, [](const PlannedEvent& planned) { return planned.record != nullptr; });
+    plan.instances.clear();
+    return write(&plan);
+}
+
+int CalItemWriter::writeWaiting() {
     CalPagePlan plan = planPage(std::exchange(mWaiting, {}), *mpSnapshot);
     for (const CalListInfoPtr& entry : plan.waiting) {
         ExceptionInfo info;
@@ -101,7 +108,7 @@ int CalEventWriter::writeWaiting() {
     return write(&plan);
 }
 
-int CalEventWriter::write(CalPagePlan* plan) {
+int CalItemWriter::write(CalPagePlan* plan) {
     if (plan->events.empty() && plan->instances.empty()) return kOk;
     Batch batch;
     if (writeRecords(plan, &batch) != kOk || writeRows(plan, batch) != kOk) return kFailed;
@@ -109,13 +116,13 @@ int CalEventWriter::write(CalPagePlan* plan) {
     return kOk;
 }
 
-int CalEventWriter::writeRecords(CalPagePlan* plan, Batch* batch) {
+int CalItemWriter::writeRecords(CalPagePlan* plan, Batch* batch) {
     CalTransaction transaction;
     if (!transaction.begun()) {
         SYNC_ERR("get svc fail");
         return kFailed;
     }
-    if (insertEvents(plan, batch) != kOk || updateEvents(plan, batch) != kOk) return kFailed;
+    if (insertItems(plan, batch) != kOk || updateItems(plan, batch) != kOk) return kFailed;
     resolveSeries(plan, batch);
     if (insertException(plan, batch) != kOk || updateException(plan, batch) != kOk) return kFailed;
     std::vector<PlannedInstance*> cancelled;
@@ -135,17 +142,18 @@ namespace {
 
 // Writes a bulk, as new records or over those it names, and tells `note(item, record id, version)` of each that was written.
 template <class Planned, class Note>
-int writeBulk(Bulk<Planned>* bulk, bool isNew, std::unordered_set<const void*>* skipped, Note note) {
+int writeBulk(const CalItemKind& kind, Bulk<Planned>* bulk, bool isNew,
+              std::unordered_set<const void*>* skipped, Note note) {
     if (bulk->empty()) return kOk;
     const int code = isNew ? calendar_db_insert_records(bulk->list(), bulk->options())
                            : calendar_db_replace_records(bulk->list(), bulk->ids().data(), bulk->ids().size(),
                                                          bulk->options());
     if (code != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("%s", isNew ? "insertEvents fail" : "updateEvents fail");
+        SYNC_ERR("%s", isNew ? kind.texts.insertItems : kind.texts.updateItems);
         return kFailed;
     }
     const int version = lastChangeVersion();
-    bulk->finish(CALENDAR_EVENT_ID, skipped, [&](Planned* planned, int id) {
+    bulk->finish(kind.id, skipped, [&](Planned* planned, int id) {
         planned->row.event_id = id;
         planned->row.version = version;
         note(planned, id, version);
@@ -155,35 +163,36 @@ int writeBulk(Bulk<Planned>* bulk, bool isNew, std::unordered_set<const void*>* 
 
 }  // namespace
 
-int CalEventWriter::insertEvents(CalPagePlan* plan, Batch* batch) {
+int CalItemWriter::insertItems(CalPagePlan* plan, Batch* batch) {
     Bulk<PlannedEvent> bulk;
     for (PlannedEvent& planned : plan->events) {
         if (planned.record && planned.row.event_id == 0) bulk.add(&planned, 0, kAnyVersion);
     }
-    return writeBulk(&bulk, /*isNew=*/true, &batch->skipped, [&](const PlannedEvent* planned, int id, int) {
-        batch->insertedIds.emplace(planned->row.uri, id);
-        ++mCounts.inserted;
-    });
+    return writeBulk(mpSnapshot->kind(), &bulk, /*isNew=*/true, &batch->skipped,
+                     [&](const PlannedEvent* planned, int id, int) {
+                         batch->insertedIds.emplace(planned->row.uri, id);
+                         ++mCounts.inserted;
+                     });
 }
 
-int CalEventWriter::updateEvents(CalPagePlan* plan, Batch* batch) {
+int CalItemWriter::updateItems(CalPagePlan* plan, Batch* batch) {
     Bulk<PlannedEvent> bulk;
     for (PlannedEvent& planned : plan->events) {
         if (planned.record && planned.row.event_id != 0) {
             bulk.add(&planned, planned.row.event_id, planned.expectedVersion);
         }
     }
-    return writeBulk(&bulk, /*isNew=*/false, &batch->skipped,
+    return writeBulk(mpSnapshot->kind(), &bulk, /*isNew=*/false, &batch->skipped,
                      [&](const PlannedEvent*, int, int) { ++mCounts.updated; });
 }
 
-int CalEventWriter::expectedSeriesVersion(int seriesId) const {
+int CalItemWriter::expectedSeriesVersion(int seriesId) const {
     const CalRecordState* state = mpSnapshot->record(seriesId);
     // A series of this very page is not in the snapshot; nobody else can have seen it yet.
     return state != nullptr ? state->version : kAnyVersion;
 }
 
-void CalEventWriter::resolveSeries(CalPagePlan* plan, Batch* batch) {
+void CalItemWriter::resolveSeries(CalPagePlan* plan, Batch* batch) {
     for (PlannedInstance& planned : plan->instances) {
         int& seriesId = planned.row.original_event_id;
         if (const auto inserted = batch->insertedIds.find(planned.seriesUri);
@@ -202,28 +211,29 @@ void CalEventWriter::resolveSeries(CalPagePlan* plan, Batch* batch) {
     }
 }
 
-int CalEventWriter::insertException(CalPagePlan* plan, Batch* batch) {
+int CalItemWriter::insertException(CalPagePlan* plan, Batch* batch) {
     return writeExceptions(plan, batch, /*isNew=*/true, &mCounts.inserted);
 }
 
-int CalEventWriter::updateException(CalPagePlan* plan, Batch* batch) {
+int CalItemWriter::updateException(CalPagePlan* plan, Batch* batch) {
     return writeExceptions(plan, batch, /*isNew=*/false, &mCounts.updated);
 }
 
-int CalEventWriter::writeExceptions(CalPagePlan* plan, Batch* batch, bool isNew, int* count) {
+int CalItemWriter::writeExceptions(CalPagePlan* plan, Batch* batch, bool isNew, int* count) {
     Bulk<PlannedInstance> bulk;
     for (PlannedInstance& planned : plan->instances) {
         if (planned.record && (planned.childId == 0) == isNew && !batch->skipped.contains(&planned)) {
             bulk.add(&planned, planned.childId, expectedSeriesVersion(planned.row.original_event_id));
         }
     }
-    return writeBulk(&bulk, isNew, &batch->skipped, [&](const PlannedInstance* planned, int, int version) {
-        batch->seriesVersions[planned->row.original_event_id] = version;
-        ++*count;
-    });
+    return writeBulk(mpSnapshot->kind(), &bulk, isNew, &batch->skipped,
+                     [&](const PlannedInstance* planned, int, int version) {
+                         batch->seriesVersions[planned->row.original_event_id] = version;
+                         ++*count;
+                     });
 }
 
-int CalEventWriter::deleteExceptions(const std::vector<PlannedInstance*>& instances, Batch* batch) {
+int CalItemWriter::deleteExceptions(const std::vector<PlannedInstance*>& instances, Batch* batch) {
     if (instances.empty()) return kOk;
     std::vector<int> ids;
     std::vector<int> expected;
@@ -249,7 +259,7 @@ int CalEventWriter::deleteExceptions(const std::vector<PlannedInstance*>& instan
     return kOk;
 }
 
-int CalEventWriter::writeExceptionDates(CalPagePlan* plan, Batch* batch) {
+int CalItemWriter::writeExceptionDates(CalPagePlan* plan, Batch* batch) {
     std::map<int, std::vector<PlannedInstance*>> bySeries;
     for (PlannedInstance& planned : plan->instances) {
         if ((planned.addDate || planned.dropDate) && !batch->skipped.contains(&planned)) {
@@ -279,12 +289,13 @@ int CalEventWriter::writeExceptionDates(CalPagePlan* plan, Batch* batch) {
     return kOk;
 }
 
-int CalEventWriter::writeRows(CalPagePlan* plan, const Batch& batch) {
-    SyncTransaction transaction(mpMetaData->database());
+int CalItemWriter::writeRows(CalPagePlan* plan, const Batch& batch) {
+    SyncTransaction transaction(mpStore->database());
     if (!transaction.begun()) {
         SYNC_ERR("begin trans fail");
         return kFailed;
     }
+    const CalItemKind::Texts& texts = mpSnapshot->kind().texts;
     for (PlannedEvent& planned : plan->events) {
         if (batch.skipped.contains(&planned)) continue;
         if (const auto touched = batch.seriesVersions.find(planned.row.event_id);
@@ -292,21 +303,20 @@ int CalEventWriter::writeRows(CalPagePlan* plan, const Batch& batch) {
             planned.row.version = touched->second;
         }
         if (planned.rowWrite == RowWrite::kReplaceLost &&
-            mpMetaData->deleteEvent(planned.row.calendar_id, planned.row.uri) != kOk) {
+            mpStore->deleteItem(planned.row.calendar_id, planned.row.uri) != kOk) {
             return kFailed;
         }
         const bool update = planned.rowWrite == RowWrite::kUpdate;
-        if ((update ? mpMetaData->updateEvent(planned.row) : mpMetaData->insertEvent(planned.row)) != kOk) {
-            SYNC_ERR("%s", update ? "metaDB updateEvent fail" : "metaDB insertEvent fail");
+        if ((update ? mpStore->updateItem(planned.row) : mpStore->insertItem(planned.row)) != kOk) {
+            SYNC_ERR("%s", update ? texts.updateRow : texts.insertRow);
             return kFailed;
         }
     }
     for (const PlannedInstance& planned : plan->instances) {
         if (batch.skipped.contains(&planned)) continue;
         const bool update = planned.rowWrite == RowWrite::kUpdate;
-        if ((update ? mpMetaData->updateExceptionEvent(planned.row) : mpMetaData->insertEvent(planned.row)) !=
-            kOk) {
-            SYNC_ERR("%s", update ? "metaDB updateEvent fail" : "metaDB insertEvent fail");
+        if ((update ? mpStore->updateItem(planned.row) : mpStore->insertItem(planned.row)) != kOk) {
+            SYNC_ERR("%s", update ? texts.updateRow : texts.insertRow);
             return kFailed;
         }
     }
@@ -314,7 +324,7 @@ int CalEventWriter::writeRows(CalPagePlan* plan, const Batch& batch) {
     return transaction.commit();
 }
 
-int CalEventWriter::writeSeriesVersions(const CalPagePlan& plan, const Batch& batch) {
+int CalItemWriter::writeSeriesVersions(const CalPagePlan& plan, const Batch& batch) {
     std::unordered_set<int> written;
     for (const PlannedEvent& planned : plan.events) {
         if (!batch.skipped.contains(&planned)) written.insert(planned.row.event_id);
@@ -322,12 +332,12 @@ int CalEventWriter::writeSeriesVersions(const CalPagePlan& plan, const Batch& ba
     for (const auto& [seriesId, version] : batch.seriesVersions) {
         if (written.contains(seriesId)) continue;
         CalEventMetaData row;
-        if (mpMetaData->getEvent(seriesId, &row) != kOk) {
+        if (mpStore->getItem(seriesId, &row) != kOk) {
             SYNC_ERR("metaDB getEvent fail");
             return kFailed;
         }
         row.version = version;
-        if (mpMetaData->updateEvent(row) != kOk) {
+        if (mpStore->updateItem(row) != kOk) {
             SYNC_ERR("metaDB updateEvent fail");
             return kFailed;
         }
@@ -335,11 +345,12 @@ int CalEventWriter::writeSeriesVersions(const CalPagePlan& plan, const Batch& ba
     return kOk;
 }
 
-void CalEventWriter::remember(const CalPagePlan& plan, const Batch& batch) {
+void CalItemWriter::remember(const CalPagePlan& plan, const Batch& batch) {
     const auto rememberRow = [this](const CalEventMetaData& row, bool written) {
         mpSnapshot->put(row);
         if (!written || row.event_id <= 0) return;
         mpSnapshot->putRecord(row.event_id, {.version = row.version,
+                                             .ownVersion = row.version,
                                              .syncedVersion = row.version,
                                              .originalEventId = row.original_event_id,
                                              .uid = row.uri,

@@ -26,7 +26,7 @@ std::string instanceUid(int day) {
 
 }  // namespace
 
-TEST(CalEventWriter, ASecondListWithTheSameEtagsChangesNoStore) {
+TEST(CalItemWriter, ASecondListWithTheSameEtagsChangesNoStore) {
     CalendarFixture device;
     const std::vector<std::vector<Json>> list = {{event("a", "1"), series("s", "1")},
                                                  {instance("s", 3, "1"), cancelled("s", 4, "1")}};
@@ -34,13 +34,13 @@ TEST(CalEventWriter, ASecondListWithTheSameEtagsChangesNoStore) {
     EXPECT_EQ(device.rowCount(), 4U);
     const int version = device.storeVersion();
 
-    const CalEventWriter::Counts counts = device.download(list);
+    const CalItemWriter::Counts counts = device.download(list);
 
     EXPECT_EQ(counts.inserted + counts.updated + counts.deleted, 0);
     EXPECT_EQ(device.storeVersion(), version);
 }
 
-TEST(CalEventWriter, AChangedEtagReplacesTheRecordAndKeepsItsId) {
+TEST(CalItemWriter, AChangedEtagReplacesTheRecordAndKeepsItsId) {
     CalendarFixture device;
     device.download({{event("a", "1", {{"location", "room"}})}});
     const int id = device.number("a", CALENDAR_EVENT_ID);
@@ -54,7 +54,7 @@ TEST(CalEventWriter, AChangedEtagReplacesTheRecordAndKeepsItsId) {
     EXPECT_EQ(device.row("a").version, device.number("a", CALENDAR_EVENT_VERSION));
 }
 
-TEST(CalEventWriter, AnEditThatTheSyncHasNotSeenWinsAndTheRowTakesTheEtag) {
+TEST(CalItemWriter, AnEditThatTheSyncHasNotSeenWinsAndTheRowTakesTheEtag) {
     CalendarFixture device;
     device.download({{event("a", "1")}});
     device.userSets("a", kSummary, "mine");
@@ -67,7 +67,7 @@ TEST(CalEventWriter, AnEditThatTheSyncHasNotSeenWinsAndTheRowTakesTheEtag) {
     EXPECT_EQ(device.row("a").dirty, 1) << "the edit must still be found";
 }
 
-TEST(CalEventWriter, InstancesOfASeriesFollowTheServer) {
+TEST(CalItemWriter, InstancesOfASeriesFollowTheServer) {
     struct Step {
         const char* name;
         std::vector<std::vector<Json>> list;
@@ -114,7 +114,7 @@ TEST(CalEventWriter, InstancesOfASeriesFollowTheServer) {
     EXPECT_EQ(device.rowCount(), 0U);
 }
 
-TEST(CalEventWriter, ACancelledInstanceHasARowThatNoTriggerTakes) {
+TEST(CalItemWriter, ACancelledInstanceHasARowThatNoTriggerTakes) {
     CalendarFixture device;
     device.download({{event("a", "1"), series("s", "1"), cancelled("s", 4, "1")}});
     EXPECT_EQ(instanceRow(device, 4).event_id, -device.row("s").event_id);
@@ -124,7 +124,7 @@ TEST(CalEventWriter, ACancelledInstanceHasARowThatNoTriggerTakes) {
     EXPECT_EQ(device.rowCount(), 2U);
 }
 
-TEST(CalEventWriter, RecordsWhoseRowsWereLostAreTakenOver) {
+TEST(CalItemWriter, RecordsWhoseRowsWereLostAreTakenOver) {
     CalendarFixture device;
     const std::vector<std::vector<Json>> list = {
         {event("a", "1"), event("b", "1"), series("s", "1"), instance("s", 3, "1")}};
@@ -147,7 +147,7 @@ TEST(CalEventWriter, RecordsWhoseRowsWereLostAreTakenOver) {
     EXPECT_EQ(instanceRow(device, 3).event_id, device.number(instanceUid(3), CALENDAR_EVENT_ID));
 }
 
-TEST(CalEventWriter, ARecordThatWasUpdatedBeforeItsRowIsNoLocalChange) {
+TEST(CalItemWriter, ARecordThatWasUpdatedBeforeItsRowIsNoLocalChange) {
     CalendarFixture device;
     device.download({{event("a", "1")}});
     const CalEventMetaData before = device.row("a");
@@ -161,7 +161,7 @@ TEST(CalEventWriter, ARecordThatWasUpdatedBeforeItsRowIsNoLocalChange) {
     EXPECT_EQ(device.text("a", kSummary), "a 3");
 }
 
-TEST(CalEventWriter, OnlyProofDeletes) {
+TEST(CalItemWriter, OnlyProofDeletes) {
     struct Case {
         const char* name;
         std::vector<Json> list;
@@ -185,7 +185,7 @@ TEST(CalEventWriter, OnlyProofDeletes) {
     }
 }
 
-TEST(CalEventWriter, AnUnlistedEventWithALocalChangeStaysUntilItWasSent) {
+TEST(CalItemWriter, AnUnlistedEventWithALocalChangeStaysUntilItWasSent) {
     CalendarFixture device;
     device.download({{event("a", "1"), event("b", "1")}});
     device.userSets("b", kSummary, "mine");
@@ -198,7 +198,7 @@ TEST(CalEventWriter, AnUnlistedEventWithALocalChangeStaysUntilItWasSent) {
     EXPECT_THAT(device.summaries(), ElementsAre("a 1", "mine"));
 }
 
-TEST(CalEventWriter, AnEventThatWasNeverSentIsOnNoListOfKnownOnes) {
+TEST(CalItemWriter, AnEventThatWasNeverSentIsOnNoListOfKnownOnes) {
     CalendarFixture device;
     device.userAdds("mine");
     ASSERT_EQ(device.manager.setCalendarbookChanged(device.book.calendar_id), 0);
@@ -209,7 +209,7 @@ TEST(CalEventWriter, AnEventThatWasNeverSentIsOnNoListOfKnownOnes) {
     EXPECT_TRUE(device.manager.hasSomethingToSend(kAccount));
 }
 
-TEST(CalEventWriter, ADeletionThatTheSyncHasNotSeenIsNotUndone) {
+TEST(CalItemWriter, ADeletionThatTheSyncHasNotSeenIsNotUndone) {
     CalendarFixture device;
     device.download({{event("a", "1"), event("b", "1")}});
     device.userDeletes("b");
@@ -221,7 +221,7 @@ TEST(CalEventWriter, ADeletionThatTheSyncHasNotSeenIsNotUndone) {
     EXPECT_EQ(device.row("b").deleted, 1);
 }
 
-TEST(CalEventWriter, APartialListLeavesEverythingElse) {
+TEST(CalItemWriter, APartialListLeavesEverythingElse) {
     CalendarFixture device;
     device.download({{event("a", "1"), event("b", "1")}});
     device.downloadPart({{event("a", "2")}});
@@ -245,8 +245,8 @@ TEST(CalLocalChanges, AreFoundOnceAndTheSyncsOwnNever) {
         ASSERT_EQ(device.manager.getAllDirtyEventIds(kCalendarUri, &dirty), 0);
         ASSERT_EQ(device.manager.getAllDeletedEventIds(kCalendarUri, &deleted), 0);
         EXPECT_THAT(dirty,
-                    testing::UnorderedElementsAre(added, device.row("a").event_id, device.row("s").event_id,
-                                                  instanceRow(device, 3).event_id));
+                    testing::UnorderedElementsAre(added, device.row("a").event_id, instanceRow(device, 3).event_id))
+            << "a series is not changed by its instance";
         EXPECT_THAT(deleted, ElementsAre(device.row("b").event_id));
         EXPECT_EQ(device.rowCount(), 5U);
     }
@@ -258,7 +258,7 @@ TEST(CalDataManager, BooksFollowTheDeviceAndInterruptedSyncs) {
     std::list<std::string> uris;
     // A book that the user deleted loses its rows, so that the download makes it again.
     ASSERT_EQ(calendar_db_delete_record(_calendar_book, device.book.calendar_id), PLATFORM_ERROR_NONE);
-    ASSERT_EQ(device.manager.reconcileCalendarbooks(kAccount), 0);
+    ASSERT_EQ(device.manager.reconcileBooks(kAccount), 0);
     ASSERT_EQ(device.manager.getAllCalendarbookUri(kAccount, &uris), 0);
     EXPECT_THAT(uris, IsEmpty());
 
@@ -268,11 +268,11 @@ TEST(CalDataManager, BooksFollowTheDeviceAndInterruptedSyncs) {
     entry.summary = "Second";
     ASSERT_EQ(device.manager.insertCalendarbook(kAccount, entry), 0);
     ASSERT_EQ(device.manager.metaData()->deleteCalendarbook(kAccount, "second"), 0);
-    ASSERT_EQ(device.manager.reconcileCalendarbooks(kAccount), 0);
+    ASSERT_EQ(device.manager.reconcileBooks(kAccount), 0);
     ASSERT_EQ(device.manager.getAllCalendarbookUri(kAccount, &uris), 0);
     EXPECT_THAT(uris, ElementsAre("second"));
     // Another account's rows are not touched by it.
-    ASSERT_EQ(device.manager.reconcileCalendarbooks(kAccount + 1), 0);
+    ASSERT_EQ(device.manager.reconcileBooks(kAccount + 1), 0);
     ASSERT_EQ(device.manager.deleteAccount(kAccount + 1), 0);
     EXPECT_EQ(device.manager.getCalendarbookEtag(kAccount, "second", &uris.front()), 0);
 }

@@ -1,0 +1,41 @@
+// CalJsonBuilder: the bodies of uploads from the device's records; the reverse of CalJsonParser's conversions, over the same tables.
+// What does not come back as it went stands in kLossyRows.
+// Owner: one call.   Threads: one.   Errors: 0 or -1, each failure logged.
+#pragma once
+
+#include <string>
+
+#include "calendar/CalJsonObject.h"
+#include "platform/calendar.h"
+
+class CalJsonBuilder {
+public:
+    // An event's body, for insert and update.
+    [[nodiscard]] int addEvent(calendar_record_h record);
+    // The same for one instance of a series: names the series and the instance as well.
+    [[nodiscard]] int addException(calendar_record_h record, const std::string& seriesUri);
+    // A task's body.
+    [[nodiscard]] int addTodo(calendar_record_h record);
+
+    [[nodiscard]] CalJsonObject& object() { return mObject; }
+
+private:
+    [[nodiscard]] int setTime(calendar_record_h record, const char* name, unsigned property);
+    [[nodiscard]] int setRecurrence(calendar_record_h record);
+    [[nodiscard]] int setAttendees(calendar_record_h record);
+    [[nodiscard]] int setReminders(calendar_record_h record);
+    [[nodiscard]] int setDue(calendar_record_h record);
+
+    CalJsonObject mObject;
+};
+
+namespace cal_json {
+
+// Bodies as text, empty when the record cannot be read.
+[[nodiscard]] std::string eventBody(calendar_record_h record);
+[[nodiscard]] std::string exceptionBody(calendar_record_h record, const std::string& seriesUri);
+[[nodiscard]] std::string todoBody(calendar_record_h record);
+// An event's body without the name of its time zone, which servers fill in on their own.
+[[nodiscard]] std::string comparableEventBody(calendar_record_h record);
+
+}  // namespace cal_json

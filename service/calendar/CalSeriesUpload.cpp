@@ -1,0 +1,163 @@
+// The half of CalUploader that sends the instances of a series: modified ones to their own server id, cancelled ones as deletions.
+#include <algorithm>
+#include <set>
+
+#include "calendar/CalExceptionDates.h"
+#include "calendar/CalJsonBuilder.h"
+#include "calendar/CalRecordAccess.h"
+#include "calendar/CalUploader.h"
+#include "common/SyncLog.h"
+
+using cal_record::intOf;
+using cal_record::textOf;
+using sync_result::kOk;
+
+namespace {
+
+std::string instanceUri(const std::string& seriesUri, const std::string& recurrenceId) {
+    return seriesUri + "_" + recurrenceId;
+}
+
+// The exceptions of a record by their ids.
+std::map<int, calendar_record_h> exceptionsOf(calendar_record_h record) {
+    std::map<int, calendar_record_h> children;
+    unsigned count = 0;
+    if (calendar_record_get_child_record_count(record, CALENDAR_EVENT_EXCEPTIONS, &count) !=
+        PLATFORM_ERROR_NONE) {
+        SYNC_ERR("getExceptionEvent fail");
+        return children;
+    }
+    for (unsigned i = 0; i < count; ++i) {
+        calendar_record_h child = nullptr;
+        if (calendar_record_get_child_record_at_p(record, CALENDAR_EVENT_EXCEPTIONS, i, &child) !=
+            PLATFORM_ERROR_NONE) {
+            SYNC_ERR("get child fail[%u]", i);
+            continue;
+        }
+        children.emplace(intOf(child, CALENDAR_EVENT_ID), child);
+    }
+    return children;
+}
+
+}  // namespace
+
+CalUploader::Row* CalUploader::instanceRow(int seriesId, const std::string& recurrenceId) {
+    const auto rows = mInstances.find(seriesId);
+    if (rows == mInstances.end()) return nullptr;
+    const auto found = std::find_if(rows->second.begin(), rows->second.end(),
+                                    [&](const Row* row) { return row->recurrence_id == recurrenceId; });
+    return found == rows->second.end() ? nullptr : *found;
+}
+
+bool CalUploader::hasUnsentDates(const Row& series, calendar_record_h record) {
+    if (!mKind.hasSeries()) return false;
+    const std::vector<std::string> dates = exception_dates::split(textOf(record, CALENDAR_EVENT_EXDATE));
+    return std::any_of(dates.begin(), dates.end(), [&](const std::string& date) {
+        const Row* row = instanceRow(series.event_id, date);
+        return row == nullptr || row->event_id > 0;
+    });
+}
+
+void CalUploader::sendInstances(Row& series, calendar_record_h record) {
+    if (series.dirty != 0 && hasUnsentDates(series, record) && sendDates(series, record)) {
+        series.dirty = 0;
+        if (mpStore->updateItem(series) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
+    }
+    const std::map<int, calendar_record_h> children = exceptionsOf(record);
+    const auto rows = mInstances.find(series.event_id);
+    if (rows == mInstances.end()) return;
+    for (Row* row : rows->second) {
+        if (mEnd != End::kNone || isStopped()) return;
+        if (row->dirty == 0 || row->event_id <= 0) continue;
+        const auto child = children.find(row->event_id);
+        if (child == children.end()) {
+            // Taken away again on the device; the server's copy comes back with the next download.
+            row->dirty = 0;
+            if (mpStore->updateItem(*row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
+            continue;
+        }
+        sendInstance(series, intOf(record, mKind.version), *row, child->second);
+    }
+}
+
+void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, calendar_record_h child) {
+    const bool hasOwnUri = !row.uri.empty() && row.uri != series.uri;
+    const std::string uri = hasOwnUri ? row.uri : instanceUri(series.uri, row.recurrence_id);
+    const std::string body = cal_json::exceptionBody(child, series.uri);
+    if (body.empty()) {
+        UpReply unreadable;
+        unreadable.reason = "the instance cannot be written as JSON";
+        return fail(row, unreadable);
+    }
+    const int version = intOf(child, mKind.version);
+    const UpReply before = mTask.getEtag(mBook.uri, uri);
+    if (before.answer == UpAnswer::kGone) {
+        // From here on the row is known by the instance's own id, and goes when no list has it.
+        row.uri = uri;
+        return removeGone(row, version);
+    }
+    if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
+    std::string etag = before.etag;
+    if (!update(row, uri, body, &etag)) return;
+    row.uri = uri;
+    row.etag = etag;
+    row.dirty = 0;
+    store(row, version);
+    if (!mSentItems.empty())
+        mSentItems.back().expectedVersion = seriesVersion;  // an exception is as old as its series
+}
+
+bool CalUploader::sendDates(Row& series, calendar_record_h record) {
+    const std::vector<std::string> dates = exception_dates::split(textOf(record, CALENDAR_EVENT_EXDATE));
+    for (const Row* row : mInstances[series.event_id]) {
+        if (row->event_id < 0 && std::find(dates.begin(), dates.end(), row->recurrence_id) == dates.end()) {
+            SYNC_ERR("event(%s): the instance %s was taken back on the device, that is not sent",
+                     series.uri.c_str(), row->recurrence_id.c_str());
+        }
+    }
+    bool all = true;
+    for (const std::string& date : dates) {
+        if (mEnd != End::kNone || isStopped()) return false;
+        const Row* row = instanceRow(series.event_id, date);
+        if (row == nullptr || row->event_id > 0) all = sendDate(series, date) && all;
+    }
+    return all;
+}
+
+bool CalUploader::sendDate(const Row& series, const std::string& date) {
+    Row* known = instanceRow(series.event_id, date);
+    Row row;
+    if (known != nullptr) row = *known;
+    const bool hasOwnUri = !row.uri.empty() && row.uri != series.uri;
+    const std::string uri = hasOwnUri ? row.uri : instanceUri(series.uri, date);
+    const UpReply reply = mTask.remove(mBook.uri, uri);
+    if (!reply.isRemoved()) {
+        endWith(series, reply, End::kNone);
+        return false;
+    }
+    ++mSent;
+    if (row.event_id > 0) {
+        // First changed, then cancelled: only the date is left.
+        const int code = calendar_db_delete_record(mKind.view, row.event_id, {.by_sync = true});
+        if (code != PLATFORM_ERROR_NONE && code != PLATFORM_ERROR_NOT_FOUND)
+            SYNC_ERR("db_delete_records fail");
+    }
+    row.event_id = -series.event_id;
+    row.calendar_id = series.calendar_id;
+    row.original_event_id = series.event_id;
+    row.recurrence_id = date;
+    row.uri = uri;
+    row.dirty = row.deleted = 0;
+    // The list will have it as a cancelled item, with this etag.
+    row.etag = mTask.getEtag(mBook.uri, uri).etag;
+    if ((known != nullptr ? mpStore->updateItem(row) : mpStore->insertItem(row)) != kOk) {
+        SYNC_ERR("%s", mKind.texts.insertRow);
+        return false;
+    }
+    if (known != nullptr) {
+        *known = row;
+    } else {
+        mInstances[series.event_id].push_back(&mRows.emplace_back(row));
+    }
+    return true;
+}

@@ -1,0 +1,306 @@
+#include "calendar/CalUploader.h"
+
+#include <algorithm>
+#include <utility>
+
+#include "calendar/CalItemWriter.h"
+#include "calendar/CalMappings.h"
+#include "calendar/CalRecordAccess.h"
+#include "calendar/CalTransaction.h"
+#include "common/PageReader.h"
+#include "common/SyncLog.h"
+
+using cal_record::intOf;
+using sync_result::kFailed;
+using sync_result::kOk;
+using sync_result::kStopped;
+using sync_result::kTokenFailed;
+
+namespace {
+
+constexpr const char* kStoreFails = "the device's stores cannot be written";
+
+}  // namespace
+
+CalUploader::CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* stopQuery, CalBookMetaData book)
+    : mSide(*side),
+      mTask(*task),
+      mpStopQuery(stopQuery),
+      mBook(std::move(book)),
+      mKind(side->manager().kind()) {}
+
+int CalUploader::run() {
+    mpStore = mSide.manager().prepared();
+    if (mpStore == nullptr || readRows() != kOk) return kFailed;
+    const bool hasMarks = std::any_of(mRows.begin(), mRows.end(),
+                                      [](const Row& row) { return row.dirty != 0 || row.deleted != 0; });
+    if (!hasMarks) return kOk;
+    if (CalManager::isReadOnly(mBook.calendar_id)) return dropMarks();
+    if (findSentItems() != kOk || markAsSent() != kOk) {
+        if (mFailure.empty()) mFailure = kStoreFails;
+        mResult = mResult != kOk ? mResult : kFailed;
+    } else if (const int result = sendDirty(); result != kOk) {
+        mResult = result;
+    }
+    for (Row& row : mRows) {
+        if (mEnd == End::kAll || isStopped()) break;
+        if (row.deleted != 0) sendDeleted(row);
+    }
+    if (writeBack() != kOk && mResult == kOk) mResult = kFailed;
+    return isStopped() ? kStopped : mResult;
+}
+
+int CalUploader::readRows() {
+    std::vector<Row> rows;
+    if (mpStore->getAllItems(mBook.calendar_id, &rows) != kOk) return kFailed;
+    mRows.assign(rows.begin(), rows.end());
+    mInstances.clear();
+    for (Row& row : mRows) {
+        if (row.original_event_id != 0) mInstances[row.original_event_id].push_back(&row);
+    }
+    return kOk;
+}
+
+// A book that became read-only: nobody takes what was changed before.
+int CalUploader::dropMarks() {
+    SyncTransaction transaction(mpStore->database());
+    if (!transaction.begun()) return kFailed;
+    for (Row& row : mRows) {
+        if (row.dirty == 0 && row.deleted == 0) continue;
+        SYNC_ERR("%s(%s) is read-only, the device's change of %s(%d) is not sent", mKind.bookName,
+                 mBook.uri.c_str(), mKind.itemName, row.event_id);
+        row.dirty = row.deleted = 0;
+        if ((row.uri.empty() ? mpStore->forgetItem(row.event_id) : mpStore->updateItem(row)) != kOk)
+            return kFailed;
+    }
+    return transaction.commit();
+}
+
+void CalUploader::fail(const Row& row, const UpReply& reply) {
+    SYNC_ERR("%s(%d, %s) could not be sent: %s", mKind.itemName, row.event_id, row.uri.c_str(),
+             reply.reason.c_str());
+    if (mResult != kOk) return;
+    mResult = reply.result != kOk ? reply.result : kFailed;
+    mFailure = reply.result == kTokenFailed
+                   ? "the account's authorisation is no longer accepted"
+                   : std::string(mKind.bookName) + " " + mBook.uri + ": " + mKind.itemName + " " +
+                         std::to_string(row.event_id) + " could not be sent: " + reply.reason;
+}
+
+void CalUploader::endWith(const Row& row, const UpReply& reply, End end) {
+    fail(row, reply);
+    mEnd = reply.answer == UpAnswer::kNoAnswer ? End::kAll : std::max(mEnd, end);
+    if (reply.result == kTokenFailed) mResult = kTokenFailed;
+}
+
+// --- new items
+
+// Items of an earlier run whose answer was lost: those that the server lists are ours already.
+int CalUploader::findSentItems() {
+    const bool some = std::any_of(mRows.begin(), mRows.end(), [](const Row& row) {
+        return row.uri.empty() && row.etag == kUnconfirmedEtag && row.dirty != 0;
+    });
+    if (!some) return kOk;
+    CalBookSnapshot snapshot(mKind);
+    if (snapshot.load(*mpStore, mBook) != kOk) return kFailed;
+    CalItemWriter writer(mpStore, &snapshot);
+    const int fetched = readPages<CalListPage>(
+        [&](const std::string& token, CalListPage* page) { return mSide.getItems(mBook.uri, token, page); },
+        [&](CalListPage& page) {
+            std::erase_if(page.entries, [&](const CalListInfoPtr& entry) {
+                return snapshot.rowByUri(entry->id) != nullptr || snapshot.orphan(entry->id) != 0;
+            });
+            const int result = mSide.getContent(mBook.uri, snapshot, &page);
+            return result != kOk ? result : writer.adoptSent(page);
+        },
+        [this] { return isStopped(); });
+    if (fetched == kOk) return readRows();
+    // Without the list nobody knows, so those items wait; the others go on.
+    mSkipUnconfirmed = true;
+    mResult = fetched;
+    mFailure = std::string(mKind.bookName) + " " + mBook.uri + ": " + mSide.failure();
+    if (fetched == kTokenFailed || mSide.unreachable()) mEnd = End::kAll;
+    return readRows();
+}
+
+int CalUploader::markAsSent() {
+    SyncTransaction transaction(mpStore->database());
+    if (!transaction.begun()) return kFailed;
+    for (Row& row : mRows) {
+        if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || row.original_event_id != 0) continue;
+        if (row.etag == kUnconfirmedEtag) continue;
+        Row marked = row;
+        marked.etag = kUnconfirmedEtag;
+        if (mpStore->updateItem(marked) != kOk) return kFailed;
+    }
+    return transaction.commit();
+}
+
+// --- items
+
+int CalUploader::sendDirty() {
+    for (Row& row : mRows) {
+        if (mEnd != End::kNone) return mResult;
+        if (isStopped()) return kStopped;
+        if (row.original_event_id != 0 || row.deleted != 0) continue;
+        const auto instances = mInstances.find(row.event_id);
+        const bool hasDirtyInstance =
+            instances != mInstances.end() &&
+            std::any_of(instances->second.begin(), instances->second.end(),
+                        [](const Row* instance) { return instance->dirty != 0 && instance->event_id > 0; });
+        if (row.dirty != 0 || hasDirtyInstance) sendItem(row);
+    }
+    return mResult;
+}
+
+void CalUploader::sendItem(Row& row) {
+    if (mSkipUnconfirmed && row.uri.empty() && row.etag == kUnconfirmedEtag) return;
+    calendar_record_h raw = nullptr;
+    const int code = calendar_db_get_record(mKind.view, row.event_id, &raw);
+    if (code != PLATFORM_ERROR_NONE) {
+        // Deleted since the marks were set: the next walk finds that.
+        if (code != PLATFORM_ERROR_NOT_FOUND) SYNC_ERR("db_get_record fail");
+        return;
+    }
+    const CalendarRecord record(raw);
+    if (row.dirty != 0) {
+        const std::string body = mKind.build(raw);
+        if (body.empty()) {
+            UpReply unreadable;
+            unreadable.reason = "the record cannot be written as JSON";
+            return fail(row, unreadable);
+        }
+        row.uri.empty() ? insertItem(row, raw, body) : updateItem(row, raw, body);
+    }
+    if (mKind.hasSeries() && !row.uri.empty() && mEnd == End::kNone) sendInstances(row, raw);
+}
+
+void CalUploader::insertItem(Row& row, calendar_record_h record, const std::string& body) {
+    const UpReply reply = mTask.insert(mBook.uri, body);
+    switch (reply.answer) {
+        case UpAnswer::kAccepted:
+            row.uri = reply.uri;
+            row.etag = reply.etag;
+            // A series stays marked until the server has its cancelled instances too.
+            row.dirty = hasUnsentDates(row, record) ? 1 : 0;
+            return store(row, intOf(record, mKind.version));
+        case UpAnswer::kRefused: {
+            fail(row, reply);
+            row.etag.clear();
+            if (mpStore->updateItem(row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
+            return;
+        }
+        case UpAnswer::kGone:
+        case UpAnswer::kUnclear:
+        case UpAnswer::kNoAnswer:
+            return endWith(row, reply, End::kNone);
+    }
+}
+
+void CalUploader::updateItem(Row& row, calendar_record_h record, const std::string& body) {
+    const int version = intOf(record, mKind.version);
+    const UpReply before = mTask.getEtag(mBook.uri, row.uri);
+    if (before.answer == UpAnswer::kGone) return removeGone(row, version);
+    if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
+    if (!update(row, row.uri, body, &row.etag)) return;
+    row.dirty = hasUnsentDates(row, record) ? 1 : 0;
+    store(row, version);
+}
+
+bool CalUploader::update(const Row& row, const std::string& uri, const std::string& body, std::string* etag) {
+    const UpReply answer = mTask.update(mBook.uri, uri, body);
+    if (answer.answer != UpAnswer::kAccepted) {
+        endWith(row, answer, End::kNone);
+        return false;
+    }
+    const UpReply after = mTask.getEtag(mBook.uri, uri);
+    if (after.answer != UpAnswer::kAccepted) {
+        SYNC_ERR("Failed to get etag");
+        if (after.answer == UpAnswer::kNoAnswer) endWith(row, after, End::kAll);
+    }
+    // What somebody else wrote in between comes down with the next download, so the etag of our own write is kept.
+    const std::string& known = !answer.etag.empty() ? answer.etag : after.etag;
+    if (!known.empty()) *etag = known;
+    return true;
+}
+
+// The device's copy goes with the next download.
+void CalUploader::removeGone(Row& row, int version) {
+    const UpReply reply = mTask.remove(mBook.uri, row.uri);
+    if (!reply.isRemoved()) return endWith(row, reply, End::kNone);
+    SYNC_ERR("%s(%s) is no longer on the server, the device's change is dropped", mKind.itemName,
+             row.uri.c_str());
+    row.dirty = 0;
+    row.version = version;
+    if (mpStore->updateItem(row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
+}
+
+void CalUploader::sendDeleted(Row& row) {
+    if (row.uri.empty()) {
+        if (row.etag == kUnconfirmedEtag) {
+            SYNC_ERR("%s(%d) was deleted before the server's answer to it was known", mKind.itemName,
+                     row.event_id);
+        }
+        if (mpStore->forgetItem(row.event_id) != kOk) SYNC_ERR("%s", mKind.texts.deleteRow);
+        return;
+    }
+    const UpReply reply = mTask.remove(mBook.uri, row.uri);
+    if (!reply.isRemoved()) return endWith(row, reply, End::kNone);
+    ++mSent;
+    row.deleted = row.dirty = 0;
+    if (mpStore->updateItem(row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
+}
+
+void CalUploader::store(Row& row, int version) {
+    row.version = version;
+    ++mSent;
+    if (mpStore->updateItem(row) != kOk) {
+        SYNC_ERR("%s", mKind.texts.updateRow);
+        if (mResult == kOk) mFailure = kStoreFails;
+        mResult = kFailed;
+        mEnd = End::kAll;
+        return;
+    }
+    mSentItems.push_back({row.event_id, version, row.uri, row.etag});
+}
+
+// The records learn what the server calls them, so that they can be recognised without their rows.
+int CalUploader::writeBack() {
+    if (mSentItems.empty()) return kOk;
+    CalTransaction transaction;
+    if (!transaction.begun()) {
+        SYNC_ERR("get svc fail");
+        return kFailed;
+    }
+    for (const Sent& sent : mSentItems) {
+        if (!writeBackOne(sent)) return kFailed;
+    }
+    if (!transaction.commit()) {
+        SYNC_ERR("get svc fail");
+        return kFailed;
+    }
+    // Our own writes need not be walked again.
+    return mSide.manager().setBookChanged(mBook.calendar_id);
+}
+
+bool CalUploader::writeBackOne(const Sent& sent) {
+    const bool isTodo = !mKind.hasSeries();
+    std::vector<unsigned> properties = {mKind.id, mKind.uid, mKind.etag};
+    if (isTodo) properties.insert(properties.end(), {CALENDAR_TODO_HAS_DUE, CALENDAR_TODO_SYNC_DATA1});
+    CalendarList list;
+    calendar_record_h record = nullptr;
+    const int found = cal_record::readPart(mKind.view, mKind.id, sent.itemId, properties, &list, &record);
+    if (found == PLATFORM_ERROR_NOT_FOUND) return true;
+    const auto set = [record](unsigned property, std::string_view text) {
+        return calendar_record_set_str(record, property, std::string(text).c_str()) == PLATFORM_ERROR_NONE;
+    };
+    if (found != PLATFORM_ERROR_NONE || !set(mKind.uid, sent.uri) || !set(mKind.etag, sent.etag))
+        return false;
+    const bool hasDue = isTodo && intOf(record, CALENDAR_TODO_HAS_DUE) != 0;
+    if (isTodo && !set(CALENDAR_TODO_SYNC_DATA1, hasDue ? cal_mapping::kServerHasDue : "")) return false;
+    const record_write_options_s options{.by_sync = true,
+                                         .expected_versions = std::span(&sent.expectedVersion, 1)};
+    const int code = calendar_db_update_record(record, options);
+    // Changed again meanwhile: the next run sends it and comes back here.
+    return code == PLATFORM_ERROR_NONE || code == PLATFORM_ERROR_CONFLICT || code == PLATFORM_ERROR_NOT_FOUND;
+}

@@ -1,0 +1,91 @@
+// CalUploader: sends the marked items of one book.
+// Owner: an upload run.   Threads: one worker.
+//
+// A mark is cleared when the server took the change, when none was needed, or when what was to be deleted is gone; whatever else
+// happens it stays for the next run. A new item is marked as sent before it goes out, in the store: should its answer be lost, the
+// next run looks for it in the server's list before it is sent again.
+#pragma once
+
+#include <list>
+#include <map>
+#include <string>
+#include <vector>
+
+#include "calendar/CalSyncSide.h"
+#include "calendar/CalUpSyncTasks.h"
+#include "common/SyncDirector.h"
+
+class CalUploader {
+public:
+    // Nothing is owned; `stopQuery` may be NULL.
+    CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* stopQuery, CalBookMetaData book);
+
+    // 0, 1 when stopped, -5, or -1 with failure(). What could be sent was sent.
+    [[nodiscard]] int run();
+
+    [[nodiscard]] const std::string& failure() const { return mFailure; }
+    // Whether the run of the account ends here.
+    [[nodiscard]] bool mustEnd() const { return mEnd == End::kAll; }
+    [[nodiscard]] int sent() const { return mSent; }
+
+private:
+    enum class End { kNone, kDirtyOfBook, kAll };
+    using Row = CalEventMetaData;
+
+    // What is written into the records at the end: what the server calls them.
+    struct Sent {
+        int itemId;
+        int expectedVersion;
+        std::string uri;
+        std::string etag;
+    };
+
+    [[nodiscard]] bool isStopped() const { return mpStopQuery != nullptr && mpStopQuery->isStopped(); }
+    void fail(const Row& row, const UpReply& reply);
+    void endWith(const Row& row, const UpReply& reply, End end);
+    [[nodiscard]] int readRows();
+    [[nodiscard]] int dropMarks();
+
+    // --- new items
+    [[nodiscard]] int findSentItems();
+    [[nodiscard]] int markAsSent();
+
+    // --- items
+    [[nodiscard]] int sendDirty();
+    void sendItem(Row& row);
+    void insertItem(Row& row, calendar_record_h record, const std::string& body);
+    void updateItem(Row& row, calendar_record_h record, const std::string& body);
+    void removeGone(Row& row, int version);
+    void sendDeleted(Row& row);
+    // PATCH between two looks at the etag; true with the etag that the row takes when the server took it.
+    [[nodiscard]] bool update(const Row& row, const std::string& uri, const std::string& body,
+                              std::string* etag);
+    void store(Row& row, int version);
+    [[nodiscard]] int writeBack();
+    [[nodiscard]] bool writeBackOne(const Sent& sent);
+
+    // --- instances of a series
+    void sendInstances(Row& series, calendar_record_h record);
+    void sendInstance(const Row& series, int seriesVersion, Row& row, calendar_record_h child);
+    // Whether every date was taken.
+    [[nodiscard]] bool sendDates(Row& series, calendar_record_h record);
+    [[nodiscard]] bool sendDate(const Row& series, const std::string& date);
+    [[nodiscard]] bool hasUnsentDates(const Row& series, calendar_record_h record);
+    [[nodiscard]] Row* instanceRow(int seriesId, const std::string& recurrenceId);
+
+    CalSyncSide& mSide;
+    CalUpSyncTask& mTask;
+    IStopQuery* const mpStopQuery;
+    const CalBookMetaData mBook;
+    const CalItemKind& mKind;
+    CalItemStore* mpStore = nullptr;
+
+    std::list<Row> mRows;
+    std::map<int, std::vector<Row*>> mInstances;  // by series
+    std::vector<Sent> mSentItems;
+    bool mSkipUnconfirmed = false;
+    End mEnd = End::kNone;
+    int mResult = sync_result::kOk;
+    int mSent = 0;
+    std::string mFailure;
+};

@@ -48,24 +48,41 @@ CalendarRecord CalendarStore::calendar(int id) {
     return CalendarRecord(record);
 }
 
-FoundEvent CalendarStore::event(int id, std::span<const unsigned> projection) {
-    CalendarList list = find(_calendar_event, {{CALENDAR_EVENT_ID, id}}, CALENDAR_EVENT_ID, projection);
+namespace {
+
+FoundItem item(const char* view, unsigned idProperty, int id, std::span<const unsigned> projection,
+               const char* name) {
+    CalendarList list = CalendarStore::find(view, {{idProperty, id}}, idProperty, projection);
     calendar_record_h found = nullptr;
     if (calendar_list_first(list.get()) != PLATFORM_ERROR_NONE ||
         calendar_list_get_current_record_p(list.get(), &found) != PLATFORM_ERROR_NONE) {
-        throw Failure("there is no event " + std::to_string(id) + "; see: vantor-pim-syncctl events list");
+        throw Failure(std::string("there is no ") + name + " " + std::to_string(id) +
+                      "; see: vantor-pim-syncctl " + name + "s list");
     }
     return {std::move(list), found};
 }
 
-void CalendarStore::checkWritable(int calendarId) {
+}  // namespace
+
+FoundItem CalendarStore::event(int id, std::span<const unsigned> projection) {
+    return item(_calendar_event, CALENDAR_EVENT_ID, id, projection, "event");
+}
+
+FoundItem CalendarStore::todo(int id, std::span<const unsigned> projection) {
+    return item(_calendar_todo, CALENDAR_TODO_ID, id, projection, "todo");
+}
+
+void CalendarStore::checkWritable(int calendarId, const char* kind) {
     const CalendarRecord book = calendar(calendarId);
-    if (record_access::intOf(book.get(), CALENDAR_BOOK_STORE_TYPE) != valueOf(kStoreTypes, "event")) {
-        throw Failure("the calendar " + std::to_string(calendarId) + " holds to-dos, not events");
+    const std::string_view held =
+        nameOf(kStoreTypes, record_access::intOf(book.get(), CALENDAR_BOOK_STORE_TYPE));
+    if (held != kind) {
+        throw Failure("the calendar " + std::to_string(calendarId) + " holds " + std::string(held) +
+                      "s, not " + kind + "s");
     }
     if (record_access::intOf(book.get(), CALENDAR_BOOK_MODE) == kModeReadOnly) {
-        throw Failure("the calendar " + std::to_string(calendarId) +
-                      " is read-only; its events can only be copied");
+        throw Failure("the calendar " + std::to_string(calendarId) + " is read-only; its " + kind +
+                      "s can only be copied");
     }
 }
 

@@ -8,10 +8,10 @@
 
 #include "platform/calendar.h"
 
-// One event of the store; the list that it came in owns it.
-class FoundEvent {
+// One event or to-do of the store; the list that it came in owns it.
+class FoundItem {
 public:
-    FoundEvent(CalendarList list, calendar_record_h record) : mList(std::move(list)), mpRecord(record) {}
+    FoundItem(CalendarList list, calendar_record_h record) : mList(std::move(list)), mpRecord(record) {}
     [[nodiscard]] calendar_record_h get() const { return mpRecord; }
 
 private:
@@ -37,9 +37,10 @@ public:
     static CalendarList calendars(std::optional<int> account);
     // A Failure when there is none.
     static CalendarRecord calendar(int id);
-    static FoundEvent event(int id, std::span<const unsigned> projection);
-    // A Failure when the calendar is missing, is none of events, or is read-only.
-    static void checkWritable(int calendarId);
+    static FoundItem event(int id, std::span<const unsigned> projection);
+    static FoundItem todo(int id, std::span<const unsigned> projection);
+    // A Failure when the calendar is missing, is none of this kind ("event" or "todo"), or is read-only.
+    static void checkWritable(int calendarId, const char* kind);
 };
 
 // A transaction of the store: undone unless commit() was reached.

@@ -54,3 +54,8 @@ Action buildEventShow(CLI::App& app);
 Action buildEventAdd(CLI::App& app);
 Action buildEventSet(CLI::App& app);
 Action buildEventDelete(CLI::App& app);
+Action buildTodosList(CLI::App& app);
+Action buildTodoShow(CLI::App& app);
+Action buildTodoAdd(CLI::App& app);
+Action buildTodoSet(CLI::App& app);
+Action buildTodoDelete(CLI::App& app);

@@ -24,6 +24,8 @@ constexpr Noun kNouns[] = {
     {"calendars", "Calendars of this device"},
     {"events", "Events of this device"},
     {"event", "One event"},
+    {"todos", "To-dos of this device"},
+    {"todo", "One to-do"},
 };
 
 constexpr Command kCommands[] = {
@@ -62,10 +64,18 @@ constexpr Command kCommands[] = {
      "event add event.json\nevent add --calendar 3 - < event.json", buildEventAdd},
     {"event", "set", "Change fields of an event",
      "event set 12 summary=Lunch location=Canteen\nevent set 12 start=2014-05-01T10:00:00Z "
-     "end=2014-05-01T11:00:00Z",
+     "end=2014-05-01T11:00:00Z\nevent set 12 --instance 20140503T100000Z location=Canteen",
      buildEventSet},
-    {"event", "delete", "Delete an event, a series, or one changed instance of a series", "event delete 12",
-     buildEventDelete},
+    {"event", "delete", "Delete an event, a series, or one instance of a series",
+     "event delete 12\nevent delete 12 --instance 20140503T100000Z", buildEventDelete},
+    {"todos", "list", "List to-dos", "todos list --calendar 4\ntodos list --account 7 --json",
+     buildTodosList},
+    {"todo", "show", "Show one to-do", "todo show 12\ntodo show 12 --json > todo.json", buildTodoShow},
+    {"todo", "add", "Add the to-do of a JSON file", "todo add todo.json\ntodo add --calendar 4 - < todo.json",
+     buildTodoAdd},
+    {"todo", "set", "Change fields of a to-do",
+     "todo set 12 status=completed\ntodo set 12 due=2014-05-01T10:00:00Z summary=Post", buildTodoSet},
+    {"todo", "delete", "Delete a to-do", "todo delete 12", buildTodoDelete},
 };
 
 const std::string kExamplesTitle = "Examples:\n";

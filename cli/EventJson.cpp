@@ -9,6 +9,7 @@ namespace event_json {
 namespace {
 
 using record_access::intOf;
+using namespace record_json;  // NOLINT(google-build-using-namespace): this file is one half of it
 using record_access::textOf;
 using record_access::timeOf;
 
@@ -69,23 +70,6 @@ constexpr int kMostReminderMinutes = 366 * 24 * 60;
 
 // --- record to JSON ---------------------------------------------------------------------------------------------
 
-Json scalarOf(calendar_record_h event, const ScalarField& field) {
-    switch (field.kind) {
-        case FieldKind::kText:
-        case FieldKind::kZone:
-            return textOf(event, field.property);
-        case FieldKind::kTime:
-            return time_text::composeRfc3339(timeOf(event, field.property));
-        case FieldKind::kWord:
-            return std::string(nameOf(field.words, intOf(event, field.property)));
-        case FieldKind::kFlag:
-            return intOf(event, field.property) != 0;
-        case FieldKind::kRule:
-            return rrule_text::compose(event_fields::ruleOf(event));
-    }
-    return nullptr;
-}
-
 // A date that cannot be read is shown as it is stored: hiding it would say that the instance takes place.
 Json exdatesOf(calendar_record_h event) {
     Json dates = Json::array();
@@ -117,108 +101,6 @@ Json remindersOf(calendar_record_h event) {
 }
 
 // --- JSON to record ---------------------------------------------------------------------------------------------
-
-[[noreturn]] void refuse(const std::string& member, const std::string& why) {
-    throw Failure("the member \"" + member + "\" " + why);
-}
-
-std::string textFrom(const Json& value, const std::string& member) {
-    if (value.is_null()) return {};
-    if (!value.is_string()) refuse(member, "must be a text");
-    const auto& text = value.get_ref<const std::string&>();
-    if (text.find('\0') != std::string::npos) refuse(member, "holds a NUL character");
-    return text;
-}
-
-const Json& listFrom(const Json& value, const std::string& member) {
-    static const Json kEmpty = Json::array();
-    if (value.is_null()) return kEmpty;
-    if (!value.is_array()) refuse(member, "must be a list");
-    return value;
-}
-
-int numberFrom(const Json& value, const std::string& member, int least, int most) {
-    if (!value.is_number_integer()) refuse(member, "must be a whole number");
-    const bool isHuge = value.is_number_unsigned() && value.get<uint64_t>() > static_cast<uint64_t>(most);
-    if (isHuge || value.get<int64_t>() < least || value.get<int64_t>() > most) {
-        refuse(member, "must be between " + std::to_string(least) + " and " + std::to_string(most));
-    }
-    return value.get<int>();
-}
-
-std::optional<int> idFrom(const Json& value, const std::string& member) {
-    if (value.is_null()) return std::nullopt;
-    return numberFrom(value, member, 1, INT32_MAX);
-}
-
-calendar_time_s timeFrom(const std::string& text, const std::string& member) {
-    const auto time = time_text::parseRfc3339(text);
-    if (!time) refuse(member, "must be a time as 2014-05-01T10:00:00Z or a date as 2014-05-01");
-    return *time;
-}
-
-int wordFrom(std::span<const NameOf> words, const std::string& text, const std::string& member) {
-    const auto value = valueOf(words, text);
-    if (value) return *value;
-    std::string known;
-    for (const NameOf& row : words) {
-        if (!row.name.empty()) known += (known.empty() ? "" : ", ") + std::string(row.name);
-    }
-    refuse(member, "must be one of " + known);
-}
-
-void setFromText(calendar_record_h event, const ScalarField& field, const std::string& text) {
-    const std::string name(field.name);
-    switch (field.kind) {
-        case FieldKind::kZone:
-            if (!text.empty() && !event_fields::isTimeZone(text)) refuse(name, "is no known time zone");
-            [[fallthrough]];
-        case FieldKind::kText:
-            record_access::setText(event, field.property, text, name);
-            return;
-        case FieldKind::kTime:
-            record_access::setTime(event, field.property, timeFrom(text, name), name);
-            return;
-        case FieldKind::kWord:
-            record_access::setInt(event, field.property, wordFrom(field.words, text, name), name);
-            return;
-        case FieldKind::kFlag:
-            if (text != "true" && text != "false") refuse(name, "must be true or false");
-            record_access::setInt(event, field.property, text == "true" ? 1 : 0, name);
-            return;
-        case FieldKind::kRule: {
-            RruleFields rule;
-            std::string reason;
-            if (!rrule_text::parse(text, &rule, &reason)) refuse(name, "is no rule: " + reason);
-            event_fields::setRule(event, rule);
-            return;
-        }
-    }
-}
-
-// Null is absent, and so is an empty word that has no meaning of its own ("visibility": "").
-void setFromJson(calendar_record_h event, const ScalarField& field, const Json& value) {
-    if (value.is_null()) return;
-    const std::string name(field.name);
-    if (field.kind == FieldKind::kFlag) {
-        if (!value.is_boolean()) refuse(name, "must be true or false");
-        setFromText(event, field, value.get<bool>() ? "true" : "false");
-        return;
-    }
-    const std::string text = textFrom(value, name);
-    if (text.empty() && field.kind == FieldKind::kWord) return;
-    setFromText(event, field, text);
-}
-
-void refuseUnknown(const Json& object, std::initializer_list<std::string_view> known,
-                   const std::string& member) {
-    if (!object.is_object()) refuse(member, "must be an object");
-    for (const auto& item : object.items()) {
-        bool isKnown = false;
-        for (const std::string_view name : known) isKnown = isKnown || name == item.key();
-        if (!isKnown) refuse(member + "." + item.key(), "is not known");
-    }
-}
 
 void setExdates(NewEvent& event, const Json& value) {
     std::string dates;
@@ -293,7 +175,7 @@ constexpr OtherMember kOthers[] = {
 };
 
 void applyMember(NewEvent& event, const std::string& name, const Json& value) {
-    if (const ScalarField* field = findScalar(name)) {
+    if (const ScalarField* field = findScalar(kScalars, name)) {
         setFromJson(event.record.get(), *field, value);
         return;
     }
@@ -321,13 +203,6 @@ void checkException(const NewEvent& event) {
 
 }  // namespace
 
-const ScalarField* findScalar(std::string_view name) {
-    for (const ScalarField& field : kScalars) {
-        if (field.name == name) return &field;
-    }
-    return nullptr;
-}
-
 Json compose(calendar_record_h event) {
     Json object = Json::object();
     object.get_ref<Json::object_t&>().reserve(std::size(kScalars) + std::size(kOthers));
@@ -346,6 +221,9 @@ Json compose(calendar_record_h event) {
     return object;
 }
 
+std::span<const ScalarField> scalars() {
+    return kScalars;
+}
 std::span<const unsigned> projection() {
     return kProjection;
 }
@@ -364,10 +242,6 @@ NewEvent parse(const Json& object) {
     checkException(event);
     checkTimes(event.record.get());
     return event;
-}
-
-void setScalar(calendar_record_h event, const ScalarField& field, const std::string& text) {
-    setFromText(event, field, text);
 }
 
 void checkTimes(calendar_record_h event) {

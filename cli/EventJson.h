@@ -7,24 +7,14 @@
 #include <string>
 #include <string_view>
 
-#include "Names.h"
 #include "Output.h"
+#include "RecordJson.h"
 #include "platform/calendar.h"
 
 namespace event_json {
 
-enum class FieldKind { kText, kZone, kTime, kWord, kFlag, kRule };
-
-// A field with one value, which `event set` can write.
-struct ScalarField {
-    std::string_view name;
-    FieldKind kind;
-    unsigned property;  // of the event view; of a rule its frequency
-    std::span<const NameOf> words;
-};
-
-// NULL for a name that is no scalar field.
-const ScalarField* findScalar(std::string_view name);
+// The fields with one value.
+std::span<const record_json::ScalarField> scalars();
 
 // Every field of the documented table, always.
 Json compose(calendar_record_h event);
@@ -43,7 +33,6 @@ struct NewEvent {
 };
 NewEvent parse(const Json& object);
 
-void setScalar(calendar_record_h event, const ScalarField& field, const std::string& text);
 // What holds between fields: all-day events have two dates, no event ends before its start.
 void checkTimes(calendar_record_h event);
 

@@ -31,6 +31,7 @@ inline constexpr NameOf kEventStatus[] = {{1, ""}, {2, "tentative"}, {4, "confir
 inline constexpr NameOf kVisibility[] = {{2, "default"}, {0, "public"}, {1, "private"}};
 inline constexpr NameOf kAttendeeStatus[] = {
     {0, "needsAction"}, {1, "accepted"}, {2, "declined"}, {3, "tentative"}};
+inline constexpr NameOf kTodoStatus[] = {{1, "needsAction"}, {2, "completed"}, {0, ""}};
 inline constexpr NameOf kFrequencies[] = {{1, "DAILY"}, {2, "WEEKLY"}, {3, "MONTHLY"}, {4, "YEARLY"}};
 inline constexpr NameOf kWeekdays[] = {{1, "SU"}, {2, "MO"}, {3, "TU"}, {4, "WE"},
                                        {5, "TH"}, {6, "FR"}, {7, "SA"}};

@@ -167,4 +167,20 @@ std::optional<calendar_time_s> parseCompact(std::string_view text) {
     return instant(f, 0);
 }
 
+calendar_time_s shifted(const calendar_time_s& start, const calendar_time_s& from,
+                        const calendar_time_s& to) {
+    const auto daysOf = [](const calendar_time_s& time) {
+        return std::chrono::sys_days{dateOf({.year = time.year, .month = time.month, .day = time.mday})};
+    };
+    if (!isDate(start)) {
+        calendar_time_s end = start;
+        end.utime += to.utime - from.utime;
+        return end;
+    }
+    const std::chrono::year_month_day day{daysOf(start) + (daysOf(to) - daysOf(from))};
+    return dateTime({.year = static_cast<int>(day.year()),
+                     .month = static_cast<int>(static_cast<unsigned>(day.month())),
+                     .day = static_cast<int>(static_cast<unsigned>(day.day()))});
+}
+
 }  // namespace time_text

@@ -20,6 +20,9 @@ std::optional<calendar_time_s> parseRfc3339(std::string_view text);
 std::string composeCompact(const calendar_time_s& time);
 std::optional<calendar_time_s> parseCompact(std::string_view text);
 
+// `start` plus the time from `from` to `to`; all three of one type.
+calendar_time_s shifted(const calendar_time_s& start, const calendar_time_s& from, const calendar_time_s& to);
+
 inline bool isDate(const calendar_time_s& time) {
     return time.type == CALENDAR_TIME_LOCALTIME;
 }

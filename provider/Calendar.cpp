@@ -6,6 +6,7 @@
 #include <string_view>
 
 #include "EventCheck.h"
+#include "Merge.h"
 
 namespace provider {
 
@@ -24,31 +25,6 @@ constexpr OwnMember kOwnMembers[] = {{"kind", false},     {"etag", false},    {"
 constexpr const char* kInstanceMembers[] = {"recurringEventId", "originalStartTime", "iCalUID"};
 // A change of these is a new version of the meeting.
 constexpr const char* kSequenceMembers[] = {"start", "end", "recurrence"};
-
-// RFC 7396, but for one thing: a time is a date or a date-time, so that naming one of them drops the other.
-void mergeInto(Json& target, const Json& patch) {
-    if (!target.is_object()) target = Json::object();
-    if (patch.contains("date") && !patch.contains("dateTime")) {
-        target.erase("dateTime");
-        target.erase("timeZone");
-    }
-    if (patch.contains("dateTime") && !patch.contains("date")) target.erase("date");
-    for (const auto& [name, value] : patch.items()) {
-        if (value.is_null()) {
-            target.erase(name);
-        } else if (value.is_object()) {
-            mergeInto(target[name], value);
-        } else {
-            target[name] = value;
-        }
-    }
-}
-
-void dropNulls(Json& body) {
-    Json kept = Json::object();
-    mergeInto(kept, body);
-    body = std::move(kept);
-}
 
 bool isOwn(std::string_view name, const WriteOptions& options) {
     return std::any_of(std::begin(kOwnMembers), std::end(kOwnMembers), [&](const OwnMember& row) {

@@ -227,6 +227,51 @@ Calendar& addCalendar(Store& store, Account& account, const char* calendarId, co
 
 }  // namespace
 
+namespace {
+
+struct SampleTask {
+    const char* title;
+    const char* notes;
+    const char* due;
+    const char* completed;
+};
+constexpr SampleTask kHomeTasks[] = {
+    {"Buy stamps", "", "2026-03-02T00:00:00Z", ""},
+    {"Call the dentist", "Ask for a\nMonday", "2026-03-03T00:00:00Z", ""},
+    {"Water the plants", "", "", ""},
+    {"Renew the \"season\" ticket", "It's due soon", "2026-03-31T00:00:00Z", ""},
+    {"Return library books", "", "2026-02-20T00:00:00Z", "2026-02-19T17:30:00Z"},
+    {"Plan the trip \xF0\x9F\x9A\x86", "Trains, then a hotel", "", ""},
+    {"", "A task without a title", "", ""},
+    {"Sort photographs", "", "", "2026-01-11T09:00:00Z"},
+};
+constexpr SampleTask kWorkTasks[] = {
+    {"Write the report", "Figures from last quarter", "2026-03-06T00:00:00Z", ""},
+    {"Book the meeting room", "", "2026-03-04T00:00:00Z", ""},
+    {"Review the design", "", "", "2026-02-27T14:00:00Z"},
+    {"Ligne d'attente \xC3\xA9t\xC3\xA9", "", "2026-06-01T00:00:00Z", ""},
+    {"Order a keyboard", "Quiet one", "", ""},
+    {"Clean up the shared folder", "", "2026-04-01T00:00:00Z", ""},
+};
+
+template <std::size_t N>
+void addTasks(Store& store, Account& account, const char* id, const char* title,
+              const SampleTask (&rows)[N]) {
+    TaskList& list = store.addTaskList(account, {{"id", id}, {"title", title}});
+    for (const SampleTask& row : rows) {
+        Json body = {{"title", row.title}};
+        if (*row.notes != '\0') body["notes"] = row.notes;
+        if (*row.due != '\0') body["due"] = row.due;
+        if (*row.completed != '\0') {
+            body["status"] = "completed";
+            body["completed"] = row.completed;
+        }
+        list.insert(body, false);
+    }
+}
+
+}  // namespace
+
 void seedSample(Store& store) {
     Account& first = store.addAccount("first@provider.example", "First Person");
     Account& second = store.addAccount("second@provider.example", "Second Person");
@@ -255,6 +300,10 @@ void seedSample(Store& store) {
     Calendar& other =
         addCalendar(store, second, "second@provider.example", "Second's own", "#ac725e", "owner");
     addSingles(other, 60, 13);
+
+    addTasks(store, first, "first-home", "Home", kHomeTasks);
+    addTasks(store, first, "first-work", "Work", kWorkTasks);
+    addTasks(store, second, "second-home", "Second's list", kHomeTasks);
 }
 
 }  // namespace provider

@@ -41,6 +41,22 @@ private:
     Context& mContext;
 };
 
+// /tasks: task lists and tasks.
+class TaskService : public Service {
+public:
+    explicit TaskService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    Reply listLists(const Call& call);
+    Reply listTasks(const Call& call);
+    Reply getTask(const Call& call);
+    Reply insertTask(const Call& call);
+    Reply patchTask(const Call& call);
+    Reply deleteTask(const Call& call);
+    Context& mContext;
+};
+
 // /admin: the content, for tests and people.
 class AdminDataService : public Service {
 public:
@@ -54,6 +70,17 @@ private:
     [[nodiscard]] Json accountJson(const Account& account) const;
     Reply putRaw(const Call& call, const std::string& eventId, const Json& body);
     Reply seed(const Call& call);
+    Context& mContext;
+};
+
+// /admin: task lists and tasks.
+class AdminTaskService : public Service {
+public:
+    explicit AdminTaskService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    void addTaskRoutes(Router& router, const std::string& tasks);
     Context& mContext;
 };
 

@@ -188,6 +188,38 @@ Json Store::calendarEntry(const Account& account, const CalendarEntry& entry) co
     return out;
 }
 
+TaskList& Store::addTaskList(Account& account, const Json& members) {
+    const std::string listId = textOf(members, "id", "list" + std::to_string(mRevisions.last() + 1));
+    if (listId.empty() || listId.find('/') != std::string::npos) invalid("id");
+    const auto isIt = [&](const auto& list) { return list->id == listId; };
+    if (std::any_of(account.taskLists.begin(), account.taskLists.end(), isIt))
+        throw ApiError{409, "duplicate", "The task list exists.", "id"};
+    auto list = std::make_unique<TaskList>(listId, mRevisions);
+    list->title = textOf(members, "title", listId);
+    list->etag = textOf(members, "etag", "");
+    if (list->etag.empty()) list->etag = etagOf(mRevisions.next());
+    return *account.taskLists.emplace_back(std::move(list));
+}
+
+TaskList& Store::changeTaskList(const std::string& email, const std::string& listId, const Json& members) {
+    TaskList& list = taskList(email, listId);
+    list.title = textOf(members, "title", list.title);
+    list.etag = etagOf(mRevisions.next());
+    return list;
+}
+
+void Store::removeTaskList(Account& account, const std::string& listId) {
+    if (std::erase_if(account.taskLists, [&](const auto& list) { return list->id == listId; }) == 0)
+        throw ApiError{404, "notFound", "No such task list", "tasklist"};
+}
+
+TaskList& Store::taskList(const std::string& email, const std::string& listId) {
+    for (const auto& list : account(email).taskLists) {
+        if (list->id == listId) return *list;
+    }
+    throw ApiError{404, "notFound", "No such task list", "tasklist"};
+}
+
 Json Store::dump() const {
     Json out = {{"clientId", clientId}, {"clientSecret", clientSecret}, {"revision", mRevisions.last()}};
     out["accounts"] = Json::array();
@@ -197,10 +229,20 @@ Json Store::dump() const {
             entries.push_back(
                 {{"id", entry.calendarId}, {"accessRole", entry.accessRole}, {"etag", entry.etag}});
         }
+        Json lists = Json::array();
+        for (const auto& list : account.taskLists) {
+            Json tasks = Json::array();
+            for (const auto& task : list->tasks()) {
+                if (!task->isDeleted) tasks.push_back(task->body);
+            }
+            lists.push_back(
+                {{"id", list->id}, {"title", list->title}, {"etag", list->etag}, {"tasks", tasks}});
+        }
         out["accounts"].push_back({{"email", email},
                                    {"name", account.name},
                                    {"refreshToken", account.refreshToken},
-                                   {"calendars", entries}});
+                                   {"calendars", entries},
+                                   {"taskLists", lists}});
     }
     out["calendars"] = Json::array();
     for (const auto& [calendarId, calendar] : mCalendars) {
@@ -291,6 +333,16 @@ void Store::loadAccount(const Json& state) {
         const std::string calendarId = textOf(item, "id", "");
         CalendarEntry& entry = addEntry(account, calendarId, textOf(item, "accessRole", "owner"));
         entry.etag = textOf(item, "etag", calendar(calendarId).etag);
+    }
+    for (const Json& list : listOf(state, "taskLists")) loadTaskList(account, list);
+}
+
+void Store::loadTaskList(Account& account, const Json& state) {
+    if (!state.is_object()) invalid("accounts.taskLists");
+    TaskList& list = addTaskList(account, state);
+    for (const Json& task : listOf(state, "tasks")) {
+        if (!task.is_object()) invalid("accounts.taskLists.tasks");
+        list.put(task);
     }
 }
 

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "Calendar.h"
+#include "TaskList.h"
 
 namespace provider {
 
@@ -25,6 +26,7 @@ struct Account {
     std::string name;
     std::string refreshToken;  // empty: revoked
     std::vector<CalendarEntry> calendars;
+    std::vector<std::unique_ptr<TaskList>> taskLists;
 
     [[nodiscard]] const CalendarEntry* find(const std::string& calendarId) const;
 };
@@ -49,6 +51,12 @@ public:
     Calendar& calendar(const std::string& calendarId);
     [[nodiscard]] Json calendarEntry(const Account& account, const CalendarEntry& entry) const;
 
+    // id empty: one is made.
+    TaskList& addTaskList(Account& account, const Json& members);
+    TaskList& changeTaskList(const std::string& email, const std::string& listId, const Json& members);
+    void removeTaskList(Account& account, const std::string& listId);
+    TaskList& taskList(const std::string& email, const std::string& listId);
+
     // The whole content, and back; load takes over all or nothing.
     [[nodiscard]] Json dump() const;
     void load(const Json& state);
@@ -61,6 +69,7 @@ private:
     CalendarEntry& addEntry(Account& account, const std::string& calendarId, const std::string& accessRole);
     void loadCalendar(const Json& state);
     void loadAccount(const Json& state);
+    void loadTaskList(Account& account, const Json& state);
     void touch(Calendar& calendar);
 
     mutable std::mutex mMutex;

@@ -76,14 +76,16 @@ public:
     int open(const char* path, unsigned group, unsigned mode) {
         if (path == nullptr || mFd != -1) return PLATFORM_ERROR_INVALID_PARAMETER;
         raiseDescriptorLimit();
-        const int fd = openService(path, group, mode);
-        if (fd < 0) return fd;
-        mFd = fd;
-        mPath = path;
-        // From here on clients can connect, so from here on a signal ends the service in order: at the latest when the
-        // loop begins to run.
+        // As soon as clients can connect a signal ends the service in order: at the latest when the loop begins to run.
         mSignals[0] = g_unix_signal_add(SIGTERM, onSignal, this);
         mSignals[1] = g_unix_signal_add(SIGINT, onSignal, this);
+        const int fd = openService(path, group, mode);
+        if (fd < 0) {
+            for (const guint signal : mSignals) g_source_remove(signal);
+            return fd;
+        }
+        mFd = fd;
+        mPath = path;
         struct stat info {};
         if (lstat(rootedPath(mPath).c_str(), &info) == 0) mInode = info.st_ino;
         listen();

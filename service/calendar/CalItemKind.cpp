@@ -2,7 +2,12 @@
 
 #include "calendar/CalJsonBuilder.h"
 #include "calendar/CalJsonParser.h"
+#include "calendar/CalMappings.h"
+#include "calendar/CalRecordAccess.h"
 #include "common/SyncResult.h"
+
+using cal_record::intOf;
+using cal_record::textOf;
 
 // Through the record and back, so that defaults and spellings of the server do not matter.
 std::string CalItemKind::comparable(JsonObject* item) const {
@@ -16,6 +21,38 @@ std::string CalItemKind::comparable(calendar_record_h record) const {
     return !body.empty() && parser.setString(body) == sync_result::kOk ? comparable(parser.root())
                                                                        : std::string();
 }
+
+namespace {
+
+constexpr unsigned kEventServerFields[] = {CALENDAR_EVENT_STATUS, CALENDAR_EVENT_ORGANIZER_NAME,
+                                           CALENDAR_EVENT_ORGANIZER_EMAIL, CALENDAR_EVENT_MEETING_STATUS};
+constexpr unsigned kTodoServerFields[] = {CALENDAR_TODO_COMPLETED_TIME, CALENDAR_TODO_SYNC_DATA1};
+
+// A status or an organizer of the user's own stays.
+bool takeEventFields(calendar_record_h server, calendar_record_h record) {
+    const auto setInt = [&](unsigned property) {
+        return calendar_record_set_int(record, property, intOf(server, property)) == PLATFORM_ERROR_NONE;
+    };
+    const auto setText = [&](unsigned property) {
+        return calendar_record_set_str(record, property, textOf(server, property).c_str()) ==
+               PLATFORM_ERROR_NONE;
+    };
+    if (intOf(record, CALENDAR_EVENT_STATUS) == cal_mapping::kStatusNone && !setInt(CALENDAR_EVENT_STATUS))
+        return false;
+    if (!textOf(record, CALENDAR_EVENT_ORGANIZER_EMAIL).empty()) return true;
+    return setText(CALENDAR_EVENT_ORGANIZER_NAME) && setText(CALENDAR_EVENT_ORGANIZER_EMAIL) &&
+           setInt(CALENDAR_EVENT_MEETING_STATUS);
+}
+
+bool takeTodoFields(calendar_record_h server, calendar_record_h record) {
+    int64_t completed = 0;
+    return calendar_record_get_lli(server, CALENDAR_TODO_COMPLETED_TIME, &completed) == PLATFORM_ERROR_NONE &&
+           calendar_record_set_lli(record, CALENDAR_TODO_COMPLETED_TIME, completed) == PLATFORM_ERROR_NONE &&
+           calendar_record_set_str(record, CALENDAR_TODO_SYNC_DATA1,
+                                   textOf(server, CALENDAR_TODO_SYNC_DATA1).c_str()) == PLATFORM_ERROR_NONE;
+}
+
+}  // namespace
 
 const CalItemKind kEventKind = {
     .itemName = "event",
@@ -34,6 +71,8 @@ const CalItemKind kEventKind = {
     .convert = CalJsonParser::convertEvent,
     .build = cal_json::eventBody,
     .buildComparable = cal_json::comparableEventBody,
+    .serverFields = kEventServerFields,
+    .takeServerFields = takeEventFields,
     .texts = {.notJson = "This is not event json",
               .insertItems = "insertEvents fail",
               .updateItems = "updateEvents fail",
@@ -63,6 +102,8 @@ const CalItemKind kTodoKind = {
     .convert = CalJsonParser::convertTodo,
     .build = cal_json::todoBody,
     .buildComparable = cal_json::todoBody,
+    .serverFields = kTodoServerFields,
+    .takeServerFields = takeTodoFields,
     .texts = {.notJson = "checkException fail",
               .insertItems = "insert fail",
               .updateItems = "insert fail",

@@ -3,6 +3,7 @@
 
 #include <json-glib/json-glib.h>
 
+#include <span>
 #include <string>
 
 #include "platform/calendar.h"
@@ -28,6 +29,10 @@ struct CalItemKind {
     int (*convert)(JsonObject* json, CalendarRecord* out);
     std::string (*build)(calendar_record_h record);
     std::string (*buildComparable)(calendar_record_h record);  // without what servers fill in on their own
+
+    // What is not sent, or what the server fills in; read from its answer to an upload. False when a value cannot be set.
+    std::span<const unsigned> serverFields;
+    bool (*takeServerFields)(calendar_record_h server, calendar_record_h record);
 
     // What is logged when something fails.
     struct Texts {

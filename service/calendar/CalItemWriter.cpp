@@ -6,6 +6,7 @@
 #include "calendar/CalRecordAccess.h"
 #include "calendar/CalSeriesDates.h"
 #include "calendar/CalTransaction.h"
+#include "calendar/CalWriteBack.h"
 #include "common/SyncLog.h"
 
 using sync_result::kFailed;
@@ -123,6 +124,11 @@ int CalItemWriter::writeRecords(CalPagePlan* plan, Batch* batch) {
         return kFailed;
     }
     if (insertItems(plan, batch) != kOk || updateItems(plan, batch) != kOk) return kFailed;
+    for (const PlannedEvent& planned : plan->events) {
+        if (!planned.sent) continue;
+        const CalWriteBack sent{planned.row.event_id, planned.row.version, planned.row.uri, planned.row.etag};
+        if (!writeBack(mpSnapshot->kind(), sent, jsonObjectOf(planned.sent->json))) return kFailed;
+    }
     resolveSeries(plan, batch);
     if (insertException(plan, batch) != kOk || updateException(plan, batch) != kOk) return kFailed;
     std::vector<PlannedInstance*> cancelled;

@@ -39,6 +39,7 @@ public:
     [[nodiscard]] JsonObject* root() const;
     // The document, to be kept.
     [[nodiscard]] JsonNodePtr takeRoot() { return std::move(mpRoot); }
+    [[nodiscard]] JsonNodePtr copyRoot() const { return JsonNodePtr(json_node_ref(mpRoot.get())); }
 
 private:
     JsonNodePtr mpRoot;

@@ -219,7 +219,8 @@ int CalManager::setBookChanged(int calendarId) {
     std::vector<LocalChange> changes;
     int current = 0;
     if (readChanges(mKind, calendarId, book.sync_version, &changes, &current) != kOk) return kFailed;
-    if (current <= book.sync_version) return kOk;
+    // A store that nobody wrote stays as it is.
+    if (changes.empty() || current <= book.sync_version) return kOk;
     std::erase_if(changes, [](const LocalChange& change) { return change.ownWrite(); });
     // Everything is read from the calendar service before the transaction begins.
     for (LocalChange& change : changes) {

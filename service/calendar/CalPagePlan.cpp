@@ -23,14 +23,14 @@ public:
             ExceptionInfo info;
             JsonObject* json = jsonObjectOf(entry->json);
             if (!mKind.hasSeries()) {
-                planEvent(*entry);
+                planEvent(entry);
             } else if (json == nullptr) {
                 SYNC_ERR("%s", mKind.texts.notJson);
             } else if (CalJsonParser::checkException(json, &info) != kOk) {
                 SYNC_ERR("checkException fail");
                 SYNC_ERR("event(%s) is left out", entry->id.c_str());
             } else if (info.kind == ExceptionKind::kOrdinary) {
-                planEvent(*entry);
+                planEvent(entry);
             } else {
                 instances.emplace_back(entry, info);
             }
@@ -60,7 +60,8 @@ private:
         return false;
     }
 
-    void planEvent(const CalListInfo& entry) {
+    void planEvent(const CalListInfoPtr& listed) {
+        const CalListInfo& entry = *listed;
         if (const CalEventMetaData* row = mSnapshot.rowByUri(entry.id)) {
             if (row->original_event_id != 0) {
                 SYNC_ERR("event(%s) is an instance of a series on the device, ignoring", entry.id.c_str());
@@ -70,7 +71,7 @@ private:
         } else if (const int orphan = mSnapshot.orphan(entry.id)) {
             planOrphan(entry, orphan);
         } else if (const CalEventMetaData* sent = unconfirmedRow(entry)) {
-            planSent(entry, *sent);
+            planSent(listed, *sent);
         } else {
             PlannedEvent planned;
             planned.row = newRow(entry);
@@ -113,17 +114,18 @@ private:
     }
 
     // Sent in an earlier run whose answer was lost.
-    void planSent(const CalListInfo& entry, const CalEventMetaData& sent) {
-        SYNC_INFO("%s(%s) is the device's %d, which was sent before", mKind.itemName, entry.id.c_str(),
+    void planSent(const CalListInfoPtr& entry, const CalEventMetaData& sent) {
+        SYNC_INFO("%s(%s) is the device's %d, which was sent before", mKind.itemName, entry->id.c_str(),
                   sent.event_id);
         PlannedEvent planned;
         planned.row = sent;
-        planned.row.uri = entry.id;
-        planned.row.etag = entry.etag;
+        planned.row.uri = entry->id;
+        planned.row.etag = entry->etag;
         planned.row.dirty = 0;
         planned.row.version = mSnapshot.record(sent.event_id)->version;
         planned.rowWrite = RowWrite::kUpdate;
         planned.ownWrite = false;
+        planned.sent = entry;
         mTakenRows.insert(sent.event_id);
         add(std::move(planned));
     }

@@ -30,6 +30,8 @@ struct PlannedEvent {
     RowWrite rowWrite = RowWrite::kInsert;
     int expectedVersion = kAnyVersion;
     bool ownWrite = true;  // false: taken over with a user's change in it
+    CalListInfoPtr
+        sent;  // the server's answer that was lost: the record only learns what the server calls it
 };
 
 // An instance of a series to be written.

@@ -98,13 +98,12 @@ void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, c
     }
     if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
     std::string etag = before.etag;
-    if (!update(row, uri, body, &etag)) return;
+    JsonNodePtr item;
+    if (!update(row, uri, body, &etag, &item)) return;
     row.uri = uri;
     row.etag = etag;
     row.dirty = 0;
-    store(row, version);
-    if (!mSentItems.empty())
-        mSentItems.back().expectedVersion = seriesVersion;  // an exception is as old as its series
+    store(row, version, seriesVersion, std::move(item));  // an exception is as old as its series
 }
 
 bool CalUploader::sendDates(Row& series, calendar_record_h record) {

@@ -23,6 +23,7 @@ struct UpReply {
     std::string uri;                    // of the item, where the answer names it
     std::string etag;                   // likewise
     bool isCancelled = false;           // the answer says so of the item
+    JsonNodePtr item;                   // the item as the server has it now, where the answer is one
     std::string reason;                 // for people, of what was not accepted
 
     // Whether an item that was to be deleted is gone for good.

@@ -4,7 +4,6 @@
 #include <utility>
 
 #include "calendar/CalItemWriter.h"
-#include "calendar/CalMappings.h"
 #include "calendar/CalRecordAccess.h"
 #include "calendar/CalTransaction.h"
 #include "common/PageReader.h"
@@ -176,14 +175,15 @@ void CalUploader::sendItem(Row& row) {
 }
 
 void CalUploader::insertItem(Row& row, calendar_record_h record, const std::string& body) {
-    const UpReply reply = mTask.insert(mBook.uri, body);
+    UpReply reply = mTask.insert(mBook.uri, body);
     switch (reply.answer) {
         case UpAnswer::kAccepted:
             row.uri = reply.uri;
             row.etag = reply.etag;
             // A series stays marked until the server has its cancelled instances too.
             row.dirty = hasUnsentDates(row, record) ? 1 : 0;
-            return store(row, intOf(record, mKind.version));
+            return store(row, intOf(record, mKind.version), intOf(record, mKind.version),
+                         std::move(reply.item));
         case UpAnswer::kRefused: {
             fail(row, reply);
             row.etag.clear();
@@ -202,13 +202,15 @@ void CalUploader::updateItem(Row& row, calendar_record_h record, const std::stri
     const UpReply before = mTask.getEtag(mBook.uri, row.uri);
     if (before.answer == UpAnswer::kGone) return removeGone(row, version);
     if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
-    if (!update(row, row.uri, body, &row.etag)) return;
+    JsonNodePtr item;
+    if (!update(row, row.uri, body, &row.etag, &item)) return;
     row.dirty = hasUnsentDates(row, record) ? 1 : 0;
-    store(row, version);
+    store(row, version, version, std::move(item));
 }
 
-bool CalUploader::update(const Row& row, const std::string& uri, const std::string& body, std::string* etag) {
-    const UpReply answer = mTask.update(mBook.uri, uri, body);
+bool CalUploader::update(const Row& row, const std::string& uri, const std::string& body, std::string* etag,
+                         JsonNodePtr* item) {
+    UpReply answer = mTask.update(mBook.uri, uri, body);
     if (answer.answer != UpAnswer::kAccepted) {
         endWith(row, answer, End::kNone);
         return false;
@@ -221,6 +223,7 @@ bool CalUploader::update(const Row& row, const std::string& uri, const std::stri
     // What somebody else wrote in between comes down with the next download, so the etag of our own write is kept.
     const std::string& known = !answer.etag.empty() ? answer.etag : after.etag;
     if (!known.empty()) *etag = known;
+    *item = std::move(answer.item);
     return true;
 }
 
@@ -251,7 +254,7 @@ void CalUploader::sendDeleted(Row& row) {
     if (mpStore->updateItem(row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
 }
 
-void CalUploader::store(Row& row, int version) {
+void CalUploader::store(Row& row, int version, int expectedVersion, JsonNodePtr item) {
     row.version = version;
     ++mSent;
     if (mpStore->updateItem(row) != kOk) {
@@ -261,7 +264,7 @@ void CalUploader::store(Row& row, int version) {
         mEnd = End::kAll;
         return;
     }
-    mSentItems.push_back({row.event_id, version, row.uri, row.etag});
+    mSentItems.push_back({{row.event_id, expectedVersion, row.uri, row.etag}, std::move(item)});
 }
 
 // The records learn what the server calls them, so that they can be recognised without their rows.
@@ -273,7 +276,7 @@ int CalUploader::writeBack() {
         return kFailed;
     }
     for (const Sent& sent : mSentItems) {
-        if (!writeBackOne(sent)) return kFailed;
+        if (!::writeBack(mKind, sent.record, jsonObjectOf(sent.item))) return kFailed;
     }
     if (!transaction.commit()) {
         SYNC_ERR("get svc fail");
@@ -281,26 +284,4 @@ int CalUploader::writeBack() {
     }
     // Our own writes need not be walked again.
     return mSide.manager().setBookChanged(mBook.calendar_id);
-}
-
-bool CalUploader::writeBackOne(const Sent& sent) {
-    const bool isTodo = !mKind.hasSeries();
-    std::vector<unsigned> properties = {mKind.id, mKind.uid, mKind.etag};
-    if (isTodo) properties.insert(properties.end(), {CALENDAR_TODO_HAS_DUE, CALENDAR_TODO_SYNC_DATA1});
-    CalendarList list;
-    calendar_record_h record = nullptr;
-    const int found = cal_record::readPart(mKind.view, mKind.id, sent.itemId, properties, &list, &record);
-    if (found == PLATFORM_ERROR_NOT_FOUND) return true;
-    const auto set = [record](unsigned property, std::string_view text) {
-        return calendar_record_set_str(record, property, std::string(text).c_str()) == PLATFORM_ERROR_NONE;
-    };
-    if (found != PLATFORM_ERROR_NONE || !set(mKind.uid, sent.uri) || !set(mKind.etag, sent.etag))
-        return false;
-    const bool hasDue = isTodo && intOf(record, CALENDAR_TODO_HAS_DUE) != 0;
-    if (isTodo && !set(CALENDAR_TODO_SYNC_DATA1, hasDue ? cal_mapping::kServerHasDue : "")) return false;
-    const record_write_options_s options{.by_sync = true,
-                                         .expected_versions = std::span(&sent.expectedVersion, 1)};
-    const int code = calendar_db_update_record(record, options);
-    // Changed again meanwhile: the next run sends it and comes back here.
-    return code == PLATFORM_ERROR_NONE || code == PLATFORM_ERROR_CONFLICT || code == PLATFORM_ERROR_NOT_FOUND;
 }

@@ -13,6 +13,7 @@
 
 #include "calendar/CalSyncSide.h"
 #include "calendar/CalUpSyncTasks.h"
+#include "calendar/CalWriteBack.h"
 #include "common/SyncDirector.h"
 
 class CalUploader {
@@ -32,12 +33,9 @@ private:
     enum class End { kNone, kDirtyOfBook, kAll };
     using Row = CalEventMetaData;
 
-    // What is written into the records at the end: what the server calls them.
     struct Sent {
-        int itemId;
-        int expectedVersion;
-        std::string uri;
-        std::string etag;
+        CalWriteBack record;
+        JsonNodePtr item;  // as the server has it, NULL when it did not say
     };
 
     [[nodiscard]] bool isStopped() const { return mpStopQuery != nullptr && mpStopQuery->isStopped(); }
@@ -59,10 +57,10 @@ private:
     void sendDeleted(Row& row);
     // PATCH between two looks at the etag; true with the etag that the row takes when the server took it.
     [[nodiscard]] bool update(const Row& row, const std::string& uri, const std::string& body,
-                              std::string* etag);
-    void store(Row& row, int version);
+                              std::string* etag, JsonNodePtr* item);
+    void store(Row& row, int version, int expectedVersion, JsonNodePtr item);
+    // The records learn what the server calls them.
     [[nodiscard]] int writeBack();
-    [[nodiscard]] bool writeBackOne(const Sent& sent);
 
     // --- instances of a series
     void sendInstances(Row& series, calendar_record_h record);

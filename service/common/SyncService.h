@@ -9,6 +9,7 @@
 
 #include "common/Account.h"
 #include "common/SyncAgent.h"
+#include "common/SyncScheduleManager.h"
 #include "common/vantor_pim_sync.h"
 #include "platform/account.h"
 #include "platform/settings.h"
@@ -81,6 +82,7 @@ private:
     static bool account_cb(const char* eventType, int accountId, void* userData);
     static void calendar_sync_cb(keynode_t* node, void* userData);
     static void psmCallback(keynode_t* node, void* userData);
+    void setPowerSaving(bool on);
     void onPowerSavingMode(bool on);
     void restoreRunningStatus(int accountId);
 
@@ -88,5 +90,5 @@ private:
     AgentMap mContactsAgents;
     std::map<int, std::unique_ptr<Account>> mAccounts;
     account_subscribe_h mSubscription = nullptr;
-    bool mIsPowerSaving = false;
+    bool mIsPowerSaving = SyncScheduleManager::isPowerSaving();  // what the schedules follow
 };

@@ -28,10 +28,11 @@ void SyncService::watchEvents() {
     if (vconf_notify_key_changed(kCalendarSyncKey, calendar_sync_cb, this) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("%s cannot be watched, ignoring", kCalendarSyncKey);
     }
-    mIsPowerSaving = SyncScheduleManager::isPowerSaving();
     if (vconf_notify_key_changed(kPowerSavingKey, psmCallback, this) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("%s cannot be watched, ignoring", kPowerSavingKey);
     }
+    // What changed between the first schedules and the watch was told to nobody.
+    setPowerSaving(SyncScheduleManager::isPowerSaving());
 }
 
 bool SyncService::account_cb(const char* eventType, int accountId, void* userData) {
@@ -92,9 +93,12 @@ void SyncService::psmCallback(keynode_t* node, void* userData) {
         SYNC_ERR(" fail");
         return;
     }
-    const bool on = vconf_keynode_get_int(node) == kPowerSaving;
-    if (on != self->mIsPowerSaving) self->onPowerSavingMode(on);
-    self->mIsPowerSaving = on;
+    self->setPowerSaving(vconf_keynode_get_int(node) == kPowerSaving);
+}
+
+void SyncService::setPowerSaving(bool on) {
+    if (on != mIsPowerSaving) onPowerSavingMode(on);
+    mIsPowerSaving = on;
 }
 
 void SyncService::onPowerSavingMode(bool on) {

@@ -1,6 +1,7 @@
 #include "common/SyncWorker.h"
 
 #include <cerrno>
+#include <mutex>
 
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
@@ -19,14 +20,26 @@ struct SyncWorker::SyncRequest {
 
 namespace {
 
+// Between the thread that posts a source and the one that it runs on. The main loop has a lock of its own there, which the thread
+// sanitizer cannot see.
+std::mutex gHandOver;
+
 // Sources own a reference to their request.
 template <class Request>
 gpointer toSource(std::shared_ptr<Request> request) {
+    const std::lock_guard lock(gHandOver);
     return new std::shared_ptr<Request>(std::move(request));
 }
 
 template <class Request>
+std::shared_ptr<Request> fromSource(gpointer data) {
+    const std::lock_guard lock(gHandOver);
+    return *static_cast<std::shared_ptr<Request>*>(data);
+}
+
+template <class Request>
 void freeFromSource(gpointer data) {
+    const std::lock_guard lock(gHandOver);
     delete static_cast<std::shared_ptr<Request>*>(data);
 }
 
@@ -99,7 +112,7 @@ int SyncWorker::addRequest() {
 }
 
 gboolean SyncWorker::runRequest(gpointer data) {
-    const auto& request = *static_cast<std::shared_ptr<SyncRequest>*>(data);
+    const std::shared_ptr<SyncRequest> request = fromSource<SyncRequest>(data);
     request->result = request->director->run();
     addResponse(request);
     return G_SOURCE_REMOVE;
@@ -112,7 +125,7 @@ void SyncWorker::addResponse(std::shared_ptr<SyncRequest> request) {
 }
 
 gboolean SyncWorker::onResponse(gpointer data) {
-    const std::shared_ptr<SyncRequest> request = *static_cast<std::shared_ptr<SyncRequest>*>(data);
+    const std::shared_ptr<SyncRequest> request = fromSource<SyncRequest>(data);
     SyncWorker* worker = request->worker;
     if (worker == nullptr) return G_SOURCE_REMOVE;
     if (worker->isStopped()) {

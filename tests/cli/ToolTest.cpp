@@ -24,7 +24,9 @@ TEST(Tool, TellsMisuseFromFailureAndSaysWhyInOneLine) {
     const StatusRow rows[] = {
         {{}, 2},
         {{"dance"}, 2},
-        {{"todos", "list"}, 2},
+        {{"contacts", "list"}, 2},
+        {{"todo", "show", "0"}, 2},
+        {{"todo", "show", "1"}, 1},
         {{"event"}, 2},
         {{"event", "show"}, 2},
         {{"event", "show", "x"}, 2},

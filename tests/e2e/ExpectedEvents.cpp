@@ -126,3 +126,22 @@ Json comparable(const Json& listed, const std::map<int, std::string>& uidOf) {
     event["originalEvent"] = original.is_number() && original != 0 ? Json(uidOf.at(original)) : Json(nullptr);
     return event;
 }
+
+Json expectedTodo(const Json& wire) {
+    std::string completed = wire.value("completed", "");
+    // Milliseconds are spelt out by the provider.
+    if (const size_t fraction = completed.find(".000Z"); fraction != std::string::npos)
+        completed.replace(fraction, 5, "Z");
+    return {{"summary", wire.value("title", "")},
+            {"note", wire.value("notes", "")},
+            {"due", wire.value("due", "")},
+            {"completed", completed},
+            {"status", wire.value("status", "needsAction")}};
+}
+
+Json comparableTodo(const Json& listed) {
+    Json todo;
+    for (const char* field : {"summary", "note", "due", "completed", "status"})
+        todo[field] = listed.at(field);
+    return todo;
+}

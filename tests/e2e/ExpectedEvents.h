@@ -12,5 +12,9 @@ using Json = nlohmann::json;
 // their series; an instance whose series is not there is left out.
 std::map<std::string, Json> expectedEvents(const std::vector<Json>& wire);
 
+// The same of one task.
+Json expectedTodo(const Json& wire);
+Json comparableTodo(const Json& listed);
+
 // The comparable fields of an event as the tool lists it. `uidOf` maps local ids to server ids.
 Json comparable(const Json& listed, const std::map<int, std::string>& uidOf);

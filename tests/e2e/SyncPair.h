@@ -16,16 +16,23 @@ public:
     explicit SyncPair(int accounts = 1,
                       const std::vector<std::string>& providerArguments = {"--seed", "sample"});
 
-    // Fails the test unless the account's calendars and events are the same on both sides, once each.
+    // Fails the test unless the account's calendars, events, task lists and tasks are the same on both sides, once each.
     void expectSame(int account);
     // Fails the test unless another sync sends no write and changes no store.
     void expectQuiet(int account);
 
     [[nodiscard]] std::vector<Json> wireCalendars(int account);
     [[nodiscard]] std::vector<Json> wireEvents(const std::string& calendarId);
+    [[nodiscard]] std::vector<Json> wireTaskLists(int account);
+    [[nodiscard]] std::vector<Json> wireTasks(int account, const std::string& listId);
+    // "/accounts/EMAIL/tasklists/ID/tasks", for the admin services.
+    [[nodiscard]] std::string tasksPath(int account, const std::string& listId);
+    // The device's calendar, or task list, with this name.
+    [[nodiscard]] int localCalendar(int account, const std::string& name);
     [[nodiscard]] std::string firstCalendar(int account) { return wireCalendars(account).at(0)["id"]; }
     // The local event with this server id.
     [[nodiscard]] Json localEvent(const std::string& uid);
+    [[nodiscard]] Json localTodo(const std::string& uid);
     // The provider's requests so far, counted by method.
     [[nodiscard]] std::map<std::string, int> requestCounts();
     void installFault(const Json& fault) { provider.admin("POST", "/faults", fault); }
@@ -33,6 +40,10 @@ public:
 
     Provider provider;
     Device device;
+
+private:
+    void expectSameEvents(const Json& book, const Json& calendar);
+    void expectSameTasks(int account, const Json& books);
 };
 
 // A calendar's id inside an admin path.

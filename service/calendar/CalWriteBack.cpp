@@ -1,0 +1,29 @@
+#include "calendar/CalWriteBack.h"
+
+#include <vector>
+
+#include "calendar/CalRecordAccess.h"
+#include "common/SyncResult.h"
+
+using sync_result::kOk;
+
+bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* item) {
+    std::vector<unsigned> properties = {kind.id, kind.uid, kind.etag};
+    properties.insert(properties.end(), kind.serverFields.begin(), kind.serverFields.end());
+    CalendarList list;
+    calendar_record_h record = nullptr;
+    const int found = cal_record::readPart(kind.view, kind.id, sent.itemId, properties, &list, &record);
+    if (found == PLATFORM_ERROR_NOT_FOUND) return true;
+    const auto set = [record](unsigned property, const std::string& text) {
+        return calendar_record_set_str(record, property, text.c_str()) == PLATFORM_ERROR_NONE;
+    };
+    if (found != PLATFORM_ERROR_NONE || !set(kind.uid, sent.uri) || !set(kind.etag, sent.etag)) return false;
+    CalendarRecord server;
+    if (item != nullptr && kind.convert(item, &server) == kOk && !kind.takeServerFields(server.get(), record))
+        return false;
+    const record_write_options_s options{.by_sync = true,
+                                         .expected_versions = std::span(&sent.expectedVersion, 1)};
+    const int code = calendar_db_update_record(record, options);
+    // Changed again meanwhile: the next run sends it and comes back here.
+    return code == PLATFORM_ERROR_NONE || code == PLATFORM_ERROR_CONFLICT || code == PLATFORM_ERROR_NOT_FOUND;
+}

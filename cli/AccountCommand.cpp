@@ -58,7 +58,7 @@ std::string placeToken(const AccountOptions& options, Undo& undo) {
         if (former && !former->empty()) return *former;
         throw Failure(named(options.id) + " has no refresh token; give it with --refresh-token-file FILE");
     }
-    const std::string token = input_file::readSecret(options.tokenFile, "the refresh token");
+    std::string token = input_file::readSecret(options.tokenFile, "the refresh token");
     if (token.find_first_of("\r\n \t") != std::string::npos) {
         throw Failure("the refresh token must be one word on one line");
     }

@@ -40,9 +40,9 @@ void listTable(const std::map<int, Json>& accounts) {
     output::Table table({"ID", "EMAIL", "CALENDAR", "CONTACTS", "SERVER"});
     const auto yes = [](const Json& kind) { return kind["enabled"] ? "on" : "off"; };
     for (const auto& [id, account] : accounts) {
-        const Json& server = account["calendar"]["server"];
+        const std::string server = account["calendar"]["server"];
         table.add({std::to_string(id), account["email"], yes(account["calendar"]), yes(account["contacts"]),
-                   server != "" ? server : account["contacts"]["server"]});
+                   server.empty() ? account["contacts"]["server"].get<std::string>() : server});
     }
     table.print();
 }

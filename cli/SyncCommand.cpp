@@ -47,6 +47,12 @@ std::vector<vantor_pim_sync_type_e> kindsOf(const Options& options) {
     return kinds;
 }
 
+bool isSwitchedOn(int account, vantor_pim_sync_type_e kind) {
+    const AccountRecord record = sync_client::account(account);
+    if (!record) return false;
+    return kind == VANTOR_PIM_SYNC_TYPE_CALENDAR ? record->calsync : record->ctsync;
+}
+
 // The run to wait for. A sync that is going on or queued already is as good as a new one.
 int start(int account, vantor_pim_sync_type_e kind) {
     const SyncState state(account, kind);
@@ -58,9 +64,7 @@ int start(int account, vantor_pim_sync_type_e kind) {
         if (now == SYNC_AGENT_STATE_IN_PROGRESS) break;
         // Ready again: the sync that was in the way ended just now, so the next start is taken. Ready is also what a
         // kind says that was switched off.
-        const AccountRecord record = now == SYNC_AGENT_STATE_READY ? sync_client::account(account) : nullptr;
-        const bool isOn =
-            record != nullptr && (kind == VANTOR_PIM_SYNC_TYPE_CALENDAR ? record->calsync : record->ctsync);
+        const bool isOn = now == SYNC_AGENT_STATE_READY && isSwitchedOn(account, kind);
         if (!isOn || tries + 1 == kMostStartTries) throw Failure(sync_client::refusal(code, account, kind));
     }
     output::progress(sync_client::kindName(kind) + (code == 0 ? ": sync started" : ": a sync is going on"));
@@ -121,9 +125,7 @@ void stop(const Options& options) {
     for (const vantor_pim_sync_type_e kind : kindsOf(options)) {
         const int code = vantor_pim_sync_stop(options.account, kind);
         const bool isIdle = sync_client::state(options.account, kind) != SYNC_AGENT_STATE_IN_PROGRESS;
-        const AccountRecord record = sync_client::account(options.account);
-        const bool isOn =
-            record != nullptr && (kind == VANTOR_PIM_SYNC_TYPE_CALENDAR ? record->calsync : record->ctsync);
+        const bool isOn = isSwitchedOn(options.account, kind);
         if (code == 0) {
             output::line(sync_client::kindName(kind) + ": sync stopped");
         } else if (isOn && isIdle) {

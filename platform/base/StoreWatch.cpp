@@ -15,7 +15,7 @@ constexpr guint kGatherMs = 20;
 
 }  // namespace
 
-StoreWatch::StoreWatch(std::string path, std::function<void()> onWritten)
+StoreWatch::StoreWatch(const std::string& path, std::function<void()> onWritten)
     : mName(path.substr(path.rfind('/') + 1)), mOnWritten(std::move(onWritten)) {
     mDescriptor = inotify_init1(IN_CLOEXEC | IN_NONBLOCK);
     if (mDescriptor == -1) return;

@@ -15,7 +15,7 @@ class StoreWatch {
 public:
     // `path` is the database's file on this machine; its folder must exist. Writes that fall together are told once, some
     // milliseconds after the first.
-    StoreWatch(std::string path, std::function<void()> onWritten);
+    StoreWatch(const std::string& path, std::function<void()> onWritten);
     ~StoreWatch();
     StoreWatch(const StoreWatch&) = delete;
     StoreWatch& operator=(const StoreWatch&) = delete;

@@ -114,6 +114,7 @@ int dlog_print(log_priority priority, const char* tag, const char* format, ...) 
     char buffer[kMaxMessageBytes];
     va_list arguments;
     va_start(arguments, format);
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the analyser does not know this va_start
     const int length = std::vsnprintf(buffer, sizeof buffer, format, arguments);
     va_end(arguments);
     if (length < 0) return 0;

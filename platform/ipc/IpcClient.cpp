@@ -70,11 +70,9 @@ int receiveReply(pims_ipc_s* ipc, std::vector<std::string>* items, Clock::time_p
         const ssize_t count = recv(ipc->fd, chunk, sizeof chunk, MSG_DONTWAIT);
         if (count > 0) {
             ipc->input.append(chunk, static_cast<size_t>(count));
-        } else if (count == 0) {
-            return PLATFORM_ERROR_IO;
-        } else if (errno == EAGAIN) {
+        } else if (count < 0 && errno == EAGAIN) {
             if (const int code = waitFor(ipc->fd, POLLIN, deadline); code != PLATFORM_ERROR_NONE) return code;
-        } else if (errno != EINTR) {
+        } else if (count == 0 || errno != EINTR) {
             return PLATFORM_ERROR_IO;
         }
     }

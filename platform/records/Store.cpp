@@ -163,8 +163,9 @@ std::string Store::tableText(const View& view) const {
     for (const Property& property : view.properties) {
         const View* child = property.childView != nullptr ? viewOf(property.childView) : nullptr;
         if (child == nullptr || child == &view) continue;
-        text += "CREATE TRIGGER IF NOT EXISTS " + table + "_" + child->table + " AFTER DELETE ON " + table +
-                " BEGIN DELETE FROM " + child->table + " WHERE parent = old.id; END;";
+        text.append("CREATE TRIGGER IF NOT EXISTS ").append(table).append("_").append(child->table);
+        text.append(" AFTER DELETE ON ").append(table).append(" BEGIN DELETE FROM ").append(child->table);
+        text.append(" WHERE parent = old.id; END;");
     }
     return text;
 }

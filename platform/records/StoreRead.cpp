@@ -55,6 +55,18 @@ std::string tailOf(const Query& query, int offset, int limit, std::vector<Value>
     return tail;
 }
 
+// The index knows exceptions only.
+std::string exceptionsOf(const View& view, const std::string& selectIds) {
+    const std::string series = view.columnOf(view.seriesProperty);
+    return " WHERE " + series + " <> 0 AND " + series + " IN (" + selectIds + ")";
+}
+
+std::string childrenOf(const View& child, const std::string& selectIds) {
+    std::string columns = "parent, id";
+    for (const Property& column : child.properties) columns.append(", ").append(column.column);
+    return "SELECT " + columns + " FROM " + child.table + " WHERE parent IN (" + selectIds + ") ORDER BY id";
+}
+
 }  // namespace
 
 int Store::get(const View& view, int id, std::unique_ptr<Record>* out) {
@@ -139,11 +151,8 @@ int Store::readChildren(const View& view, const Query& query, const std::string&
             Query exceptions(view);
             exceptions.projection.assign(view.properties.size(), true);
             exceptions.projection[i] = false;
-            // The index knows exceptions only.
-            const std::string series = view.columnOf(view.seriesProperty);
-            const std::string condition =
-                " WHERE " + series + " <> 0 AND " + series + " IN (" + selectIds + ")";
-            const int code = readRecords(exceptions, condition, values, " ORDER BY id", &children);
+            const int code =
+                readRecords(exceptions, exceptionsOf(view, selectIds), values, " ORDER BY id", &children);
             if (code != PLATFORM_ERROR_NONE) return code;
             for (const auto& record : children) {
                 parents.push_back(record->seriesId());
@@ -151,10 +160,7 @@ int Store::readChildren(const View& view, const Query& query, const std::string&
                     parent->second->readExceptions.push_back(record->id());
             }
         } else {
-            std::string columns = "parent, id";
-            for (const Property& column : child.properties) columns += std::string(", ") + column.column;
-            Statement statement = mConnection.prepare("SELECT " + columns + " FROM " + child.table +
-                                                      " WHERE parent IN (" + selectIds + ") ORDER BY id");
+            Statement statement = mConnection.prepare(childrenOf(child, selectIds));
             for (const Value& value : values) statement.bind(value);
             int code = statement.step();
             for (; code == SQLITE_ROW; code = statement.step()) {

@@ -17,6 +17,17 @@ bool isColumn(const Property& property) {
     return property.column != nullptr && !property.readOnly;
 }
 
+std::string insertChild(const View& child) {
+    std::string columns = "parent";
+    std::string places = "?";
+    for (const Property& column : child.properties) {
+        if (!isColumn(column)) continue;
+        columns.append(", ").append(column.column);
+        places += ", ?";
+    }
+    return std::string("INSERT INTO ") + child.table + "(" + columns + ") VALUES(" + places + ")";
+}
+
 }  // namespace
 
 int Store::load(const View& view, int id, Stored* stored) {
@@ -140,16 +151,9 @@ int Store::writeChildren(Record& record, int id, ChildWrite how) {
         Statement clear =
             mConnection.prepare(std::string("DELETE FROM ") + child.table + " WHERE parent = ?");
         if (const int code = clear.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);
-        std::string columns = "parent";
-        std::string places = "?";
-        for (const Property& column : child.properties) {
-            if (!isColumn(column)) continue;
-            columns += std::string(", ") + column.column;
-            places += ", ?";
-        }
+        const std::string sql = insertChild(child);
         for (const auto& entry : record.children(i)) {
-            Statement insert = mConnection.prepare(std::string("INSERT INTO ") + child.table + "(" + columns +
-                                                   ") VALUES(" + places + ")");
+            Statement insert = mConnection.prepare(sql);
             insert.bind(int64_t{id});
             for (size_t k = 0; k < child.properties.size(); ++k) {
                 if (isColumn(child.properties[k])) insert.bind(entry->valueAt(k));

@@ -215,6 +215,13 @@ bool CalUploader::update(const Row& row, const std::string& uri, const std::stri
         endWith(row, answer, End::kNone);
         return false;
     }
+    if (answer.isCancelled) {
+        // It takes changes but stays cancelled: without an etag the row differs from the list, and the download takes it away.
+        etag->clear();
+        SYNC_ERR("%s(%s) is cancelled on the server, the device's change is dropped", mKind.itemName,
+                 uri.c_str());
+        return true;
+    }
     const UpReply after = mTask.getEtag(mBook.uri, uri);
     if (after.answer != UpAnswer::kAccepted) {
         SYNC_ERR("Failed to get etag");

@@ -30,12 +30,13 @@ int ToolRoot::addEvent(int calendar, const std::string& object) {
     return result.status == 0 ? std::stoi(result.output) : 0;
 }
 
-int ToolRoot::addCalendar(int account, const char* name, bool isReadOnly) {
+int ToolRoot::addCalendar(int account, const char* name, bool isReadOnly, int storeType) {
     EXPECT_EQ(calendar_connect_with_flags(0), 0);
     calendar_record_h raw = nullptr;
     EXPECT_EQ(calendar_record_create(_calendar_book, &raw), 0);
     const CalendarRecord book(raw);
     EXPECT_EQ(calendar_record_set_int(raw, CALENDAR_BOOK_ACCOUNT_ID, account), 0);
+    EXPECT_EQ(calendar_record_set_int(raw, CALENDAR_BOOK_STORE_TYPE, storeType), 0);
     EXPECT_EQ(calendar_record_set_str(raw, CALENDAR_BOOK_NAME, name), 0);
     EXPECT_EQ(calendar_record_set_str(raw, CALENDAR_BOOK_COLOR, "10.20.30.255"), 0);
     EXPECT_EQ(calendar_record_set_int(raw, CALENDAR_BOOK_MODE, isReadOnly ? 1 : 0), 0);

@@ -21,7 +21,8 @@ public:
     int addEvent(int calendar, const std::string& object);
 
     // A calendar of the store, made as another program would.
-    static int addCalendar(int account, const char* name, bool isReadOnly = false);
+    static int addCalendar(int account, const char* name, bool isReadOnly = false, int storeType = 1);
+    static int addTaskList(int account, const char* name) { return addCalendar(account, name, false, 2); }
 
 private:
     TestRoot mRoot;

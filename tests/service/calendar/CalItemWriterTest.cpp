@@ -244,8 +244,8 @@ TEST(CalLocalChanges, AreFoundOnceAndTheSyncsOwnNever) {
         std::list<int> deleted;
         ASSERT_EQ(device.manager.getAllDirtyEventIds(kCalendarUri, &dirty), 0);
         ASSERT_EQ(device.manager.getAllDeletedEventIds(kCalendarUri, &deleted), 0);
-        EXPECT_THAT(dirty,
-                    testing::UnorderedElementsAre(added, device.row("a").event_id, instanceRow(device, 3).event_id))
+        EXPECT_THAT(dirty, testing::UnorderedElementsAre(added, device.row("a").event_id,
+                                                         instanceRow(device, 3).event_id))
             << "a series is not changed by its instance";
         EXPECT_THAT(deleted, ElementsAre(device.row("b").event_id));
         EXPECT_EQ(device.rowCount(), 5U);

@@ -234,7 +234,7 @@ std::string eventBody(calendar_record_h record) {
     return bodyOf([record](CalJsonBuilder& builder) { return builder.addEvent(record); });
 }
 
-std::string exceptionBody(calendar_record_h record, const std::string& seriesUri) {
+std::string convertException2Json(calendar_record_h record, const std::string& seriesUri) {
     return bodyOf([&](CalJsonBuilder& builder) { return builder.addException(record, seriesUri); });
 }
 

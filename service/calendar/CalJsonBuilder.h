@@ -33,7 +33,7 @@ namespace cal_json {
 
 // Bodies as text, empty when the record cannot be read.
 [[nodiscard]] std::string eventBody(calendar_record_h record);
-[[nodiscard]] std::string exceptionBody(calendar_record_h record, const std::string& seriesUri);
+[[nodiscard]] std::string convertException2Json(calendar_record_h record, const std::string& seriesUri);
 [[nodiscard]] std::string todoBody(calendar_record_h record);
 // An event's body without the name of its time zone, which servers fill in on their own.
 [[nodiscard]] std::string comparableEventBody(calendar_record_h record);

@@ -83,7 +83,7 @@ void CalUploader::sendInstances(Row& series, calendar_record_h record) {
 void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, calendar_record_h child) {
     const bool hasOwnUri = !row.uri.empty() && row.uri != series.uri;
     const std::string uri = hasOwnUri ? row.uri : instanceUri(series.uri, row.recurrence_id);
-    const std::string body = cal_json::exceptionBody(child, series.uri);
+    const std::string body = cal_json::convertException2Json(child, series.uri);
     if (body.empty()) {
         UpReply unreadable;
         unreadable.reason = "the instance cannot be written as JSON";

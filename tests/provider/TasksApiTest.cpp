@@ -4,15 +4,15 @@
 namespace provider {
 namespace {
 
-constexpr const char* kTasks = "/tasks/v1/lists/work/tasks";
-constexpr const char* kUpdate = "/tasks/v3/list/work/tasks/";
+constexpr const char* kTasks = "/tasks/v1/lists/errands/tasks";
+constexpr const char* kUpdate = "/tasks/v3/list/errands/tasks/";
 
 class Tasks : public ProviderFixture {
 protected:
     Tasks() {
         const auto lock = mServer.store().guard();
         mServer.store().addTaskList(mServer.store().account("a@x.example"),
-                                    {{"id", "work"}, {"title", "Work"}});
+                                    {{"id", "errands"}, {"title", "Work"}});
     }
     Json add(const Json& body) {
         const Answer answer = send("POST", kTasks, body.dump());
@@ -78,7 +78,7 @@ TEST_F(Tasks, MalformedRequestsFailLoudly) {
         {"POST", kTasks, "[]", 400},
         {"POST", "/tasks/v1/lists/none/tasks", R"({"title": "a"})", 404},
         {"PATCH", task, R"({"title": "b"})", 405},  // updates have a path of their own
-        {"PATCH", "/tasks/v3/lists/work/tasks/" + id, R"({"title": "b"})", 404},
+        {"PATCH", "/tasks/v3/lists/errands/tasks/" + id, R"({"title": "b"})", 404},
         {"PATCH", kUpdate + id, R"({"status": null, "notes": 1})", 400},
         {"PATCH", std::string(kUpdate) + "none", R"({"title": "b"})", 404},
         {"GET", std::string(kTasks) + "/none", "", 404},

@@ -153,13 +153,13 @@ TEST(CalJsonBuilder, AnInstanceNamesItsSeriesAndItsPlace) {
     for (const auto& [id, start] : {std::pair("20260301T080000Z", R"({"dateTime":"2026-03-01T08:00:00Z"})"),
                                     {"20260301", R"({"date":"2026-03-01"})"}}) {
         set(event, CALENDAR_EVENT_RECURRENCE_ID, id);
-        const Json body = Json::parse(cal_json::exceptionBody(event.get(), "series-1"));
+        const Json body = Json::parse(cal_json::convertException2Json(event.get(), "series-1"));
         EXPECT_EQ(body["recurringEventId"], "series-1");
         EXPECT_EQ(body["originalStartTime"].dump(), start);
     }
     for (const char* wrong : {"", "soon", "20261301", "20260301T08"}) {
         set(event, CALENDAR_EVENT_RECURRENCE_ID, wrong);
-        EXPECT_EQ(cal_json::exceptionBody(event.get(), "series-1"), "") << wrong;
+        EXPECT_EQ(cal_json::convertException2Json(event.get(), "series-1"), "") << wrong;
     }
 }
 

@@ -5,20 +5,13 @@
 
 #include "Failure.h"
 #include "platform/calendar.h"
+#include "platform/calendar_read.h"
 
 namespace record_access {
 
-inline int intOf(calendar_record_h record, unsigned property) {
-    int value = 0;
-    return calendar_record_get_int(record, property, &value) == PLATFORM_ERROR_NONE ? value : 0;
-}
-
-inline std::string textOf(calendar_record_h record, unsigned property) {
-    const char* value = nullptr;
-    if (calendar_record_get_str_p(record, property, &value) != PLATFORM_ERROR_NONE || value == nullptr)
-        return {};
-    return value;
-}
+using calendar_read::forEachChild;
+using calendar_read::intOf;
+using calendar_read::textOf;
 
 inline calendar_time_s timeOf(calendar_record_h record, unsigned property) {
     calendar_time_s value;
@@ -46,26 +39,10 @@ inline CalendarRecord create(const char* view) {
     return CalendarRecord(record);
 }
 
-// Calls `use` for each child, in order.
-template <class Use>
-void forEachChild(calendar_record_h record, unsigned property, Use use) {
-    unsigned count = 0;
-    if (calendar_record_get_child_record_count(record, property, &count) != PLATFORM_ERROR_NONE) return;
-    for (unsigned index = 0; index < count; ++index) {
-        calendar_record_h child = nullptr;
-        if (calendar_record_get_child_record_at_p(record, property, index, &child) == PLATFORM_ERROR_NONE)
-            use(child);
-    }
-}
-
 // Calls `use` for each record of a list, in order.
 template <class Use>
 void forEach(const CalendarList& list, Use use) {
-    for (int code = calendar_list_first(list.get()); code == PLATFORM_ERROR_NONE;
-         code = calendar_list_next(list.get())) {
-        calendar_record_h record = nullptr;
-        if (calendar_list_get_current_record_p(list.get(), &record) == PLATFORM_ERROR_NONE) use(record);
-    }
+    calendar_read::forEach(list.get(), use);
 }
 
 }  // namespace record_access

@@ -76,8 +76,7 @@ const Task& TaskList::insert(const Json& body, bool canName) {
     }
     if (find(taskId) != nullptr)
         throw ApiError{409, "duplicate", "The requested identifier already exists.", "id"};
-    auto task = std::make_unique<Task>();
-    task->id = taskId;
+    auto task = std::make_unique<Task>(taskId);
     store(*task, body);
     return *mTasks.emplace_back(std::move(task));
 }
@@ -105,9 +104,8 @@ const Task& TaskList::get(const std::string& taskId) const {
 }
 
 void TaskList::put(const Json& body) {
-    auto task = std::make_unique<Task>();
     if (!body.contains("id") || !body["id"].is_string()) invalid("id", "must be a string");
-    task->id = body["id"].get<std::string>();
+    auto task = std::make_unique<Task>(body["id"].get<std::string>());
     task->body = body;
     if (!task->body.contains("etag")) store(*task, body);
     mTasks.push_back(std::move(task));

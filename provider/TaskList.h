@@ -12,6 +12,8 @@
 namespace provider {
 
 struct Task {
+    explicit Task(std::string taskId) : id(std::move(taskId)) {}
+
     std::string id;
     Json body;  // as it is shown
     bool isDeleted = false;

@@ -2,11 +2,11 @@
 
 #include <algorithm>
 
-#include "calendar/CalRecordAccess.h"
 #include "common/SyncLog.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
-using cal_record::textOf;
+using calendar_read::intOf;
+using calendar_read::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 
@@ -28,7 +28,7 @@ int readRecordStates(const CalItemKind& kind, int bookId, std::unordered_map<int
         return kFailed;
     }
     const CalendarList list(rawList);
-    cal_record::forEach(list.get(), [&kind, states](calendar_record_h record) {
+    calendar_read::forEach(list.get(), [&kind, states](calendar_record_h record) {
         CalRecordState state;
         state.version = intOf(record, kind.version);
         state.ownVersion = intOf(record, kind.ownVersion);
@@ -55,7 +55,7 @@ int readUnseenDeletions(const CalItemKind& kind, const CalBookMetaData& book,
         return kFailed;
     }
     const CalendarList list(rawList);
-    cal_record::forEach(list.get(), [eventIds](calendar_record_h record) {
+    calendar_read::forEach(list.get(), [eventIds](calendar_record_h record) {
         const bool deleted = intOf(record, CALENDAR_UPDATED_INFO_MODIFIED_STATUS) == RECORD_DELETED;
         const bool own = intOf(record, CALENDAR_UPDATED_INFO_SYNCED_VERSION) ==
                          intOf(record, CALENDAR_UPDATED_INFO_VERSION);

@@ -3,12 +3,12 @@
 #include <map>
 
 #include "calendar/CalManager.h"
-#include "calendar/CalRecordAccess.h"
 #include "calendar/CalTransaction.h"
 #include "common/SyncLog.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
-using cal_record::textOf;
+using calendar_read::intOf;
+using calendar_read::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 
@@ -68,7 +68,7 @@ int readBooks(const CalItemKind& kind, int accountId, std::map<int, std::string>
         return kFailed;
     }
     const CalendarList list(rawList);
-    cal_record::forEach(rawList, [books](calendar_record_h record) {
+    calendar_read::forEach(rawList, [books](calendar_record_h record) {
         books->emplace(intOf(record, CALENDAR_BOOK_ID), textOf(record, CALENDAR_BOOK_SYNC_DATA1));
     });
     return kOk;

@@ -3,10 +3,10 @@
 #include <utility>
 
 #include "calendar/CalItemWriter.h"
-#include "calendar/CalRecordAccess.h"
 #include "common/SyncLog.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
+using calendar_read::intOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 

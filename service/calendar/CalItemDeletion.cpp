@@ -26,25 +26,25 @@ std::vector<CalEventMetaData> CalItemWriter::unlisted() const {
     return rows;
 }
 
+void CalItemWriter::logKept(const CalEventMetaData& row) const {
+    SYNC_ERR(
+        "%s(%s) is no longer on the server but was changed on the device, it stays until that has been sent",
+        mpSnapshot->kind().itemName, row.uri.c_str());
+}
+
 // The unlisted rows that may go now. A change that the device has not sent yet keeps its item: the upload finds out that the
 // server has it no more, and the download after it lets it go.
 std::vector<CalEventMetaData> CalItemWriter::deletable() const {
     std::vector<CalEventMetaData> gone;
     std::unordered_set<int> keptSeries;
     const std::vector<CalEventMetaData> rows = unlisted();
-    const auto keep = [this](const CalEventMetaData& row) {
-        SYNC_ERR(
-            "%s(%s) is no longer on the server but was changed on the device, it stays until that has "
-            "been sent",
-            mpSnapshot->kind().itemName, row.uri.c_str());
-    };
     for (const CalEventMetaData& row : rows) {
         const bool deletedHere = row.deleted != 0 || mpSnapshot->record(row.event_id) == nullptr;
         if (row.original_event_id != 0) continue;
         if (!deletedHere && (mpSnapshot->hasLocalChange(row) || mpSnapshot->hasUnseenChange(row) ||
                              mpSnapshot->hasChangedInstance(row.event_id))) {
             keptSeries.insert(row.event_id);
-            keep(row);
+            logKept(row);
         } else {
             gone.push_back(row);
         }
@@ -55,7 +55,7 @@ std::vector<CalEventMetaData> CalItemWriter::deletable() const {
         // Instances go with their series.
         if (row.original_event_id == 0 || goneSeries.contains(row.original_event_id)) continue;
         if (keptSeries.contains(row.original_event_id) || mpSnapshot->hasLocalChange(row)) {
-            keep(row);
+            logKept(row);
         } else {
             gone.push_back(row);
         }

@@ -3,11 +3,11 @@
 #include "calendar/CalJsonBuilder.h"
 #include "calendar/CalJsonParser.h"
 #include "calendar/CalMappings.h"
-#include "calendar/CalRecordAccess.h"
 #include "common/SyncResult.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
-using cal_record::textOf;
+using calendar_read::intOf;
+using calendar_read::textOf;
 
 // Through the record and back, so that defaults and spellings of the server do not matter.
 std::string CalItemKind::comparable(JsonObject* item) const {

@@ -3,11 +3,11 @@
 #include <utility>
 
 #include "calendar/CalJsonParser.h"
-#include "calendar/CalRecordAccess.h"
 #include "calendar/CalSeriesDates.h"
 #include "calendar/CalTransaction.h"
 #include "calendar/CalWriteBack.h"
 #include "common/SyncLog.h"
+#include "platform/calendar_read.h"
 
 using sync_result::kFailed;
 using sync_result::kOk;
@@ -52,7 +52,7 @@ public:
                          mItems[i]->row.uri.c_str());
                 skipped->insert(mItems[i]);
             } else {
-                use(mItems[i], mIds[i] != 0 ? mIds[i] : cal_record::intOf(mRecords[i], idProperty));
+                use(mItems[i], mIds[i] != 0 ? mIds[i] : calendar_read::intOf(mRecords[i], idProperty));
             }
         }
     }

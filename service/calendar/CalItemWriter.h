@@ -67,6 +67,7 @@ private:
     [[nodiscard]] int writeSeriesVersions(const CalPagePlan& plan, const Batch& batch);
     void remember(const CalPagePlan& plan, const Batch& batch);
     [[nodiscard]] int expectedSeriesVersion(int seriesId) const;
+    void logKept(const CalEventMetaData& row) const;
     [[nodiscard]] std::vector<CalEventMetaData> deletable() const;
     [[nodiscard]] int deleteRecords(std::vector<CalEventMetaData>* gone, Batch* batch);
     [[nodiscard]] int deleteRows(const std::vector<CalEventMetaData>& gone, const Batch& batch);

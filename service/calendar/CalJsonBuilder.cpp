@@ -4,14 +4,14 @@
 #include <optional>
 
 #include "calendar/CalMappings.h"
-#include "calendar/CalRecordAccess.h"
 #include "calendar/CalRecurrence.h"
 #include "calendar/CalTime.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
-using cal_record::textOf;
+using calendar_read::intOf;
+using calendar_read::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 
@@ -64,9 +64,18 @@ std::string bodyOf(Add add) {
     return add(builder) == kOk ? builder.object().getJsonString() : std::string();
 }
 
+// NULL when it cannot be read.
+const char* emailOf(calendar_record_h attendee) {
+    const char* email = nullptr;
+    if (calendar_record_get_str_p(attendee, CALENDAR_ATTENDEE_EMAIL, &email) == PLATFORM_ERROR_NONE)
+        return email;
+    SYNC_ERR("calendar_record_get_str_p() faield");
+    return nullptr;
+}
+
 }  // namespace
 
-int CalJsonBuilder::addEvent(calendar_record_h record) {
+int CalJsonBuilder::begin(calendar_record_h record) {
     if (record == nullptr) {
         SYNC_ERR("record is null");
         return kFailed;
@@ -75,6 +84,11 @@ int CalJsonBuilder::addEvent(calendar_record_h record) {
         SYNC_ERR("CalJsonObject new fail");
         return kFailed;
     }
+    return kOk;
+}
+
+int CalJsonBuilder::addEvent(calendar_record_h record) {
+    if (begin(record) != kOk) return kFailed;
     addTexts(record, kEventTexts, mObject);
     if (setTime(record, "start", CALENDAR_EVENT_START) != kOk ||
         setTime(record, "end", CALENDAR_EVENT_END) != kOk)
@@ -125,14 +139,10 @@ int CalJsonBuilder::setRecurrence(calendar_record_h record) {
 int CalJsonBuilder::setAttendees(calendar_record_h record) {
     std::vector<CalJsonObject> attendees;
     const bool read = forEachChild(record, CALENDAR_EVENT_ATTENDEES, [&attendees](calendar_record_h child) {
-        const char* email = nullptr;
-        if (calendar_record_get_str_p(child, CALENDAR_ATTENDEE_EMAIL, &email) != PLATFORM_ERROR_NONE) {
-            SYNC_ERR("calendar_record_get_str_p() faield");
-            return false;
-        }
+        const char* email = emailOf(child);
         CalJsonObject attendee;
-        if (attendee.initialize() != kOk) return false;
-        if (email != nullptr && *email != '\0') attendee.addStringMember("email", email);
+        if (email == nullptr || attendee.initialize() != kOk) return false;
+        if (*email != '\0') attendee.addStringMember("email", email);
         attendee.addStringMember(
             "responseStatus",
             wordOf(cal_mapping::kResponseStatus, intOf(child, CALENDAR_ATTENDEE_STATUS), "needsAction"));
@@ -180,14 +190,7 @@ int CalJsonBuilder::addException(calendar_record_h record, const std::string& se
 }
 
 int CalJsonBuilder::addTodo(calendar_record_h record) {
-    if (record == nullptr) {
-        SYNC_ERR("record is null");
-        return kFailed;
-    }
-    if (mObject.initialize() != kOk) {
-        SYNC_ERR("CalJsonObject new fail");
-        return kFailed;
-    }
+    if (begin(record) != kOk) return kFailed;
     addTexts(record, kTodoTexts, mObject);
     const int status = intOf(record, CALENDAR_TODO_STATUS);
     mObject.addStringMember("status",

@@ -20,6 +20,8 @@ public:
     [[nodiscard]] CalJsonObject& object() { return mObject; }
 
 private:
+    // An empty body for the record.
+    [[nodiscard]] int begin(calendar_record_h record);
     [[nodiscard]] int setTime(calendar_record_h record, const char* name, unsigned property);
     [[nodiscard]] int setRecurrence(calendar_record_h record);
     [[nodiscard]] int setAttendees(calendar_record_h record);

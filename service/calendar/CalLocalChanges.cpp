@@ -6,12 +6,12 @@
 #include <unordered_map>
 
 #include "calendar/CalManager.h"
-#include "calendar/CalRecordAccess.h"
 #include "common/SyncLog.h"
 #include "common/SyncService.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
-using cal_record::textOf;
+using calendar_read::intOf;
+using calendar_read::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 

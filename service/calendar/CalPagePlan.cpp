@@ -22,11 +22,9 @@ public:
         for (const CalListInfoPtr& entry : entries) {
             ExceptionInfo info;
             JsonObject* json = jsonObjectOf(entry->json);
-            if (!mKind.hasSeries()) {
-                planEvent(entry);
-            } else if (json == nullptr) {
+            if (mKind.hasSeries() && json == nullptr) {
                 SYNC_ERR("%s", mKind.texts.notJson);
-            } else if (CalJsonParser::checkException(json, &info) != kOk) {
+            } else if (mKind.hasSeries() && CalJsonParser::checkException(json, &info) != kOk) {
                 SYNC_ERR("checkException fail");
                 SYNC_ERR("event(%s) is left out", entry->id.c_str());
             } else if (info.kind == ExceptionKind::kOrdinary) {

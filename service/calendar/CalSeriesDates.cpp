@@ -3,20 +3,20 @@
 #include <span>
 
 #include "calendar/CalExceptionDates.h"
-#include "calendar/CalRecordAccess.h"
 #include "platform/calendar.h"
+#include "platform/calendar_read.h"
 
 int changeExceptionDates(int seriesEventId, const std::vector<std::pair<std::string, bool>>& changes,
                          int expectedVersion, int* version) {
     *version = 0;
     CalendarList list;
     calendar_record_h series = nullptr;
-    if (const int code = cal_record::readPart(_calendar_event, CALENDAR_EVENT_ID, seriesEventId,
-                                              {CALENDAR_EVENT_ID, CALENDAR_EVENT_EXDATE}, &list, &series);
+    if (const int code = calendar_read::readPart(_calendar_event, CALENDAR_EVENT_ID, seriesEventId,
+                                                 {CALENDAR_EVENT_ID, CALENDAR_EVENT_EXDATE}, &list, &series);
         code != PLATFORM_ERROR_NONE)
         return code;
 
-    const std::string before = cal_record::textOf(series, CALENDAR_EVENT_EXDATE);
+    const std::string before = calendar_read::textOf(series, CALENDAR_EVENT_EXDATE);
     std::string dates = before;
     for (const auto& [recurrenceId, cancelled] : changes) {
         dates = cancelled ? exception_dates::with(dates, recurrenceId)

@@ -4,12 +4,12 @@
 
 #include "calendar/CalExceptionDates.h"
 #include "calendar/CalJsonBuilder.h"
-#include "calendar/CalRecordAccess.h"
 #include "calendar/CalUploader.h"
 #include "common/SyncLog.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
-using cal_record::textOf;
+using calendar_read::intOf;
+using calendar_read::textOf;
 using sync_result::kOk;
 
 namespace {
@@ -21,21 +21,9 @@ std::string instanceUri(const std::string& seriesUri, const std::string& recurre
 // The exceptions of a record by their ids.
 std::map<int, calendar_record_h> exceptionsOf(calendar_record_h record) {
     std::map<int, calendar_record_h> children;
-    unsigned count = 0;
-    if (calendar_record_get_child_record_count(record, CALENDAR_EVENT_EXCEPTIONS, &count) !=
-        PLATFORM_ERROR_NONE) {
-        SYNC_ERR("getExceptionEvent fail");
-        return children;
-    }
-    for (unsigned i = 0; i < count; ++i) {
-        calendar_record_h child = nullptr;
-        if (calendar_record_get_child_record_at_p(record, CALENDAR_EVENT_EXCEPTIONS, i, &child) !=
-            PLATFORM_ERROR_NONE) {
-            SYNC_ERR("get child fail[%u]", i);
-            continue;
-        }
+    calendar_read::forEachChild(record, CALENDAR_EVENT_EXCEPTIONS, [&children](calendar_record_h child) {
         children.emplace(intOf(child, CALENDAR_EVENT_ID), child);
-    }
+    });
     return children;
 }
 

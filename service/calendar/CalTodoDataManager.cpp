@@ -5,8 +5,8 @@
 
 #include "calendar/CalItemWriter.h"
 #include "calendar/CalJsonBuilder.h"
-#include "calendar/CalRecordAccess.h"
 #include "common/SyncLog.h"
+#include "platform/calendar_read.h"
 
 using sync_result::kFailed;
 using sync_result::kOk;
@@ -56,7 +56,7 @@ bool CalTodoDataManager::isBookChanged(int accountId, const CalListInfo& entry) 
         return true;
     }
     const CalendarRecord record(raw);
-    return cal_record::textOf(raw, CALENDAR_BOOK_NAME) != entry.summary;
+    return calendar_read::textOf(raw, CALENDAR_BOOK_NAME) != entry.summary;
 }
 
 int CalTodoDataManager::deleteBookRows(CalItemStore& store, int /*accountId*/,

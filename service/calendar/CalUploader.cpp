@@ -4,12 +4,12 @@
 #include <utility>
 
 #include "calendar/CalItemWriter.h"
-#include "calendar/CalRecordAccess.h"
 #include "calendar/CalTransaction.h"
 #include "common/PageReader.h"
 #include "common/SyncLog.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
+using calendar_read::intOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 using sync_result::kStopped;

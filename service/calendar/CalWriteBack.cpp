@@ -2,8 +2,8 @@
 
 #include <vector>
 
-#include "calendar/CalRecordAccess.h"
 #include "common/SyncResult.h"
+#include "platform/calendar_read.h"
 
 using sync_result::kOk;
 
@@ -12,7 +12,7 @@ bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* it
     properties.insert(properties.end(), kind.serverFields.begin(), kind.serverFields.end());
     CalendarList list;
     calendar_record_h record = nullptr;
-    const int found = cal_record::readPart(kind.view, kind.id, sent.itemId, properties, &list, &record);
+    const int found = calendar_read::readPart(kind.view, kind.id, sent.itemId, properties, &list, &record);
     if (found == PLATFORM_ERROR_NOT_FOUND) return true;
     const auto set = [record](unsigned property, const std::string& text) {
         return calendar_record_set_str(record, property, text.c_str()) == PLATFORM_ERROR_NONE;

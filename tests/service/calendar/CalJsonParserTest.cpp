@@ -8,12 +8,12 @@
 
 #include "calendar/CalJsonParser.h"
 #include "calendar/CalMappings.h"
-#include "calendar/CalRecordAccess.h"
 #include "calendar/CalTime.h"
 #include "common/SyncResult.h"
+#include "platform/calendar_read.h"
 
-using cal_record::intOf;
-using cal_record::textOf;
+using calendar_read::intOf;
+using calendar_read::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 

@@ -6,8 +6,8 @@
 #include <cstdio>
 
 #include "calendar/CalJsonParser.h"
-#include "calendar/CalRecordAccess.h"
 #include "common/SyncResult.h"
+#include "platform/calendar_read.h"
 
 using sync_result::kOk;
 
@@ -105,8 +105,8 @@ std::vector<std::string> CalendarFixture::summaries() {
     EXPECT_EQ(calendar_db_get_all_records(_calendar_event, 0, 0, &raw), PLATFORM_ERROR_NONE);
     const CalendarList list(raw);
     std::vector<std::string> texts;
-    cal_record::forEach(raw, [&texts](calendar_record_h record) {
-        texts.push_back(cal_record::textOf(record, CALENDAR_EVENT_SUMMARY));
+    calendar_read::forEach(raw, [&texts](calendar_record_h record) {
+        texts.push_back(calendar_read::textOf(record, CALENDAR_EVENT_SUMMARY));
     });
     std::sort(texts.begin(), texts.end());
     return texts;
@@ -122,8 +122,8 @@ CalendarRecord CalendarFixture::record(const std::string& uid) {
     const CalendarList list(rawList);
     int id = 0;
     int count = 0;
-    cal_record::forEach(rawList, [&](calendar_record_h found) {
-        id = cal_record::intOf(found, CALENDAR_EVENT_ID);
+    calendar_read::forEach(rawList, [&](calendar_record_h found) {
+        id = calendar_read::intOf(found, CALENDAR_EVENT_ID);
         ++count;
     });
     EXPECT_LE(count, 1) << uid << " is there more than once";
@@ -135,12 +135,12 @@ CalendarRecord CalendarFixture::record(const std::string& uid) {
 
 std::string CalendarFixture::text(const std::string& uid, unsigned property) {
     const CalendarRecord found = record(uid);
-    return found ? cal_record::textOf(found.get(), property) : "(no record)";
+    return found ? calendar_read::textOf(found.get(), property) : "(no record)";
 }
 
 int CalendarFixture::number(const std::string& uid, unsigned property) {
     const CalendarRecord found = record(uid);
-    return found ? cal_record::intOf(found.get(), property) : -1;
+    return found ? calendar_read::intOf(found.get(), property) : -1;
 }
 
 CalEventMetaData CalendarFixture::row(const std::string& uri) {

@@ -1,5 +1,5 @@
 // Short reads of calendar records for code that knows its properties: a read that the store refuses (a property of another
-// view) is a fault of this program and yields the type's empty value.
+// view) is a fault of the caller and yields the type's empty value.
 #pragma once
 
 #include <string>
@@ -7,7 +7,7 @@
 
 #include "platform/calendar.h"
 
-namespace cal_record {
+namespace calendar_read {
 
 inline int intOf(calendar_record_h record, unsigned property) {
     int value = 0;
@@ -21,7 +21,19 @@ inline std::string textOf(calendar_record_h record, unsigned property) {
     return value;
 }
 
-// Calls `use` for each record of a list.
+// Calls `use` for each child, in order.
+template <class Use>
+void forEachChild(calendar_record_h record, unsigned property, Use use) {
+    unsigned count = 0;
+    if (calendar_record_get_child_record_count(record, property, &count) != PLATFORM_ERROR_NONE) return;
+    for (unsigned index = 0; index < count; ++index) {
+        calendar_record_h child = nullptr;
+        if (calendar_record_get_child_record_at_p(record, property, index, &child) == PLATFORM_ERROR_NONE)
+            use(child);
+    }
+}
+
+// Calls `use` for each record of a list, in order.
 template <class Use>
 void forEach(calendar_list_h list, Use use) {
     for (int code = calendar_list_first(list); code == PLATFORM_ERROR_NONE; code = calendar_list_next(list)) {
@@ -47,4 +59,4 @@ inline int readPart(const char* view, unsigned idProperty, int id, const std::ve
     return calendar_list_get_current_record_p(rawList, record);
 }
 
-}  // namespace cal_record
+}  // namespace calendar_read

@@ -14,7 +14,7 @@ endif()
 # vps_add_test(NAME SOURCES ... LIBS ...): one GoogleTest program, each of its cases a CTest test.
 include(GoogleTest)
 function(vps_add_test name)
-    cmake_parse_arguments(ARG "" "TIMEOUT" "SOURCES;LIBS" ${ARGN})
+    cmake_parse_arguments(ARG "" "TIMEOUT;TSAN_SUPPRESSIONS" "SOURCES;LIBS" ${ARGN})
     add_executable(${name} ${ARG_SOURCES})
     target_link_libraries(${name} PRIVATE vps_options ${ARG_LIBS} GTest::gmock GTest::gtest_main)
     # Tests are small and many; optimising their templates would take most of a build's time.
@@ -22,7 +22,10 @@ function(vps_add_test name)
     if(NOT ARG_TIMEOUT)
         set(ARG_TIMEOUT 120)
     endif()
+    if(NOT ARG_TSAN_SUPPRESSIONS)
+        set(ARG_TSAN_SUPPRESSIONS tsan.supp)
+    endif()
     # Libraries that were not built for the thread sanitizer have locks that it cannot see.
     gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 PROPERTIES TIMEOUT ${ARG_TIMEOUT}
-                         ENVIRONMENT "TSAN_OPTIONS=suppressions=${CMAKE_SOURCE_DIR}/tests/tsan.supp")
+                         ENVIRONMENT "TSAN_OPTIONS=suppressions=${CMAKE_SOURCE_DIR}/tests/${ARG_TSAN_SUPPRESSIONS}")
 endfunction()

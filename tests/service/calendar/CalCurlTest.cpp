@@ -62,6 +62,8 @@ public:
         });
         mPort = mServer.bind_to_any_port("127.0.0.1");
         mThread = std::thread([this] { mServer.listen_after_bind(); });
+        // A stop that comes before the server runs is lost.
+        while (!mServer.is_running()) std::this_thread::yield();
     }
     ~ScriptedServer() {
         mServer.stop();

@@ -50,6 +50,7 @@ SyncWorker::SyncWorker() {
 }
 
 void SyncWorker::initialize() {
+    (void)g_main_context_default();  // answers come on it, and it is made by the thread that runs it
     mpContext = g_main_context_new();
     SYNC_ASSERT_TEXT(mpContext != nullptr, "mpContext");
     mpLoop = g_main_loop_new(mpContext, FALSE);

@@ -103,6 +103,15 @@ constexpr Property kInfoProperties[] = {
     {CALENDAR_UPDATED_INFO_SYNCED_VERSION, Type::kInt, nullptr},
 };
 
+constexpr View kInfo{.uri = _calendar_updated_info, .role = Role::kInfo, .properties = kInfoProperties};
+
+constexpr FeedShape kFeed{.view = &kInfo,
+                          .id = CALENDAR_UPDATED_INFO_ID,
+                          .book = CALENDAR_UPDATED_INFO_BOOK_ID,
+                          .change = CALENDAR_UPDATED_INFO_MODIFIED_STATUS,
+                          .version = CALENDAR_UPDATED_INFO_VERSION,
+                          .syncedVersion = CALENDAR_UPDATED_INFO_SYNCED_VERSION};
+
 constexpr View kBook{.uri = _calendar_book,
                      .role = Role::kBook,
                      .table = "books",
@@ -118,6 +127,7 @@ constexpr View kEvent{.uri = _calendar_event,
                       .bookView = _calendar_book,
                       .bookTypeProperty = CALENDAR_BOOK_STORE_TYPE,
                       .bookType = 1,
+                      .feed = &kFeed,
                       .seriesProperty = CALENDAR_EVENT_ORIGINAL_EVENT_ID,
                       .instanceProperty = CALENDAR_EVENT_RECURRENCE_ID,
                       .exceptionsProperty = CALENDAR_EVENT_EXCEPTIONS,
@@ -131,28 +141,21 @@ constexpr View kTodo{.uri = _calendar_todo,
                      .bookProperty = CALENDAR_TODO_BOOK_ID,
                      .bookView = _calendar_book,
                      .bookTypeProperty = CALENDAR_BOOK_STORE_TYPE,
-                     .bookType = 2};
+                     .bookType = 2,
+                     .feed = &kFeed};
 
 constexpr View kAttendee{
     .uri = _calendar_attendee, .role = Role::kChild, .table = "attendees", .properties = kAttendeeProperties};
 constexpr View kAlarm{
     .uri = _calendar_alarm, .role = Role::kChild, .table = "alarms", .properties = kAlarmProperties};
-constexpr View kInfo{.uri = _calendar_updated_info, .role = Role::kInfo, .properties = kInfoProperties};
 
 // The position of a view is its bit in the notes of who wrote what: add at the end only.
 constexpr const View* kViews[] = {&kBook, &kEvent, &kTodo, &kAttendee, &kAlarm, &kInfo};
 
-constexpr FeedShape kFeed{.view = &kInfo,
-                          .id = CALENDAR_UPDATED_INFO_ID,
-                          .book = CALENDAR_UPDATED_INFO_BOOK_ID,
-                          .change = CALENDAR_UPDATED_INFO_MODIFIED_STATUS,
-                          .version = CALENDAR_UPDATED_INFO_VERSION,
-                          .syncedVersion = CALENDAR_UPDATED_INFO_SYNCED_VERSION};
-
 }  // namespace
 
 Store& calendarStore() {
-    static Store* const store = new Store("/opt/usr/data/records/calendar.db", kViews, kFeed);
+    static Store* const store = new Store("/opt/usr/data/records/calendar.db", kViews);
     return *store;
 }
 

@@ -35,8 +35,8 @@ std::unordered_map<const Store*, int>& lastVersions() {
     return versions;
 }
 
-Store::Store(const char* file, std::span<const View* const> views, const FeedShape& feed)
-    : mFile(file), mViews(views), mFeed(feed), mWriterId(randomId()) {}
+Store::Store(const char* file, std::span<const View* const> views, const char* filesFolder)
+    : mFile(file), mViews(views), mWriterId(randomId()), mFiles(filesFolder) {}
 
 Store::~Store() = default;
 
@@ -91,8 +91,30 @@ int Store::open() {
     mPath = rootedPath(file);
     if (const int code = mConnection.open(mPath); code != SQLITE_OK) return codeOf(code);
     const int code = makeSchema();
-    if (code != PLATFORM_ERROR_NONE) mConnection.close();
+    if (code != PLATFORM_ERROR_NONE) {
+        mConnection.close();
+        return code;
+    }
+    sweepFiles();
     return code;
+}
+
+void Store::sweepFiles() {
+    std::set<std::string> named;
+    for (const View* view : mViews) {
+        if (view->filesProperty == 0) continue;
+        const View& files = filesOf(*view);
+        Statement statement =
+            mConnection.prepare(std::string("SELECT ") + files.properties[0].column + " FROM " + files.table);
+        int code = statement.step();
+        for (; code == SQLITE_ROW; code = statement.step()) named.insert(statement.text(0));
+        if (code != SQLITE_DONE) return;  // nothing is removed on half a look
+    }
+    mFiles.sweep(named);
+}
+
+const View& Store::filesOf(const View& view) const {
+    return *viewOf(view.properties[static_cast<size_t>(view.indexOf(view.filesProperty))].childView);
 }
 
 int Store::makeSchema() {
@@ -141,6 +163,7 @@ std::string Store::tableText(const View& view) const {
         text +=
             ", created_version INTEGER NOT NULL, version INTEGER NOT NULL, synced_version INTEGER NOT NULL, "
             "own_version INTEGER NOT NULL";
+    if (view.filesProperty != 0) text += ", files_version INTEGER NOT NULL DEFAULT 0";
     for (const Property& property : view.properties) {
         if (property.column != nullptr && !property.readOnly) {
             text += std::string(", ") + property.column + " " + sqlType(property.type) + " NOT NULL";
@@ -158,6 +181,13 @@ std::string Store::tableText(const View& view) const {
         const std::string series = view.columnOf(view.seriesProperty);
         text += "CREATE UNIQUE INDEX IF NOT EXISTS " + table + "_instance ON " + table + "(" + series + ", " +
                 view.columnOf(view.instanceProperty) + ") WHERE " + series + " <> 0;";
+    }
+    if (view.onDelete != nullptr) {
+        text.append("CREATE TRIGGER IF NOT EXISTS ")
+            .append(table)
+            .append("_gone AFTER DELETE ON ")
+            .append(table);
+        text.append(" BEGIN ").append(view.onDelete).append("; END;");
     }
     // What an item owns goes with it.
     for (const Property& property : view.properties) {
@@ -218,6 +248,7 @@ int Store::end(bool commit) {
     if (commit && !failed) code = codeOf(mConnection.run("COMMIT"));
     if (commit && failed) code = PLATFORM_ERROR_FAILED;
     if (mConnection.inTransaction()) (void)mConnection.run("ROLLBACK");
+    commit&& code == PLATFORM_ERROR_NONE ? mFiles.commit() : mFiles.rollback();
     if (!commit || code != PLATFORM_ERROR_NONE) {
         lastVersions().erase(this);
         if (mVersionBefore) lastVersions()[this] = *mVersionBefore;

@@ -18,6 +18,7 @@
 
 #include "../base/StoreWatch.h"
 #include "Connection.h"
+#include "FileKeep.h"
 #include "Record.h"
 #include "View.h"
 
@@ -26,7 +27,8 @@ namespace platform::records {
 class Store {
 public:
     // `file` is absolute, the root is applied when the store is opened.
-    Store(const char* file, std::span<const View* const> views, const FeedShape& feed);
+    // `filesFolder` is where the files of records are kept, NULL when none has any.
+    Store(const char* file, std::span<const View* const> views, const char* filesFolder = nullptr);
     ~Store();
     Store(const Store&) = delete;
     Store& operator=(const Store&) = delete;
@@ -90,6 +92,9 @@ private:
     // Opening.
     [[nodiscard]] int open();
     [[nodiscard]] int makeSchema();
+    void sweepFiles();
+    // The view of an item's files.
+    [[nodiscard]] const View& filesOf(const View& view) const;
     [[nodiscard]] std::string tableText(const View& view) const;
     [[nodiscard]] int codeOf(int sqliteCode);
 
@@ -110,7 +115,12 @@ private:
         kAlways,
         kIfPresent
     };  // of a new record, of every record, where read or set
-    [[nodiscard]] int writeChildren(Record& record, int id, ChildWrite how);
+    [[nodiscard]] int writeChildren(Record& record, int id, ChildWrite how, int version);
+    // Takes the record's files into the store's keeping where they are not yet, lets go of those that it no longer names, and notes
+    // the version when anything changed.
+    [[nodiscard]] int keepFiles(Record& record, int id, ChildWrite how, int version);
+    // Lets go of the files of the items that `condition` chooses by their id.
+    [[nodiscard]] int dropFiles(const View& view, const std::string& condition, int64_t value);
     [[nodiscard]] int load(const View& view, int id, Stored* stored);
     [[nodiscard]] int check(const View& view, int id, const Stored& stored, int expected);
     [[nodiscard]] int touchSeries(Write& write, const View& view, int seriesId);
@@ -131,11 +141,11 @@ private:
 
     const char* const mFile;
     const std::span<const View* const> mViews;
-    const FeedShape mFeed;
     const int64_t mWriterId;
 
     std::recursive_mutex mMutex;
     std::atomic<std::thread::id> mHolder;  // the thread of the open transaction
+    FileKeep mFiles;                       // guarded by mMutex, as the next ones
     Connection mConnection;                // guarded by mMutex, as all below up to the callbacks
     std::string mPath;
     int mConnects = 0;

@@ -183,7 +183,8 @@ int Store::readChildren(const View& view, const Query& query, const std::string&
 }
 
 int Store::changes(const View& view, int bookId, int since, RecordList* out, int* current) {
-    if (view.role != Role::kItem) return PLATFORM_ERROR_INVALID_PARAMETER;
+    if (view.role != Role::kItem || view.feed == nullptr) return PLATFORM_ERROR_INVALID_PARAMETER;
+    const FeedShape& feed = *view.feed;
     const std::lock_guard lock(mMutex);
     if (!mConnection.isOpen()) return PLATFORM_ERROR_DATABASE;
     const Snapshot snapshot(mConnection);
@@ -194,10 +195,11 @@ int Store::changes(const View& view, int bookId, int since, RecordList* out, int
     const std::string topLevel =
         view.hasSeries() ? std::string(" AND ") + view.columnOf(view.seriesProperty) + " = 0" : "";
     Statement statement = mConnection.prepare(
-        "SELECT id, CASE WHEN created_version > ? THEN 0 ELSE 1 END, version AS changed, synced_version "
-        "FROM " +
-        std::string(view.table) + " WHERE " + book + " = ? AND version > ?" + topLevel +
-        " UNION ALL SELECT id, 2, deleted AS changed, synced FROM tombstones WHERE book = ? AND deleted > ? "
+        "SELECT id, CASE WHEN created_version > ? THEN 0 ELSE 1 END, version AS changed, synced_version, " +
+        std::string(view.filesProperty != 0 ? "files_version" : "0") + " FROM " + std::string(view.table) +
+        " WHERE " + book + " = ? AND version > ?" + topLevel +
+        " UNION ALL SELECT id, 2, deleted AS changed, synced, 0 FROM tombstones WHERE book = ? AND deleted > "
+        "? "
         "AND (created <= ? OR synced <> 0) "
         "AND view = ? ORDER BY changed, id");
     const int64_t from = since;
@@ -207,12 +209,14 @@ int Store::changes(const View& view, int bookId, int since, RecordList* out, int
     RecordList found;
     int code = statement.step();
     for (; code == SQLITE_ROW; code = statement.step()) {
-        auto record = std::make_unique<Record>(*mFeed.view);
-        record->setNumber(mFeed.id, statement.integer(0));
-        record->setNumber(mFeed.book, bookId);
-        record->setNumber(mFeed.change, statement.integer(1));
-        record->setNumber(mFeed.version, statement.integer(2));
-        record->setNumber(mFeed.syncedVersion, statement.integer(3));
+        auto record = std::make_unique<Record>(*feed.view);
+        record->setNumber(feed.id, statement.integer(0));
+        record->setNumber(feed.book, bookId);
+        record->setNumber(feed.change, statement.integer(1));
+        record->setNumber(feed.version, statement.integer(2));
+        record->setNumber(feed.syncedVersion, statement.integer(3));
+        if (feed.filesChanged != 0)
+            record->setNumber(feed.filesChanged, statement.integer(4) > since ? 1 : 0);
         found.records.push_back(record.release());
     }
     if (code != SQLITE_DONE) return codeOf(code);

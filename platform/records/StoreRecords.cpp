@@ -79,6 +79,13 @@ int Store::touchSeries(Write& write, const View& view, int seriesId) {
 
 int Store::checkBook(const View& view, int bookId) {
     const View* books = viewOf(view.bookView);
+    if (view.bookTypeProperty == 0) {
+        Statement statement =
+            mConnection.prepare(std::string("SELECT 1 FROM ") + books->table + " WHERE id = ?");
+        const int code = statement.bind(int64_t{bookId}).step();
+        if (code == SQLITE_ROW) return PLATFORM_ERROR_NONE;
+        return isDone(code) ? PLATFORM_ERROR_INVALID_PARAMETER : codeOf(code);
+    }
     Statement statement =
         mConnection.prepare(std::string("SELECT ") + books->columnOf(view.bookTypeProperty) + " FROM " +
                             books->table + " WHERE id = ?");
@@ -137,12 +144,15 @@ int Store::insertRow(Write& write, Record& record, int bookId) {
     const auto id = static_cast<int>(mConnection.lastRowId());
     record.setNumber(view.idProperty, id);
     mTrusted.insert({&view, id});
-    return writeChildren(record, id, ChildWrite::kFirst);
+    return writeChildren(record, id, ChildWrite::kFirst, write.version());
 }
 
 // Attendees, alarms and the like become those of the record.
-int Store::writeChildren(Record& record, int id, ChildWrite how) {
+int Store::writeChildren(Record& record, int id, ChildWrite how, int version) {
     const View& view = record.view();
+    if (view.filesProperty != 0) {
+        if (const int code = keepFiles(record, id, how, version); code != PLATFORM_ERROR_NONE) return code;
+    }
     for (size_t i = 0; i < view.properties.size(); ++i) {
         const Property& property = view.properties[i];
         if (property.type != Type::kChildren || property.id == view.exceptionsProperty) continue;
@@ -162,6 +172,48 @@ int Store::writeChildren(Record& record, int id, ChildWrite how) {
         }
     }
     return PLATFORM_ERROR_NONE;
+}
+
+int Store::keepFiles(Record& record, int id, ChildWrite how, int version) {
+    const View& view = record.view();
+    const auto index = static_cast<size_t>(view.indexOf(view.filesProperty));
+    if (how == ChildWrite::kIfPresent && !record.isPresent(index)) return PLATFORM_ERROR_NONE;
+    const View& files = filesOf(view);
+    const std::string column = files.properties[0].column;
+    std::set<std::string> before;
+    {
+        Statement statement =
+            mConnection.prepare("SELECT " + column + " FROM " + files.table + " WHERE parent = ?");
+        int code = statement.bind(int64_t{id}).step();
+        for (; code == SQLITE_ROW; code = statement.step()) before.insert(statement.text(0));
+        if (!isDone(code)) return codeOf(code);
+    }
+    bool changed = false;
+    for (const auto& child : record.children(index)) {
+        const std::string path = std::get<std::string>(child->valueAt(0));
+        // A file of its own: what another record names goes with that one.
+        if (before.erase(path) != 0) continue;
+        std::string kept;
+        if (const int code = mFiles.keep(path, &kept); code != PLATFORM_ERROR_NONE) return code;
+        child->setAt(0, kept);
+        changed = true;
+    }
+    for (const std::string& path : before) mFiles.drop(path);
+    if (!changed && before.empty()) return PLATFORM_ERROR_NONE;
+    Statement note =
+        mConnection.prepare(std::string("UPDATE ") + view.table + " SET files_version = ? WHERE id = ?");
+    const int code = note.bind(int64_t{version}).bind(int64_t{id}).step();
+    return isDone(code) ? PLATFORM_ERROR_NONE : codeOf(code);
+}
+
+int Store::dropFiles(const View& view, const std::string& condition, int64_t value) {
+    if (view.filesProperty == 0) return PLATFORM_ERROR_NONE;
+    const View& files = filesOf(view);
+    Statement statement = mConnection.prepare(std::string("SELECT ") + files.properties[0].column + " FROM " +
+                                              files.table + " WHERE parent " + condition);
+    int code = statement.bind(value).step();
+    for (; code == SQLITE_ROW; code = statement.step()) mFiles.drop(statement.text(0));
+    return isDone(code) ? PLATFORM_ERROR_NONE : codeOf(code);
 }
 
 int Store::writeColumns(Write& write, const View& view, int id, const Record& record, bool bySync,
@@ -200,7 +252,7 @@ int Store::updateOne(Write& write, Record& record, int expected) {
             return record.isPresent(i) && !view.isFixed(property.id);
         });
     if (code != PLATFORM_ERROR_NONE) return code;
-    if (const int children = writeChildren(record, id, ChildWrite::kIfPresent);
+    if (const int children = writeChildren(record, id, ChildWrite::kIfPresent, write.version());
         children != PLATFORM_ERROR_NONE) {
         return children;
     }
@@ -252,7 +304,7 @@ int Store::replaceOne(Write& write, Record& record, int id, int expected) {
             return !view.isFixed(property.id) && property.id != view.keptOnReplace;
         });
     if (code != PLATFORM_ERROR_NONE) return code;
-    if (const int children = writeChildren(record, id, ChildWrite::kAlways);
+    if (const int children = writeChildren(record, id, ChildWrite::kAlways, write.version());
         children != PLATFORM_ERROR_NONE) {
         return children;
     }
@@ -270,6 +322,7 @@ int Store::removeOne(Write& write, const View& view, int id, int expected) {
 
 int Store::removeItem(Write& write, const View& view, int id, const Stored& stored) {
     const std::string table = view.table;
+    if (const int code = dropFiles(view, "= ?", id); code != PLATFORM_ERROR_NONE) return code;
     if (stored.seriesId == 0) {
         Statement bury = mConnection.prepare(
             "INSERT INTO tombstones(view, id, book, created, deleted, synced) SELECT ?, id, ?, "
@@ -300,6 +353,9 @@ int Store::removeItem(Write& write, const View& view, int id, const Stored& stor
 int Store::removeBook(Write& write, const View& view, int id) {
     for (const View* items : mViews) {
         if (items->bookProperty == 0 || !isSame(items->bookView, view.uri)) continue;
+        const std::string inBook = std::string("IN (SELECT id FROM ") + items->table + " WHERE " +
+                                   items->columnOf(items->bookProperty) + " = ?)";
+        if (const int code = dropFiles(*items, inBook, id); code != PLATFORM_ERROR_NONE) return code;
         Statement statement = mConnection.prepare(std::string("DELETE FROM ") + items->table + " WHERE " +
                                                   items->columnOf(items->bookProperty) + " = ?");
         if (const int code = statement.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);

@@ -12,7 +12,11 @@ constexpr int kKeptWrites = 4096;
 }  // namespace
 
 Store::Write::Write(Store& store, const record_write_options_s& options)
-    : mStore(store), mOptions(options), mLock(store.mMutex), mNested(store.mDepth > 0) {
+    : mStore(store),
+      mOptions(options),
+      mLock(store.mMutex),
+      mNested(store.mDepth > 0),
+      mFilesBefore(store.mFiles.mark()) {
     if (!mStore.mConnection.isOpen()) {
         mBegun = PLATFORM_ERROR_DATABASE;
         return;
@@ -31,7 +35,9 @@ Store::Write::Write(Store& store, const record_write_options_s& options)
 
 Store::Write::~Write() {
     if (!mNested) mStore.mTrusted.clear();
-    if (mDone || !mStore.mConnection.isOpen() || !mStore.mConnection.inTransaction()) return;
+    if (mDone) return;
+    mStore.mFiles.rollback(mFilesBefore);
+    if (!mStore.mConnection.isOpen() || !mStore.mConnection.inTransaction()) return;
     (void)mStore.mConnection.run(mNested ? "ROLLBACK TO call;RELEASE call" : "ROLLBACK");
 }
 
@@ -73,6 +79,7 @@ int Store::Write::finish(int result) {
     const int ended = mStore.codeOf(connection.run(mNested ? "RELEASE call" : "COMMIT"));
     if (ended != PLATFORM_ERROR_NONE) return ended;
     mDone = true;
+    if (!mNested) mStore.mFiles.commit();
     if (mViews != 0) lastVersions()[&mStore] = mVersion;
     return PLATFORM_ERROR_NONE;
 }

@@ -30,6 +30,7 @@ private:
     const record_write_options_s& mOptions;
     std::unique_lock<std::recursive_mutex> mLock;
     const bool mNested;
+    const FileKeep::Mark mFilesBefore;
     int mBegun;
     int mVersion = 0;
     uint64_t mViews = 0;

@@ -27,6 +27,8 @@ enum class Role {
     kInfo,   // made by the store, in no table
 };
 
+struct FeedShape;
+
 struct View {
     const char* uri;
     Role role;
@@ -37,8 +39,11 @@ struct View {
     // Items.
     unsigned bookProperty = 0;
     const char* bookView = nullptr;
-    unsigned bookTypeProperty = 0;  // of the book's view
-    int bookType = 0;               // the value that a book of these items has there
+    unsigned bookTypeProperty = 0;    // of the book's view
+    int bookType = 0;                 // the value that a book of these items has there
+    const FeedShape* feed = nullptr;  // what its change feed looks like
+    unsigned filesProperty = 0;       // children whose text is the path of a file that the store keeps
+    const char* onDelete = nullptr;   // SQL that goes with the deletion of an item ("old.id")
 
     // Items that may be exceptions of a series of the same view.
     unsigned seriesProperty = 0;
@@ -71,6 +76,7 @@ struct FeedShape {
     unsigned change;
     unsigned version;
     unsigned syncedVersion;
+    unsigned filesChanged = 0;  // 1 when the item's files were written after the version asked for
 };
 
 inline bool isSame(const char* a, const char* b) {

@@ -1,9 +1,9 @@
 #include "calendar/CalBookRows.h"
 
-#include "calendar/CalRowRead.h"
+#include "common/RowRead.h"
 
-using cal_rows::readList;
-using cal_rows::readOne;
+using row_read::readList;
+using row_read::readOne;
 
 namespace {
 

@@ -3,7 +3,7 @@
 #include <cstdlib>
 
 #include "common/JsonAccess.h"
-#include "common/JsonSyntax.h"
+#include "common/JsonText.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 
@@ -81,21 +81,12 @@ JsonObject* CalJsonParser::root() const {
 }
 
 int CalJsonParser::setString(std::string_view body) {
-    if (!json_syntax::isValid(body)) {
+    JsonNodePtr root = json_text::parse(body);
+    if (!root) {
         SYNC_ERR("load fail");
         return kFailed;
     }
-    const JsonParserPtr parser(json_parser_new_immutable());
-    if (!parser) {
-        SYNC_ERR("json_parser_new fail");
-        return kFailed;
-    }
-    if (json_parser_load_from_data(parser.get(), body.data(), static_cast<gssize>(body.size()), nullptr) ==
-        FALSE) {
-        SYNC_ERR("load fail");
-        return kFailed;
-    }
-    mpRoot.reset(json_parser_steal_root(parser.get()));
+    mpRoot = std::move(root);
     return kOk;
 }
 

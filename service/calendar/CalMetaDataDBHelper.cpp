@@ -1,10 +1,10 @@
 #include "calendar/CalMetaDataDBHelper.h"
 
-#include "calendar/CalRowRead.h"
+#include "common/RowRead.h"
 #include "common/SyncLog.h"
 
-using cal_rows::readList;
-using cal_rows::readOne;
+using row_read::readList;
+using row_read::readOne;
 using sync_result::kFailed;
 using sync_result::kOk;
 using Row = SyncDatabase::Row;

@@ -8,30 +8,11 @@
 #include <string>
 #include <vector>
 
+#include "common/HttpTransfer.h"
+
 class Account;
 
 enum class HttpMethod { kGet = 0, kPost = 1, kPatch = 2, kDelete = 3 };
-
-// Asked during transfers whether to go on; non-zero aborts.
-class IProgressObserver {
-public:
-    virtual ~IProgressObserver() = default;
-    virtual int onProgress(double downloadTotal, double downloaded, double uploadTotal, double uploaded) = 0;
-};
-
-// HttpShare: what the easy handles of one worker share (one kept connection per server).
-class HttpShare {
-public:
-    HttpShare();
-    ~HttpShare();
-    HttpShare(const HttpShare&) = delete;
-    HttpShare& operator=(const HttpShare&) = delete;
-    [[nodiscard]] void* handle() const;  // a CURLSH
-
-private:
-    struct State;
-    std::unique_ptr<State> mpState;
-};
 
 class SyncCurl {
 public:
@@ -60,11 +41,6 @@ public:
     [[nodiscard]] const std::string& lastToken() const { return mLastToken; }
 
 private:
-    static int onProgress(void* self, double downloadTotal, double downloaded, double uploadTotal,
-                          double uploaded);
-    void setCommonOptions(void* handle, std::string* reply);
-    void setOwnOptions(void* handle);
-
     Account* mpAccount;
     IProgressObserver* mpProgressObserver;
     std::shared_ptr<HttpShare> mpShare;

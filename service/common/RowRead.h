@@ -3,10 +3,9 @@
 
 #include <string>
 
-#include "calendar/CalMetaData.h"
 #include "common/SyncDatabase.h"
 
-namespace cal_rows {
+namespace row_read {
 
 inline void take(const SyncDatabase::Row& row, int* value) {
     *value = row.integer(0);
@@ -34,4 +33,4 @@ int readList(SyncDatabase& database, std::string_view sql, SyncDatabase::Params 
     return sync_result::kOk;
 }
 
-}  // namespace cal_rows
+}  // namespace row_read

@@ -1,0 +1,56 @@
+// HttpTransfer: one blocking HTTP exchange with libcurl, and what several exchanges share.
+// Threads: one worker per exchange; a share may serve several.
+#pragma once
+
+#include <cstdio>
+#include <memory>
+#include <string>
+#include <vector>
+
+// Asked during transfers whether to go on; non-zero aborts.
+class IProgressObserver {
+public:
+    virtual ~IProgressObserver() = default;
+    virtual int onProgress(double downloadTotal, double downloaded, double uploadTotal, double uploaded) = 0;
+};
+
+// HttpShare: what the easy handles of one worker share (one kept connection per server).
+class HttpShare {
+public:
+    HttpShare();
+    ~HttpShare();
+    HttpShare(const HttpShare&) = delete;
+    HttpShare& operator=(const HttpShare&) = delete;
+    [[nodiscard]] void* handle() const;  // a CURLSH
+
+private:
+    struct State;
+    std::unique_ptr<State> mpState;
+};
+
+// One exchange. Pointers are not owned and may be NULL. Redirects are not followed.
+struct HttpTransfer {
+    static constexpr size_t kMaxReplyBytes = 64UL * 1024 * 1024;
+
+    std::string url;
+    const char* method = "GET";
+    std::vector<std::string> headers = {};
+    const char* body = nullptr;
+    FILE* bodyFile = nullptr;  // sent from its position to its end instead of `body`
+    long bodyFileSize = 0;     // bytes
+
+    std::string* reply = nullptr;  // appended
+    FILE* replyFile = nullptr;     // written instead of `reply`
+    size_t maxReplyBytes = kMaxReplyBytes;
+    bool withReplyHead = false;  // status line and headers go into the reply as well
+
+    long timeout = 30;  // seconds
+    IProgressObserver* observer = nullptr;
+    std::shared_ptr<HttpShare> share = nullptr;
+
+    long status = 0;          // of the answer, 0 without one
+    std::string contentType = {};  // likewise
+
+    // 0 for any HTTP status, else -1, -2 (aborted by the observer) or -3 (time-out). A request that writes goes to the wire once.
+    [[nodiscard]] int perform();
+};

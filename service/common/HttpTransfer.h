@@ -48,7 +48,7 @@ struct HttpTransfer {
     IProgressObserver* observer = nullptr;
     std::shared_ptr<HttpShare> share = nullptr;
 
-    long status = 0;          // of the answer, 0 without one
+    long status = 0;               // of the answer, 0 without one
     std::string contentType = {};  // likewise
 
     // 0 for any HTTP status, else -1, -2 (aborted by the observer) or -3 (time-out). A request that writes goes to the wire once.

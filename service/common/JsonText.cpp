@@ -7,9 +7,8 @@ namespace json_text {
 JsonNodePtr parse(std::string_view text) {
     if (!json_syntax::isValid(text)) return nullptr;
     const JsonParserPtr parser(json_parser_new_immutable());
-    if (!parser ||
-        json_parser_load_from_data(parser.get(), text.data(), static_cast<gssize>(text.size()), nullptr) ==
-            FALSE) {
+    if (!parser || json_parser_load_from_data(parser.get(), text.data(), static_cast<gssize>(text.size()),
+                                              nullptr) == FALSE) {
         return nullptr;
     }
     return JsonNodePtr(json_parser_steal_root(parser.get()));

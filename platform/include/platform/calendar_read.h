@@ -43,20 +43,28 @@ void forEach(calendar_list_h list, Use use) {
 }
 
 // The record with this id and nothing but `properties` of it, so that writing it touches nothing else. It belongs to `list`.
-inline int readPart(const char* view, unsigned idProperty, int id, const std::vector<unsigned>& properties,
-                    CalendarList* list, calendar_record_h* record) {
+// Of the service whose functions are given.
+template <auto CreateQuery, auto GetRecords, class List>
+int readPartFrom(const char* view, unsigned idProperty, int id, const std::vector<unsigned>& properties,
+                 List* list, calendar_record_h* record) {
     calendar_query_h rawQuery = nullptr;
-    if (const int code = calendar_query_create(view, &rawQuery); code != PLATFORM_ERROR_NONE) return code;
+    if (const int code = CreateQuery(view, &rawQuery); code != PLATFORM_ERROR_NONE) return code;
     const CalendarQuery query(rawQuery);
     int code = calendar_query_add_filter_int(rawQuery, idProperty, id);
     if (code == PLATFORM_ERROR_NONE)
         code = calendar_query_set_projection(rawQuery, properties.data(), properties.size());
     calendar_list_h rawList = nullptr;
-    if (code == PLATFORM_ERROR_NONE) code = calendar_db_get_records_with_query(rawQuery, 0, 1, &rawList);
+    if (code == PLATFORM_ERROR_NONE) code = GetRecords(rawQuery, 0, 1, &rawList);
     if (code != PLATFORM_ERROR_NONE) return code;
     list->reset(rawList);
     if (calendar_list_first(rawList) != PLATFORM_ERROR_NONE) return PLATFORM_ERROR_NOT_FOUND;
     return calendar_list_get_current_record_p(rawList, record);
+}
+
+inline int readPart(const char* view, unsigned idProperty, int id, const std::vector<unsigned>& properties,
+                    CalendarList* list, calendar_record_h* record) {
+    return readPartFrom<calendar_query_create, calendar_db_get_records_with_query>(view, idProperty, id,
+                                                                                   properties, list, record);
 }
 
 }  // namespace calendar_read

@@ -1,10 +1,6 @@
 // The REST client against a server that answers from a script.
 #include <gtest/gtest.h>
-#include <httplib.h>
 #include <zlib.h>
-
-#include <atomic>
-#include <thread>
 
 #include "calendar/CalCurl.h"
 #include "common/Account.h"
@@ -13,6 +9,7 @@
 #include "common/UrlText.h"
 #include "platform/keys.h"
 #include "platform/settings.h"
+#include "support/ScriptedServer.h"
 #include "support/TestRoot.h"
 
 using sync_result::kFailed;
@@ -35,54 +32,6 @@ std::string gzip(const std::string& text) {
     deflateEnd(&stream);
     return out;
 }
-
-// Accepts one token; the token endpoint hands it out.
-class ScriptedServer {
-public:
-    ScriptedServer() {
-        mServer.Post("/o/oauth2/token", [this](const httplib::Request& request, httplib::Response& response) {
-            ++refreshes;
-            lastTokenBody = request.body;
-            response.set_content(tokenReply, "application/json");
-        });
-        mServer.set_pre_routing_handler([this](const httplib::Request& request, httplib::Response& response) {
-            if (request.path == "/o/oauth2/token") return httplib::Server::HandlerResponse::Unhandled;
-            ++requests;
-            lastPath = request.target;
-            lastMethod = request.method;
-            if (request.get_header_value("Authorization") != "Bearer good") {
-                response.status = 401;
-                response.set_content(R"({"error":{"code":401}})", "application/json");
-            } else {
-                response.status = status;
-                if (status == 302) response.set_header("Location", "/elsewhere");
-                response.set_content(body, "application/json");
-            }
-            return httplib::Server::HandlerResponse::Handled;
-        });
-        mPort = mServer.bind_to_any_port("127.0.0.1");
-        mThread = std::thread([this] { mServer.listen_after_bind(); });
-        // A stop that comes before the server runs is lost.
-        while (!mServer.is_running()) std::this_thread::yield();
-    }
-    ~ScriptedServer() {
-        mServer.stop();
-        mThread.join();
-    }
-    [[nodiscard]] std::string url() const { return "http://127.0.0.1:" + std::to_string(mPort); }
-
-    std::atomic<int> requests{0};
-    std::atomic<int> refreshes{0};
-    int status = 200;
-    std::string body = "{}";
-    std::string tokenReply = R"({"access_token":"good"})";
-    std::string lastPath, lastMethod, lastTokenBody;
-
-private:
-    httplib::Server mServer;
-    int mPort = 0;
-    std::thread mThread;
-};
 
 struct Client {
     Client() : account(record()) {

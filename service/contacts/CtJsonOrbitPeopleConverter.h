@@ -1,0 +1,16 @@
+// CtJsonOrbitPeopleConverter: a person's public profile. It fills what the contact itself leaves open. Stateless.   Threads: any.
+#pragma once
+
+#include <string>
+
+#include "platform/contacts.h"
+
+class CtJsonOrbitPeopleConverter {
+public:
+    // `peopleBase`: where the default avatar lives. Empty for a profile without an image of its own; -1 for what is no profile.
+    [[nodiscard]] static int getPhotoUrl(const std::string& profile, const std::string& peopleBase,
+                                         std::string* url);
+
+    // Adds name, nickname and birthday where the contact has none. -1 (logged) when that fails.
+    [[nodiscard]] static int convert(const std::string& profile, contacts_record_h contact);
+};

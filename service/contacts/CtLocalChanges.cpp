@@ -1,0 +1,131 @@
+#include "contacts/CtLocalChanges.h"
+
+#include <algorithm>
+#include <unordered_map>
+
+#include "common/SyncLog.h"
+#include "platform/contacts_read.h"
+
+using sync_result::kFailed;
+using sync_result::kOk;
+
+namespace ct_changes {
+
+namespace {
+
+bool readChange(contacts_record_h record, bool hasImage, CtLocalChange* change) {
+    const std::pair<unsigned, int*> fields[] = {
+        {CONTACTS_UPDATED_INFO_ID, &change->itemId},
+        {CONTACTS_UPDATED_INFO_ADDRESS_BOOK_ID, &change->addressBookId},
+        {CONTACTS_UPDATED_INFO_TYPE, &change->type},
+        {CONTACTS_UPDATED_INFO_VERSION, &change->version},
+        {CONTACTS_UPDATED_INFO_SYNCED_VERSION, &change->syncedVersion},
+        {CONTACTS_UPDATED_INFO_IMAGE_CHANGED, &change->imageChanged},
+    };
+    for (const auto& [property, value] : fields) {
+        if (property == CONTACTS_UPDATED_INFO_IMAGE_CHANGED && !hasImage) continue;
+        if (contacts_record_get_int(record, property, value) != PLATFORM_ERROR_NONE) {
+            SYNC_ERR("record_get_int fail");
+            return false;
+        }
+    }
+    return true;
+}
+
+template <class Kind>
+void markOne(CtMetaDataDBHelper& store, int addressBookId, const CtLocalChange& change,
+             typename Kind::Row* known) {
+    if (known != nullptr && known->version == change.version) return;
+    if (change.type == RECORD_DELETED) {
+        if (known != nullptr && Kind::markDeleted(store, change.itemId) != kOk)
+            SYNC_ERR("MetaDB update deleted fail");
+        return;
+    }
+    if (known != nullptr) {
+        known->dirty = 1;
+        known->version = change.version;
+        Kind::noteImage(known, change.imageChanged != 0);
+        if (Kind::update(store, *known) != kOk) SYNC_ERR("MetaDB update dirty fail");
+        return;
+    }
+    // A record of the sync that has no row is taken over by the next download, as changed.
+    if (change.syncedVersion != 0) return;
+    typename Kind::Row row;
+    row.*Kind::kId = change.itemId;
+    row.addressbook_id = addressBookId;
+    row.version = change.version;
+    row.dirty = 1;
+    Kind::noteImage(&row, change.imageChanged != 0);
+    if (Kind::insert(store, row) != kOk) SYNC_ERR("MetaDB insert fail");
+}
+
+}  // namespace
+
+template <class Kind>
+int read(int addressBookId, int since, std::vector<CtLocalChange>* changes, int* current) {
+    contacts_list_h rawList = nullptr;
+    if (contacts_db_get_changes_by_version(Kind::kFeed, addressBookId, since, &rawList, current) !=
+        PLATFORM_ERROR_NONE) {
+        SYNC_ERR("db_get_changes_by_version fail");
+        return kFailed;
+    }
+    const ContactsList list(rawList);
+    bool isReadable = true;
+    contacts_read::forEach(list.get(), [&](contacts_record_h record) {
+        CtLocalChange change;
+        isReadable = isReadable && readChange(record, std::is_same_v<Kind, CtContactKind>, &change);
+        if (!isReadable) return;
+        if (change.addressBookId != addressBookId)
+            SYNC_ERR("addressbook_id(%d) : ab_id(%d)?", addressBookId, change.addressBookId);
+        SYNC_ASSERT_TEXT(change.addressBookId == addressBookId, "!\"What the hell of this ab_id?\"");
+        changes->push_back(change);
+    });
+    return isReadable ? kOk : kFailed;
+}
+
+template <class Kind>
+bool some(CtMetaDataDBHelper& store, int addressBookId) {
+    int since = 0;
+    int current = 0;
+    std::vector<CtLocalChange> changes;
+    if (Kind::getLatest(store, addressBookId, &since) != kOk ||
+        read<Kind>(addressBookId, since, &changes, &current) != kOk)
+        return false;
+    return std::any_of(changes.begin(), changes.end(),
+                       [](const CtLocalChange& change) { return !change.isOwnWrite(); });
+}
+
+template <class Kind>
+int mark(CtMetaDataDBHelper& store, int addressBookId) {
+    int since = 0;
+    int current = 0;
+    std::vector<CtLocalChange> changes;
+    if (Kind::getLatest(store, addressBookId, &since) != kOk ||
+        read<Kind>(addressBookId, since, &changes, &current) != kOk)
+        return kFailed;
+    if (changes.empty()) return kOk;
+    std::erase_if(changes, [](const CtLocalChange& change) { return change.isOwnWrite(); });
+    std::vector<typename Kind::Row> rows;
+    if (!changes.empty() && Kind::getAll(store, addressBookId, &rows) != kOk) return kFailed;
+    std::unordered_map<int, typename Kind::Row*> known;
+    for (typename Kind::Row& row : rows) known.emplace(row.*Kind::kId, &row);
+
+    // The version moves only together with the marks: a walk that was cut off is walked again.
+    SyncTransaction transaction(store.database());
+    if (!transaction.begun()) return kFailed;
+    for (const CtLocalChange& change : changes) {
+        const auto row = known.find(change.itemId);
+        markOne<Kind>(store, addressBookId, change, row != known.end() ? row->second : nullptr);
+    }
+    if (Kind::updateLatest(store, addressBookId, current) != kOk) return kFailed;
+    return transaction.commit();
+}
+
+template int read<CtContactKind>(int, int, std::vector<CtLocalChange>*, int*);
+template int read<CtGroupKind>(int, int, std::vector<CtLocalChange>*, int*);
+template bool some<CtContactKind>(CtMetaDataDBHelper&, int);
+template bool some<CtGroupKind>(CtMetaDataDBHelper&, int);
+template int mark<CtContactKind>(CtMetaDataDBHelper&, int);
+template int mark<CtGroupKind>(CtMetaDataDBHelper&, int);
+
+}  // namespace ct_changes

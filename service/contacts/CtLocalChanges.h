@@ -1,0 +1,35 @@
+// CtLocalChanges: what was changed on the device, by change version. A change is the sync's own when its version is the one in the
+// row, or when the record says that the sync wrote it last.
+// Threads: any.   Errors: 0 or -1, logged.
+#pragma once
+
+#include <vector>
+
+#include "contacts/CtItemKind.h"
+
+struct CtLocalChange {
+    int itemId = 0;
+    int addressBookId = 0;
+    int type = RECORD_UPDATED;
+    int version = 0;
+    int syncedVersion = 0;
+    int imageChanged = 0;
+
+    [[nodiscard]] bool isOwnWrite() const { return syncedVersion == version; }
+};
+
+namespace ct_changes {
+
+// The feed's changes since a version, and the store's current version.
+template <class Kind>
+[[nodiscard]] int read(int addressBookId, int since, std::vector<CtLocalChange>* changes, int* current);
+
+// Whether there is a change that is not the sync's own since the version that is stored for the address book.
+template <class Kind>
+[[nodiscard]] bool some(CtMetaDataDBHelper& store, int addressBookId);
+
+// Brings the rows' marks up to date, in one transaction.
+template <class Kind>
+[[nodiscard]] int mark(CtMetaDataDBHelper& store, int addressBookId);
+
+}  // namespace ct_changes

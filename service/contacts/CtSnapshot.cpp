@@ -1,0 +1,145 @@
+#include "contacts/CtSnapshot.h"
+
+#include "common/JsonAccess.h"
+#include "common/JsonText.h"
+#include "common/SyncLog.h"
+#include "contacts/ContactComposer.h"
+#include "contacts/CtIdUtil.h"
+#include "contacts/CtLocalChanges.h"
+#include "platform/contacts_read.h"
+
+using contacts_read::intOf;
+using contacts_read::textOf;
+using sync_result::kFailed;
+using sync_result::kOk;
+
+namespace {
+
+// What a record says of the server's item that it stands for; an empty uri when it does not.
+void readServerId(CtContactKind /*kind*/, contacts_record_h record, std::string* uri, std::string* etag) {
+    const JsonNodePtr root = json_text::parse(originOf(record));
+    JsonObject* origin = json_access::objectIn(root.get());
+    const std::string id = json_access::textOr(json_access::object(origin, "id"), "$t", "");
+    if (!id.empty()) *uri = CtIdUtil::idAfterBase(id);
+    *etag = json_access::textOr(origin, "gd$etag", "");
+}
+
+void readServerId(CtGroupKind /*kind*/, contacts_record_h record, std::string* uri, std::string* /*etag*/) {
+    *uri = textOf(record, CONTACTS_GROUP_SYNC_DATA1);
+}
+
+}  // namespace
+
+template <class Kind>
+int CtSnapshot<Kind>::load(CtMetaDataDBHelper& store, int addressBookId) {
+    mAddressBookId = addressBookId;
+    // Rows before records: a record that appears in between is the user's own and has no row to be compared with.
+    if (Kind::getAll(store, addressBookId, &mRows) != kOk || readStates() != kOk) return kFailed;
+    for (size_t i = 0; i < mRows.size(); ++i) {
+        if (!mRows[i].uri.empty()) mByUri.emplace(mRows[i].uri, i);
+    }
+    if (readOrphans() != kOk) return kFailed;
+    return readUnseenDeletions(store);
+}
+
+template <class Kind>
+int CtSnapshot<Kind>::readStates() {
+    constexpr unsigned kProperties[] = {Kind::kIdProperty, Kind::kVersionProperty, Kind::kSyncedProperty};
+    contacts_query_h rawQuery = nullptr;
+    if (contacts_query_create(Kind::kView, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
+    const ContactsQuery query(rawQuery);
+    contacts_list_h rawList = nullptr;
+    if (contacts_query_add_filter_int(rawQuery, Kind::kBookProperty, mAddressBookId) != PLATFORM_ERROR_NONE ||
+        contacts_query_set_projection(rawQuery, kProperties, std::size(kProperties)) != PLATFORM_ERROR_NONE ||
+        contacts_db_get_records_with_query(rawQuery, 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
+        SYNC_ERR("get_records_with_query fail");
+        return kFailed;
+    }
+    const ContactsList list(rawList);
+    contacts_read::forEach(rawList, [this](contacts_record_h record) {
+        mRecords[intOf(record, Kind::kIdProperty)] = {.version = intOf(record, Kind::kVersionProperty),
+                                                      .syncedVersion = intOf(record, Kind::kSyncedProperty)};
+    });
+    return kOk;
+}
+
+template <class Kind>
+int CtSnapshot<Kind>::readOrphans() {
+    std::unordered_set<int> withRow;
+    for (const Row& row : mRows) withRow.insert(row.*Kind::kId);
+    for (const auto& [id, state] : mRecords) {
+        if (state.syncedVersion == 0 || withRow.contains(id)) continue;
+        contacts_record_h raw = nullptr;
+        if (contacts_db_get_record(Kind::kView, id, &raw) != PLATFORM_ERROR_NONE) {
+            SYNC_ERR("db_get_record fail");
+            return kFailed;
+        }
+        const ContactsRecord record(raw);
+        CtOrphan orphan;
+        orphan.id = id;
+        std::string uri;
+        readServerId(Kind(), raw, &uri, &orphan.etag);
+        if (!uri.empty()) mOrphans.emplace(uri, orphan);
+    }
+    return kOk;
+}
+
+template <class Kind>
+int CtSnapshot<Kind>::readUnseenDeletions(CtMetaDataDBHelper& store) {
+    int since = 0;
+    int current = 0;
+    std::vector<CtLocalChange> changes;
+    if (Kind::getLatest(store, mAddressBookId, &since) != kOk ||
+        ct_changes::read<Kind>(mAddressBookId, since, &changes, &current) != kOk) {
+        return kFailed;
+    }
+    for (const CtLocalChange& change : changes) {
+        if (change.type == RECORD_DELETED && !change.isOwnWrite()) mDeletedByUser.insert(change.itemId);
+    }
+    return kOk;
+}
+
+template <class Kind>
+auto CtSnapshot<Kind>::rowByUri(const std::string& uri) const -> const Row* {
+    const auto found = mByUri.find(uri);
+    return found != mByUri.end() ? &mRows[found->second] : nullptr;
+}
+
+template <class Kind>
+const CtRecordState* CtSnapshot<Kind>::record(int id) const {
+    const auto found = mRecords.find(id);
+    return found != mRecords.end() ? &found->second : nullptr;
+}
+
+template <class Kind>
+const CtOrphan* CtSnapshot<Kind>::orphan(const std::string& uri) const {
+    const auto found = mOrphans.find(uri);
+    return found != mOrphans.end() ? &found->second : nullptr;
+}
+
+template <class Kind>
+bool CtSnapshot<Kind>::isLost(const Row& row) const {
+    return record(row.*Kind::kId) == nullptr && row.deleted == 0 && !mDeletedByUser.contains(row.*Kind::kId);
+}
+
+template <class Kind>
+bool CtSnapshot<Kind>::hasLocalChange(const Row& row) const {
+    if (row.dirty != 0 || row.deleted != 0 || mDeletedByUser.contains(row.*Kind::kId)) return true;
+    const CtRecordState* state = record(row.*Kind::kId);
+    return state != nullptr && state->version != row.version && !state->isEnginesOwnWrite();
+}
+
+template <class Kind>
+void CtSnapshot<Kind>::put(const Row& row, const CtRecordState& state) {
+    mRecords[row.*Kind::kId] = state;
+    const auto known = mByUri.find(row.uri);
+    if (known != mByUri.end()) {
+        mRows[known->second] = row;
+    } else {
+        mByUri.emplace(row.uri, mRows.size());
+        mRows.push_back(row);
+    }
+}
+
+template class CtSnapshot<CtContactKind>;
+template class CtSnapshot<CtGroupKind>;

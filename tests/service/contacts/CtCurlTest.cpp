@@ -1,0 +1,163 @@
+// The contacts client against a server that answers from a script.
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+
+#include "common/Account.h"
+#include "common/SyncResult.h"
+#include "contacts/CtCurl.h"
+#include "platform/keys.h"
+#include "support/ScriptedServer.h"
+#include "support/TestRoot.h"
+
+using sync_result::kFailed;
+using sync_result::kOk;
+using sync_result::kTokenFailed;
+
+namespace {
+
+struct Client {
+    Client() : account(record()) {
+        EXPECT_EQ(key_storage_set("vantor.tovik.client.id", "id"), 0);
+        EXPECT_EQ(key_storage_set("vantor.tovik.client.secret", "secret"), 0);
+    }
+    vantor_pim_sync_account_s record() {
+        url = server.url();
+        vantor_pim_sync_account_s fields{};
+        fields.account_id = 1;
+        fields.ctsync = true;
+        fields.ctserver = url.data();
+        fields.refresh_token = token.data();
+        return fields;
+    }
+    [[nodiscard]] std::string header(const char* name) const {
+        const auto found = server.lastHeaders.find(name);
+        return found != server.lastHeaders.end() ? found->second : "";
+    }
+    TestRoot root;
+    ScriptedServer server;
+    std::string url;
+    std::string token = "refresh";
+    Account account;
+    CtCurl curl{&account, nullptr, std::make_shared<HttpShare>()};
+    std::string reply;
+};
+
+}  // namespace
+
+TEST(CtCurl, RenewsTheTokenOnceAndSendsTheServicesHeaders) {
+    Client client;
+    client.server.status = 201;
+    ASSERT_EQ(client.curl.insert(CtItemType::kContact, "<x/>", &client.reply), kOk);
+    EXPECT_EQ(client.server.requests, 2);
+    EXPECT_EQ(client.server.refreshes, 1);
+    EXPECT_EQ(client.server.lastPath, "/m8/feeds/contacts/default/full?alt=json");
+    EXPECT_EQ(client.header("XData-Version"), "3.0");
+    EXPECT_EQ(client.header("Content-Type"), "application/atom+xml;charset=utf-8");
+    EXPECT_EQ(client.header("Expect"), "");
+    client.server.status = 200;
+    const std::string edit = client.curl.feedBase() + "/contacts/default/full/c1";
+    ASSERT_EQ(client.curl.update(edit, "\"e\"", "<x/>", &client.reply), kOk);
+    EXPECT_EQ(client.server.lastMethod, "PUT");
+    EXPECT_EQ(client.header("If-Match"), "\"e\"");
+    EXPECT_EQ(client.server.refreshes, 1);
+    const int before = client.server.requests;
+    EXPECT_EQ(client.curl.update(edit, "", "<x/>", &client.reply), kFailed);
+    EXPECT_EQ(client.curl.remove(edit, "", &client.reply), kFailed);
+    EXPECT_EQ(client.server.requests, before) << "without an etag nothing goes out";
+}
+
+TEST(CtCurl, WhatAnAnswerMeans) {
+    struct Case {
+        int status;
+        const char* tokenReply;
+        int result;
+    };
+    const Case cases[] = {{200, R"({"access_token":"good"})", kOk},
+                          {404, R"({"access_token":"good"})", kFailed},
+                          {409, R"({"access_token":"good"})", kFailed},
+                          {302, R"({"access_token":"good"})", kFailed},
+                          {200, R"({"error":"invalid_grant"})", kTokenFailed},
+                          {200, "<html>busy</html>", kFailed},
+                          {200, R"({"access_token":"bad"})", kFailed}};
+    for (const Case& row : cases) {
+        Client client;
+        client.server.status = row.status;
+        client.server.tokenReply = row.tokenReply;
+        EXPECT_EQ(client.curl.get(client.curl.feedBase() + "/x", &client.reply), row.result)
+            << row.status << row.tokenReply;
+        EXPECT_LE(client.server.requests, 3);
+    }
+}
+
+TEST(CtCurl, TheTokenGoesToTheAccountsServerOnly) {
+    Client client;
+    const std::string port = client.url.substr(client.url.rfind(':'));
+    const std::vector<std::string> foreign = {"http://localhost" + port + "/m8/feeds/x",
+                                              client.url + "0/m8/feeds/x",
+                                              "http://127.0.0.1/m8/feeds",
+                                              "http://127.0.0.1" + port + "@localhost" + port + "/",
+                                              "https://127.0.0.1" + port + "/",
+                                              "file:///etc/passwd",
+                                              ""};
+    for (const std::string& url : foreign) {
+        EXPECT_EQ(client.curl.get(url, &client.reply), kFailed) << url;
+        EXPECT_FALSE(client.curl.isOwn(url)) << url;
+    }
+    EXPECT_EQ(client.server.requests, 0);
+    EXPECT_TRUE(client.curl.isOwn(client.url + "/anything?x=1"));
+    client.server.status = 401;
+    EXPECT_EQ(client.curl.getOrbit("p1", &client.reply), kFailed);
+    EXPECT_EQ(client.header("Authorization"), "");
+    EXPECT_EQ(client.server.refreshes, 0);
+    EXPECT_EQ(client.curl.getOrbit("", &client.reply), kFailed);
+}
+
+TEST(CtCurl, PhotosAreStagedSafely) {
+    Client client;
+    client.account.setAccessToken("good");
+    const std::string photoUrl = client.curl.feedBase() + "/photos/media/default/p1";
+    struct Case {
+        const char* contentType;
+        std::string body;
+        int result;
+    };
+    const Case cases[] = {{"image/jpeg", "\xFF\xD8\xFF jpeg", kOk},
+                          {"image/jpeg", "", kFailed},
+                          {"text/html", "<html>no</html>", kFailed},
+                          {"image/jpeg", " \n<html>no</html>", kFailed},
+                          {"image/png", std::string(17U << 20, 'x'), kFailed}};
+    std::ofstream(client.root.path() / "victim") << "precious";
+    for (const Case& row : cases) {
+        std::filesystem::create_symlink(client.root.path() / "victim", client.root.at("/tmp/p1"));
+        client.server.contentType = row.contentType;
+        client.server.body = row.body;
+        {
+            const std::unique_ptr<CtStagedPhoto> photo = CtStagedPhoto::create("p1");
+            ASSERT_NE(photo, nullptr);
+            EXPECT_EQ(photo->path(), "/tmp/p1");
+            EXPECT_EQ(client.curl.getImage(photoUrl, "\"p\"", photo.get()), row.result) << row.contentType;
+            EXPECT_EQ(client.header("If-Match"), "\"p\"");
+            const std::unique_ptr<CtStagedPhoto> other = CtStagedPhoto::create("p1");
+            ASSERT_NE(other, nullptr);
+            EXPECT_NE(other->path(), photo->path()) << "another account's photo of the same id";
+        }
+        EXPECT_FALSE(std::filesystem::exists(client.root.at("/tmp/p1")));
+        EXPECT_EQ(std::filesystem::file_size(client.root.path() / "victim"), 8U) << "a link is not followed";
+    }
+    for (const char* bad : {"", "../x", ".x", "a/b"}) EXPECT_EQ(CtStagedPhoto::create(bad), nullptr) << bad;
+    std::ofstream(client.root.at("/tmp/mine")) << "image";
+    EXPECT_EQ(client.curl.upsertImage(photoUrl, "", "/tmp/mine"), kOk);
+    EXPECT_EQ(client.header("If-Match"), "") << "there was no photo before";
+    EXPECT_EQ(client.curl.upsertImage(photoUrl, "", "/tmp/none"), kFailed);
+}
+
+TEST(CtCurl, TheSizeOfAProfileImage) {
+    const char* const cases[][2] = {{"http://x/i", "http://x/i?sz=720"},
+                                    {"http://x/i?sz=50", "http://x/i?sz=720"},
+                                    {"http://x/i?a=1&sz=50&b=2", "http://x/i?a=1&sz=720&b=2"},
+                                    {"http://x/i?a=1", "http://x/i?a=1&sz=720"},
+                                    {"http://x/sz=5", "http://x/sz=5?sz=720"}};
+    for (const auto& row : cases) EXPECT_EQ(withPhotoSize(row[0]), row[1]);
+}

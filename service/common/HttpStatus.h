@@ -5,7 +5,9 @@ namespace http_status {
 
 inline constexpr long kUnauthorized = 401;
 inline constexpr long kNotFound = 404;
+inline constexpr long kConflict = 409;
 inline constexpr long kGone = 410;
+inline constexpr long kPreconditionFailed = 412;
 inline constexpr long kServerError = 500;  // and above: what became of the request is not known
 
 constexpr bool isSuccess(long status) {
@@ -14,6 +16,11 @@ constexpr bool isSuccess(long status) {
 // The item is not there, or not any more.
 constexpr bool isGone(long status) {
     return status == kNotFound || status == kGone;
+}
+
+// The server has another version of the item than the request named.
+constexpr bool isConflict(long status) {
+    return status == kConflict || status == kPreconditionFailed;
 }
 
 }  // namespace http_status

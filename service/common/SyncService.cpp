@@ -14,9 +14,11 @@
 #include "calendar/CalTodoDataManager.h"
 #include "common/AccountDBHelper.h"
 #include "common/CalSyncAgent.h"
+#include "common/CtSyncAgent.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 #include "common/SyncScheduleManager.h"
+#include "contacts/CtDataManager.h"
 #include "platform/error.h"
 
 using sync_result::kFailed;
@@ -86,6 +88,7 @@ void SyncService::initializeAccount() {
 void SyncService::prepareDataManagers() {
     if (CalDataManager::getInstance().prepareSync() != kOk) SYNC_ERR("not prepare sync");
     if (CalTodoDataManager::getInstance().prepareSync() != kOk) SYNC_ERR("not prepare sync");
+    (void)CtDataManager::getInstance().prepareSync();
 }
 
 int SyncService::initialize() {
@@ -203,14 +206,14 @@ void SyncService::addAccountToMap(std::unique_ptr<Account> account) {
 
 std::unique_ptr<SyncAgent> SyncService::makeAgent(const Kind& kind, Account* account) {
     if (kind.type == VANTOR_PIM_SYNC_TYPE_CALENDAR) return std::make_unique<CalSyncAgent>(account);
-    return nullptr;
+    return std::make_unique<CtSyncAgent>(account);
 }
 
 SyncAgent* SyncService::addAgent(const Kind& kind, Account* account) {
-    std::unique_ptr<SyncAgent> agent = makeAgent(kind, account);
-    if (!agent) return nullptr;
-    const auto [entry, ret] = (this->*kind.agents).emplace(account->getAccountId(), std::move(agent));
+    const auto [entry, ret] = (this->*kind.agents).emplace(account->getAccountId(), makeAgent(kind, account));
     SYNC_ASSERT_TEXT(ret, "ret");
+    if (kind.type == VANTOR_PIM_SYNC_TYPE_CONTACTS)
+        (void)CtDataManager::getInstance().addAccount(account->getAccountId());
     return entry->second.get();
 }
 
@@ -230,7 +233,10 @@ void SyncService::unschedule(SyncAgent* agent) {
 }
 
 void SyncService::deleteData(const Kind& kind, int accountId) {
-    if (kind.type != VANTOR_PIM_SYNC_TYPE_CALENDAR) return;
+    if (kind.type == VANTOR_PIM_SYNC_TYPE_CONTACTS) {
+        (void)CtDataManager::getInstance().deleteAccount(accountId);
+        return;
+    }
     (void)CalDataManager::getInstance().deleteAccount(accountId);
     (void)CalTodoDataManager::getInstance().deleteAccount(accountId);
 }

@@ -65,7 +65,6 @@ private:
     void updateKind(const Kind& kind, Account* account, bool credentialsChanged);
     int removeKind(const Kind& kind, int accountId);
     SyncAgent* addAgent(const Kind& kind, Account* account);
-    // NULL for a kind that has no agent yet.
     static std::unique_ptr<SyncAgent> makeAgent(const Kind& kind, Account* account);
     SyncAgent* findAgent(const Kind& kind, int accountId);
     static void schedule(const Kind& kind, const Account& account, SyncAgent* agent);

@@ -91,7 +91,7 @@ void carryOver(JsonObject* origin, const std::string& member, CtXmlElement* entr
             if (CtXmlElement::fromJson(member, object, &element)) {
                 entry->children.push_back(std::move(element));
             } else {
-                SYNC_ERR("the server's element %s cannot be written back", member.c_str());
+                SYNC_ERR_AS("carryOver", "the server's element %s cannot be written back", member.c_str());
             }
         });
     } catch (const JsonException& error) {

@@ -18,6 +18,7 @@ struct BulkItem {
     std::string profile;                   // of the person's public profile, empty when there is none
     std::unique_ptr<CtStagedPhoto> photo;  // downloaded for this write, NULL when there is none
     bool keepsImage = false;               // without a photo: the image on the device stays
+    bool isForPhoto = false;               // nothing but the photo is missing
     CtContactSyncRow row;                  // as it is to be stored; contact_id 0 for a new contact
     CtRowWrite rowWrite = CtRowWrite::kInsert;
     int lostId = 0;                     // the record of an older row of this entry, which goes

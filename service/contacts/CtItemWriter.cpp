@@ -161,7 +161,7 @@ int CtItemWriter::writeRows(const CtContactBatch& batch) {
     const auto writeRow = [this](const CtContactSyncRow& row, CtRowWrite rowWrite) {
         const bool isUpdate = rowWrite == CtRowWrite::kUpdate;
         if ((isUpdate ? mpStore->updateContact(row) : mpStore->insertContact(row)) == kOk) return true;
-        SYNC_ERR("metaDB %s fail", isUpdate ? "updateContact" : "insertContact");
+        SYNC_ERR_AS("writeRows", "metaDB %s fail", isUpdate ? "updateContact" : "insertContact");
         return false;
     };
     for (const std::vector<BulkItem>* items : {&batch.updates, &batch.inserts}) {
@@ -248,6 +248,7 @@ int CtItemWriter::remove(const std::vector<typename Kind::Row>& rows, const std:
     *removed = 0;
     if (rows.empty()) return kOk;
     std::vector<int> ids;
+    ids.reserve(rows.size());
     for (const auto& row : rows) ids.push_back(row.*Kind::kId);
     std::vector<size_t> skipped;
     const record_write_options_s options{.by_sync = true, .expected_versions = versions, .skipped = &skipped};

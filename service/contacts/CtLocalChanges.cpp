@@ -75,11 +75,13 @@ int read(int addressBookId, int since, std::vector<CtLocalChange>* changes, int*
         CtLocalChange change;
         isReadable = isReadable && readChange(record, std::is_same_v<Kind, CtContactKind>, &change);
         if (!isReadable) return;
+        changes->push_back(change);
+    });
+    for (const CtLocalChange& change : *changes) {
         if (change.addressBookId != addressBookId)
             SYNC_ERR("addressbook_id(%d) : ab_id(%d)?", addressBookId, change.addressBookId);
         SYNC_ASSERT_TEXT(change.addressBookId == addressBookId, "!\"What the hell of this ab_id?\"");
-        changes->push_back(change);
-    });
+    }
     return isReadable ? kOk : kFailed;
 }
 

@@ -48,7 +48,7 @@ constexpr const char* kContactColumns =
     "SELECT contact_id, addressbook_id, version, dirty, image_dirty, deleted, uri, etag, "
     "photo_etag, " CT_READ_TIME " FROM contact_sync_table where ";
 constexpr const char* kAllGroups =
-    "SELECT group_id, addressbook_id, starred, version, dirty, deleted, uri, etag, updated FROM "
+    "SELECT group_id, addressbook_id, starred, version, dirty, deleted, uri, etag, updated, source FROM "
     "group_sync_table "
     "where addressbook_id =?";
 constexpr const char* kAllContacts =
@@ -314,7 +314,14 @@ int CtMetaDataDBHelper::getAllContacts(int addressBookId, std::vector<CtContactS
 }
 
 int CtMetaDataDBHelper::getAllGroups(int addressBookId, std::vector<CtGroupSyncRow>* rows) {
-    return readList(mDatabase, kAllGroups, {addressBookId}, rows);
+    std::vector<CtGroupSyncRow> found;
+    const int result = mDatabase.readAll(kAllGroups, {addressBookId}, [&found](const Row& row) {
+        constexpr int kSource = 9;
+        take(row, &found.emplace_back());
+        found.back().source = row.text(kSource);
+    });
+    if (result == kOk) rows->insert(rows->end(), found.begin(), found.end());
+    return result;
 }
 
 int CtMetaDataDBHelper::forgetContact(int contactId) {

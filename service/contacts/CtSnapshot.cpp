@@ -129,17 +129,5 @@ bool CtSnapshot<Kind>::hasLocalChange(const Row& row) const {
     return state != nullptr && state->version != row.version && !state->isEnginesOwnWrite();
 }
 
-template <class Kind>
-void CtSnapshot<Kind>::put(const Row& row, const CtRecordState& state) {
-    mRecords[row.*Kind::kId] = state;
-    const auto known = mByUri.find(row.uri);
-    if (known != mByUri.end()) {
-        mRows[known->second] = row;
-    } else {
-        mByUri.emplace(row.uri, mRows.size());
-        mRows.push_back(row);
-    }
-}
-
 template class CtSnapshot<CtContactKind>;
 template class CtSnapshot<CtGroupKind>;

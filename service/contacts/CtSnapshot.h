@@ -42,9 +42,6 @@ public:
     // Whether the device's record holds a change that has not been sent: a mark, or a version that nobody but a user wrote.
     [[nodiscard]] bool hasLocalChange(const Row& row) const;
 
-    // Keeps the snapshot in step with what a page wrote.
-    void put(const Row& row, const CtRecordState& state);
-
 private:
     [[nodiscard]] int readStates();
     [[nodiscard]] int readOrphans();

@@ -1,0 +1,27 @@
+#include "common/CtSyncAgent.h"
+
+#include "common/Account.h"
+#include "common/SyncResult.h"
+#include "contacts/CtDataManager.h"
+#include "contacts/CtDownSyncDirector.h"
+#include "contacts/CtUpSyncDirector.h"
+
+CtSyncAgent::CtSyncAgent(Account* account) : DirectedSyncAgent(account, VANTOR_PIM_SYNC_TYPE_CONTACTS) {
+    setDirectors(std::make_unique<CtDownSyncDirector>(account, worker()),
+                 std::make_unique<CtUpSyncDirector>(account, worker()));
+}
+
+bool CtSyncAgent::hasSomethingToSend() {
+    return CtDataManager::getInstance().hasSomethingToSend(mpAccount->getAccountId());
+}
+
+void CtSyncAgent::countPending(int* dirty, int* deleted) {
+    *dirty = *deleted = 0;
+    const int accountId = mpAccount->getAccountId();
+    if (CtDataManager::getInstance().countPending(accountId, dirty, deleted) != sync_result::kOk) *dirty = *deleted = 0;
+}
+
+// An upload that was queued goes with the stop; the next change asks for another.
+void CtSyncAgent::onStopped() {
+    CtDataManager::getInstance().forgetPending(mpAccount->getAccountId());
+}

@@ -1,0 +1,42 @@
+#include "common/DirectedSyncAgent.h"
+
+#include "common/SyncResult.h"
+
+using sync_result::kOk;
+
+DirectedSyncAgent::DirectedSyncAgent(Account* account, vantor_pim_sync_type_e type)
+    : SyncAgent(account, type), mType(type), mpWorker(std::make_unique<SyncWorker>()) {}
+
+DirectedSyncAgent::~DirectedSyncAgent() {
+    mpWorker.reset();
+}
+
+void DirectedSyncAgent::setDirectors(std::unique_ptr<SyncDirector> down, std::unique_ptr<SyncDirector> up) {
+    mpDownDirector = std::move(down);
+    mpUpDirector = std::move(up);
+}
+
+int DirectedSyncAgent::doUpSync() {
+    return mpWorker->start(mpUpDirector.get(), this);
+}
+
+int DirectedSyncAgent::doDownSync() {
+    return mpWorker->start(mpDownDirector.get(), this);
+}
+
+int DirectedSyncAgent::doStop() {
+    return mpWorker->stop(this);
+}
+
+void DirectedSyncAgent::onSyncCompleted(SyncDirector* director, int result) {
+    noteHalf(isDown(director), result, director->lastFailure());
+    // Reserved before the run is ended, so that both halves are one visible sync.
+    if (isDown(director) && result == kOk && hasSomethingToSend()) (void)startUpSync();
+    continueSync(result);
+}
+
+void DirectedSyncAgent::onSyncStopped(SyncDirector* director, int result) {
+    noteHalf(isDown(director), result, director->lastFailure());
+    onStopped();
+    continueSync(result);
+}

@@ -1,0 +1,92 @@
+#include "contacts/CtDownSyncTasks.h"
+
+#include "common/SyncLog.h"
+#include "common/SyncResult.h"
+#include "contacts/CtFeedParsers.h"
+
+using sync_result::kFailed;
+using sync_result::kOk;
+
+namespace {
+
+constexpr const char* kContactPages = "/contacts/default/full?alt=json";
+constexpr const char* kGroupPages = "/groups/default/full?alt=json";
+constexpr size_t kLogSlice = 900;
+
+void logSuspicious(const std::string& text) {
+    SYNC_ERR("Server's response is suspicious. check full string");
+    for (size_t at = 0; at < text.size(); at += kLogSlice) SYNC_DBG("%s", text.substr(at, kLogSlice).c_str());
+}
+
+}  // namespace
+
+int CtDownSyncTask::getEntireFeed(CtItemType type, std::string* text) {
+    if (type == CtItemType::kPhoto) SYNC_ASSERT_TEXT(false, "!\"Don't take photo list!\"");
+    const std::string feed = type == CtItemType::kGroup ? "groups" : "contacts";
+    return mpCurl->get(mpCurl->feedBase() + "/" + feed + "/default/full?max-results=1000000000" + "&alt=json",
+                       text);
+}
+
+int CtDownSyncTask::getContactPage(const std::string& url, CtContactPage* page) {
+    std::string text;
+    const int result = mpCurl->get(url.empty() ? mpCurl->feedBase() + kContactPages : url, &text);
+    if (result != kOk) {
+        SYNC_ERR("Getting contacts from remote failed! %d", result);
+        return result;
+    }
+    if (CtContactListJsonParser::parse(text, page) == kOk) return kOk;
+    SYNC_ERR("JSON parsing Failed");
+    logSuspicious(text);
+    return kFailed;
+}
+
+int CtDownSyncGroupListTask::getListPageByPage(const std::string& url, CtGroupPage* page) {
+    std::string text;
+    const int result = mpCurl->get(url.empty() ? mpCurl->feedBase() + kGroupPages : url, &text);
+    if (result != kOk) {
+        SYNC_ERR("Curl Get Operation Failed! %d", result);
+        return result;
+    }
+    if (CtGroupListJsonParser::parse(text, page) == kOk) return kOk;
+    logSuspicious(text);
+    return kFailed;
+}
+
+int CtDownSyncGroupListTask::getList(CtGroupPage* page) {
+    std::string text;
+    const int result = getEntireFeed(CtItemType::kGroup, &text);
+    if (result != kOk) {
+        SYNC_ERR("Curl Get Operation Failed! %d", result);
+        return result;
+    }
+    if (CtGroupListJsonParser::parse(text, page) == kOk) return kOk;
+    logSuspicious(text);
+    return kFailed;
+}
+
+int CtDownSyncContactPhotoTask::get(const std::string& href, const std::string& etag,
+                                    std::unique_ptr<CtStagedPhoto>* photo) {
+    std::unique_ptr<CtStagedPhoto> staged = CtStagedPhoto::create(CtIdUtil::idAfterCom(href));
+    if (!staged) return kFailed;
+    const int result = mpCurl->getImage(href, etag, staged.get());
+    if (result != kOk) {
+        SYNC_ERR("Download Photo Failed!");
+        return result;
+    }
+    *photo = std::move(staged);
+    return kOk;
+}
+
+int CtDownSyncContactPhotoTask::getOfProfile(const std::string& imageUrl,
+                                             std::unique_ptr<CtStagedPhoto>* photo) {
+    std::unique_ptr<CtStagedPhoto> staged =
+        CtStagedPhoto::create(CtIdUtil::idAfterCom(imageUrl.substr(0, imageUrl.find('?'))));
+    if (!staged) return kFailed;
+    const int result = mpCurl->getOrbitImage(imageUrl, staged.get());
+    if (result != kOk) {
+        SYNC_ERR("Download Photo Failed!");
+        return result;
+    }
+    *photo = std::move(staged);
+    return kOk;
+}

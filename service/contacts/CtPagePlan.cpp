@@ -1,0 +1,169 @@
+#include "contacts/CtPagePlan.h"
+
+#include "common/SyncLog.h"
+#include "platform/contacts_read.h"
+
+namespace {
+
+void markEdited(CtContactSyncRow* row) {
+    row->image_dirty = 1;
+}
+
+void markEdited(CtGroupSyncRow* /*row*/) {}
+
+// Where an entry stands between the server, the rows and the device.
+enum class Standing { kNew, kSent, kLost, kUnchanged, kChanged, kDeviceWins, kOrphan, kEditedOrphan };
+
+template <class Kind>
+struct Finding {
+    Standing standing = Standing::kNew;
+    typename Kind::Row row;  // known, or begun
+    int version = kAnyVersion;
+};
+
+template <class Kind>
+Finding<Kind> find(const CtEntryInfo& entry, const CtSnapshot<Kind>& snapshot, CtSentRows<Kind>* sent,
+                   const std::string& says) {
+    Finding<Kind> finding;
+    finding.row.addressbook_id = snapshot.addressBookId();
+    if (const auto* row = snapshot.rowByUri(entry.id)) {
+        finding.row = *row;
+        const CtRecordState* state = snapshot.record(row->*Kind::kId);
+        finding.version = state != nullptr ? state->version : kAnyVersion;
+        if (snapshot.isLost(*row)) {
+            finding.standing = Standing::kLost;
+        } else if (row->etag == entry.etag) {
+            finding.standing = Standing::kUnchanged;
+        } else {
+            finding.standing = snapshot.hasLocalChange(*row) ? Standing::kDeviceWins : Standing::kChanged;
+        }
+    } else if (const CtOrphan* orphan = snapshot.orphan(entry.id)) {
+        const CtRecordState& state = *snapshot.record(orphan->id);
+        finding.row.*Kind::kId = orphan->id;
+        finding.row.version = state.isEnginesOwnWrite() ? state.version : state.syncedVersion;
+        finding.version = state.version;
+        finding.standing = state.isEnginesOwnWrite() ? Standing::kOrphan : Standing::kEditedOrphan;
+    } else if (const auto known = sent->find(says); !says.empty() && known != sent->end()) {
+        finding.row = known->second;
+        finding.version = snapshot.record(finding.row.*Kind::kId)->version;
+        finding.standing = Standing::kSent;
+        sent->erase(known);
+        SYNC_INFO("%s(%s) is the device's %d, which was sent before", Kind::kName, entry.id.c_str(),
+                  finding.row.*Kind::kId);
+    }
+    if (finding.standing == Standing::kDeviceWins) {
+        SYNC_ERR("%s(%s, %s) was changed on both sides, the device's %s wins", Kind::kName, entry.id.c_str(),
+                 entry.title.c_str(), finding.row.deleted != 0 ? "deletion" : "change");
+    } else if (finding.standing == Standing::kEditedOrphan) {
+        SYNC_ERR("%s(%s, %s) is taken over with the device's change", Kind::kName, entry.id.c_str(),
+                 entry.title.c_str());
+        finding.row.dirty = 1;
+        markEdited(&finding.row);
+    } else if (finding.standing == Standing::kLost) {
+        SYNC_ERR("%s(%s, %s) has lost its record, it is made again", Kind::kName, entry.id.c_str(),
+                 entry.title.c_str());
+    }
+    finding.row.uri = entry.id;
+    finding.row.etag = entry.etag;
+    finding.row.updated = entry.updated;
+    return finding;
+}
+
+bool hasRow(Standing standing) {
+    return standing != Standing::kNew && standing != Standing::kLost && standing != Standing::kOrphan &&
+           standing != Standing::kEditedOrphan;
+}
+
+}  // namespace
+
+CtSentRows<CtContactKind> readSentContacts(const CtSnapshot<CtContactKind>& snapshot,
+                                           const ContactComposer& composer) {
+    CtSentRows<CtContactKind> sent;
+    for (const CtContactSyncRow& row : snapshot.rows()) {
+        contacts_record_h raw = nullptr;
+        if (!row.uri.empty() || row.etag != kCtUnconfirmedEtag || row.dirty == 0 ||
+            snapshot.record(row.contact_id) == nullptr ||
+            contacts_db_get_record(_contacts_contact, row.contact_id, &raw) != PLATFORM_ERROR_NONE) {
+            continue;
+        }
+        const ContactsRecord record(raw);
+        sent.emplace(composer.composeFields(raw), row);
+    }
+    return sent;
+}
+
+CtSentRows<CtGroupKind> readSentGroups(const CtSnapshot<CtGroupKind>& snapshot) {
+    CtSentRows<CtGroupKind> sent;
+    for (const CtGroupSyncRow& row : snapshot.rows()) {
+        contacts_record_h raw = nullptr;
+        if (!row.uri.empty() || row.etag != kCtUnconfirmedEtag || row.dirty == 0 ||
+            snapshot.record(row.group_id) == nullptr ||
+            contacts_db_get_record(_contacts_group, row.group_id, &raw) != PLATFORM_ERROR_NONE) {
+            continue;
+        }
+        const ContactsRecord record(raw);
+        sent.emplace(contacts_read::textOf(raw, CONTACTS_GROUP_NAME), row);
+    }
+    return sent;
+}
+
+CtContactBatch planContacts(const CtContactPage& page, const CtSnapshot<CtContactKind>& snapshot,
+                            const ContactComposer& composer, CtSentRows<CtContactKind>* sent) {
+    CtContactBatch batch;
+    for (const std::shared_ptr<ContactInfo>& entry : page.entries) {
+        const std::string says = sent->empty() ? std::string() : composer.composeFields(entry->object());
+        Finding<CtContactKind> finding = find(*entry, snapshot, sent, says);
+        const Standing standing = finding.standing;
+        const CtRowWrite rowWrite = hasRow(standing) ? CtRowWrite::kUpdate : CtRowWrite::kInsert;
+        if (standing == Standing::kDeviceWins || standing == Standing::kEditedOrphan) {
+            batch.rows.push_back({finding.row, rowWrite});
+            continue;
+        }
+        const bool misses = !entry->photoEtag.empty() && entry->photoEtag != finding.row.photo_etag;
+        if (standing == Standing::kUnchanged && (!misses || snapshot.hasLocalChange(finding.row))) continue;
+        BulkItem item;
+        item.entry = entry;
+        item.row = finding.row;
+        item.rowWrite = rowWrite;
+        item.expectedVersion = finding.version;
+        item.isForPhoto = standing == Standing::kUnchanged;
+        if (standing == Standing::kLost) {
+            item.lostId = std::exchange(item.row.contact_id, 0);
+            item.row.photo_etag.clear();
+            item.expectedVersion = kAnyVersion;
+        } else if (standing == Standing::kSent) {
+            // Its image, if there is one, has not been sent yet.
+            item.row.dirty = item.row.image_dirty;
+            item.keepsImage = true;
+        }
+        const bool isNew = item.row.contact_id == 0;
+        (isNew ? batch.inserts : batch.updates).push_back(std::move(item));
+    }
+    return batch;
+}
+
+std::vector<CtGroupItem> planGroups(const CtGroupPage& page, const CtSnapshot<CtGroupKind>& snapshot,
+                                    CtSentRows<CtGroupKind>* sent) {
+    std::vector<CtGroupItem> items;
+    for (const std::shared_ptr<GroupInfo>& entry : page.entries) {
+        Finding<CtGroupKind> finding = find(*entry, snapshot, sent, entry->title);
+        const Standing standing = finding.standing;
+        if (standing == Standing::kUnchanged) continue;
+        CtGroupItem item;
+        item.entry = entry;
+        item.row = finding.row;
+        item.row.source = entry->jsonText();
+        item.row.starred = entry->title == ct_wire::kStarredGroup ? 1 : 0;
+        item.rowWrite = hasRow(standing) ? CtRowWrite::kUpdate : CtRowWrite::kInsert;
+        item.expectedVersion = finding.version;
+        item.isRowOnly = standing == Standing::kDeviceWins || standing == Standing::kEditedOrphan;
+        if (standing == Standing::kLost) {
+            item.lostId = std::exchange(item.row.group_id, 0);
+            item.expectedVersion = kAnyVersion;
+        } else if (standing == Standing::kSent) {
+            item.row.dirty = 0;
+        }
+        items.push_back(std::move(item));
+    }
+    return items;
+}

@@ -1,0 +1,397 @@
+#include "contacts/CtUploader.h"
+
+#include "common/JsonAccess.h"
+#include "common/JsonText.h"
+#include "common/SyncLog.h"
+#include "contacts/CtTransaction.h"
+#include "contacts/GroupComposer.h"
+#include "platform/contacts_read.h"
+
+using contacts_read::forEachChild;
+using contacts_read::intOf;
+using contacts_read::textOf;
+using sync_result::kFailed;
+using sync_result::kOk;
+using sync_result::kStopped;
+using sync_result::kTokenFailed;
+
+namespace {
+
+constexpr const char* kStoreFails = "the device's stores cannot be written";
+
+std::string imageOf(contacts_record_h contact) {
+    std::string path;
+    forEachChild(contact, CONTACTS_CONTACT_IMAGES, [&path](contacts_record_h image) {
+        if (path.empty()) path = textOf(image, CONTACTS_IMAGE_PATH);
+    });
+    return path;
+}
+
+// Which version of the server's entry is kept with the contact.
+std::string keptEtag(contacts_record_h contact) {
+    const JsonNodePtr root = json_text::parse(originOf(contact));
+    return json_access::textOr(json_access::objectIn(root.get()), "gd$etag", "");
+}
+
+void forgetPhoto(CtContactSyncRow* row) {
+    row->photo_etag.clear();
+    row->image_dirty = 1;
+}
+void forgetPhoto(CtGroupSyncRow* /*row*/) {}
+
+// Whether nobody but the server may delete the item. The record that said so is gone.
+bool isOfServer(const CtContactSyncRow& /*row*/) {
+    return false;
+}
+bool isOfServer(const CtGroupSyncRow& row) {
+    const JsonNodePtr root = json_text::parse(row.source);
+    return json_access::member(json_access::objectIn(root.get()), "gContact$systemGroup") != nullptr;
+}
+
+}  // namespace
+
+CtUploader::CtUploader(CtMetaDataDBHelper* store, int addressBookId, CtCurl* curl, IStopQuery* stopQuery)
+    : mpStore(store),
+      mAddressBookId(addressBookId),
+      mTask(curl),
+      mFeedBase(curl->feedBase()),
+      mpStopQuery(stopQuery) {}
+
+int CtUploader::run() {
+    std::vector<CtGroupSyncRow> groups;
+    std::vector<CtContactSyncRow> contacts;
+    if (mpStore->getAllGroups(mAddressBookId, &groups) != kOk || markAsSent<CtGroupKind>(&groups) != kOk) {
+        mFailure = kStoreFails;
+        return kFailed;
+    }
+    for (CtGroupSyncRow& row : groups) {
+        if (!isOver() && row.dirty != 0 && row.deleted == 0) sendGroup(row);
+    }
+    // After the groups, so that memberships name those that were just made.
+    CtGroupMap map;
+    if (map.load(*mpStore, mAddressBookId) != kOk ||
+        mpStore->getAllContacts(mAddressBookId, &contacts) != kOk ||
+        markAsSent<CtContactKind>(&contacts) != kOk) {
+        mFailure = kStoreFails;
+        return kFailed;
+    }
+    const ContactComposer composer = map.composer(mFeedBase);
+    for (CtContactSyncRow& row : contacts) {
+        if (!isOver() && row.dirty != 0 && row.deleted == 0) sendContact(row, composer);
+    }
+    for (CtContactSyncRow& row : contacts) {
+        if (!isOver() && row.deleted != 0) sendDeleted<CtContactKind>(CtItemType::kContact, row);
+    }
+    for (CtGroupSyncRow& row : groups) {
+        if (!isOver() && row.deleted != 0) sendDeleted<CtGroupKind>(CtItemType::kGroup, row);
+    }
+    if ((writeBack<CtGroupKind>(mSentGroups) != kOk || writeBack<CtContactKind>(mSentContacts) != kOk) &&
+        mResult == kOk) {
+        mResult = kFailed;
+        mFailure = kStoreFails;
+    }
+    return mpStopQuery != nullptr && mpStopQuery->isStopped() ? kStopped : mResult;
+}
+
+void CtUploader::fail(const char* itemName, int id, const std::string& uri, const CtUpReply& reply) {
+    SYNC_ERR("%s(%d, %s) could not be sent: %s", itemName, id, uri.c_str(), reply.reason.c_str());
+    if (reply.answer == CtAnswer::kNoAnswer) mIsOver = true;
+    if (reply.result == kTokenFailed) mResult = kTokenFailed;
+    if (mResult == kOk) mResult = kFailed;
+    if (!mFailure.empty()) return;
+    mFailure = reply.result == kTokenFailed
+                   ? "the account's authorisation is no longer accepted"
+                   : std::string(itemName) + " " + std::to_string(id) + " could not be sent: " + reply.reason;
+}
+
+template <class Kind>
+int CtUploader::markAsSent(std::vector<typename Kind::Row>* rows) {
+    SyncTransaction transaction(mpStore->database());
+    if (!transaction.begun()) return kFailed;
+    for (auto& row : *rows) {
+        if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || row.etag == kCtUnconfirmedEtag)
+            continue;
+        row.etag = kCtUnconfirmedEtag;
+        if (Kind::update(*mpStore, row) != kOk) return kFailed;
+    }
+    return transaction.commit();
+}
+
+template <class Kind>
+void CtUploader::store(typename Kind::Row& row, const CtUpReply& reply, int version) {
+    if (!reply.meta.id.empty()) row.uri = reply.meta.id;
+    if (!reply.meta.etag.empty()) row.etag = reply.meta.etag;
+    if (!reply.meta.updated.empty()) row.updated = reply.meta.updated;
+    row.version = version;
+    if (Kind::update(*mpStore, row) == kOk) return;
+    SYNC_ERR("metaDB %s fail", std::is_same_v<Kind, CtContactKind> ? "updateContact" : "updateGroupEtag");
+    mResult = kFailed;
+    if (mFailure.empty()) mFailure = kStoreFails;
+    mIsOver = true;
+}
+
+template <class Kind>
+void CtUploader::renew(typename Kind::Row& row) {
+    SYNC_ERR("%s(%s) was deleted on the server and changed on the device, it is sent as new", Kind::kName,
+             row.uri.c_str());
+    row.uri.clear();
+    row.etag = kCtUnconfirmedEtag;
+    forgetPhoto(&row);
+    if (Kind::update(*mpStore, row) != kOk) mIsOver = true;
+}
+
+// --- groups
+
+void CtUploader::sendGroup(CtGroupSyncRow& row) {
+    contacts_record_h raw = nullptr;
+    if (contacts_db_get_record(_contacts_group, row.group_id, &raw) != PLATFORM_ERROR_NONE) return;
+    const ContactsRecord record(raw);
+    const int version = intOf(raw, CONTACTS_GROUP_VERSION);
+    if (intOf(raw, CONTACTS_GROUP_IS_READ_ONLY) != 0) {
+        SYNC_ERR("group(%s) belongs to the server, the device's change is not sent", row.uri.c_str());
+        row.dirty = 0;
+        return store<CtGroupKind>(row, {}, version);
+    }
+    const std::string name = textOf(raw, CONTACTS_GROUP_NAME);
+    CtUpReply reply;
+    reply.reason = "the group has no name";
+    reply.answer = CtAnswer::kRefused;
+    if (name.empty()) return fail("group", row.group_id, row.uri, reply);
+    if (!row.uri.empty()) {
+        reply = mTask.update(CtItemType::kGroup, row.uri, row.etag, GroupComposer::compose(name, row.etag));
+        if (reply.answer == CtAnswer::kConflict || row.etag.empty()) {
+            reply = mTask.read(CtItemType::kGroup, row.uri);
+            if (reply.isAccepted()) {
+                SYNC_ERR("group(%s) has moved on, the device's change wins", row.uri.c_str());
+                const std::string etag = reply.meta.etag;
+                reply = mTask.update(CtItemType::kGroup, row.uri, etag, GroupComposer::compose(name, etag));
+            }
+        }
+        if (reply.answer == CtAnswer::kGone) renew<CtGroupKind>(row);
+    }
+    if (row.uri.empty() && !mIsOver)
+        reply = mTask.insert(CtItemType::kGroup, GroupComposer::compose(name, {}));
+    if (!reply.isAccepted()) {
+        if (row.uri.empty() && reply.answer == CtAnswer::kRefused) {
+            row.etag.clear();
+            if (CtGroupKind::update(*mpStore, row) != kOk) mIsOver = true;
+        }
+        return fail("group", row.group_id, row.uri, reply);
+    }
+    row.dirty = 0;
+    ++mSent;
+    store<CtGroupKind>(row, reply, version);
+    mSentGroups.push_back({row.group_id, version, row.uri});
+}
+
+// --- contacts
+
+void CtUploader::sendContact(CtContactSyncRow& row, const ContactComposer& composer) {
+    contacts_record_h raw = nullptr;
+    if (contacts_db_get_record(_contacts_contact, row.contact_id, &raw) != PLATFORM_ERROR_NONE) return;
+    const ContactsRecord record(raw);
+    if (!sendFields(row, raw, composer) || mIsOver) return;
+    if (row.image_dirty != 0 && !sendPhoto(row, raw)) return;
+    row.dirty = row.image_dirty = 0;
+    ++mSent;
+    store<CtContactKind>(row, {}, row.version);
+}
+
+bool CtUploader::sendFields(CtContactSyncRow& row, contacts_record_h record,
+                            const ContactComposer& composer) {
+    const int version = intOf(record, CONTACTS_CONTACT_VERSION);
+    CtUpReply reply;
+    if (!row.uri.empty()) {
+        reply = updateContact(row, record, composer);
+        if (reply.answer == CtAnswer::kGone) renew<CtContactKind>(row);
+    }
+    if (row.uri.empty() && !mIsOver) reply = mTask.insert(CtItemType::kContact, composer.compose(record, {}));
+    if (!reply.isAccepted()) {
+        if (row.uri.empty() && reply.answer == CtAnswer::kRefused) {
+            row.etag.clear();
+            if (mpStore->updateContact(row) != kOk) mIsOver = true;
+        }
+        fail("contact", row.contact_id, row.uri, reply);
+        return false;
+    }
+    // The marks stay until the photo is there too.
+    store<CtContactKind>(row, reply, version);
+    if (reply.meta.entry)
+        mSentContacts.push_back({row.contact_id, version, json_text::textOf(reply.meta.entry.get())});
+    return true;
+}
+
+CtUpReply CtUploader::updateContact(const CtContactSyncRow& row, contacts_record_h record,
+                                    const ContactComposer& composer) {
+    std::string etag = row.etag;
+    std::string origin;
+    CtUpReply reply;
+    // What is carried over must be of the version that is replaced.
+    const bool isStale = etag.empty() || keptEtag(record) != etag;
+    for (int attempt = 0; attempt < 2; ++attempt) {
+        if (attempt > 0 || isStale) {
+            reply = mTask.read(CtItemType::kContact, row.uri);
+            if (!reply.isAccepted()) return reply;
+            etag = reply.meta.etag;
+            origin = json_text::textOf(reply.meta.entry.get());
+            if (attempt > 0 && composer.composeFields(json_access::objectIn(reply.meta.entry.get())) !=
+                                   composer.composeFields(record)) {
+                SYNC_ERR("contact(%s) was changed on both sides, the device's change wins", row.uri.c_str());
+            }
+        }
+        reply = mTask.update(CtItemType::kContact, row.uri, etag, composer.compose(record, etag, origin));
+        if (reply.answer != CtAnswer::kConflict) break;
+    }
+    return reply;
+}
+
+bool CtUploader::sendPhoto(CtContactSyncRow& row, contacts_record_h record) {
+    const std::string path = imageOf(record);
+    // The server has none, as far as is known.
+    if (path.empty() && row.photo_etag.empty()) return true;
+    CtUpReply reply;
+    for (int attempt = 0; attempt < 2; ++attempt) {
+        reply = path.empty() ? mTask.removePhoto(row.uri, row.photo_etag)
+                             : mTask.upsertPhoto(row.uri, row.photo_etag, path);
+        if (reply.answer != CtAnswer::kConflict || attempt > 0) break;
+        const CtUpReply now = mTask.read(CtItemType::kContact, row.uri);
+        if (!now.isAccepted()) break;
+        SYNC_ERR("the photo of contact(%s) was changed on both sides, the device's wins", row.uri.c_str());
+        row.photo_etag = now.meta.photoEtag;
+        if (path.empty() && row.photo_etag.empty()) return true;
+    }
+    if (!reply.isAccepted()) {
+        fail("contact", row.contact_id, row.uri, reply);
+        return false;
+    }
+    if (!reply.meta.etag.empty()) {
+        row.photo_etag = reply.meta.photoEtag;
+        row.etag = reply.meta.etag;
+        const std::string text = json_text::textOf(reply.meta.entry.get());
+        if (!mSentContacts.empty() && mSentContacts.back().id == row.contact_id) {
+            mSentContacts.back().text = text;
+        } else {
+            mSentContacts.push_back({row.contact_id, row.version, text});
+        }
+    }
+    if (path.empty()) row.photo_etag.clear();
+    return true;
+}
+
+// --- deletions
+
+template <class Kind>
+void CtUploader::sendDeleted(CtItemType type, typename Kind::Row& row) {
+    const int id = row.*Kind::kId;
+    if (row.uri.empty()) {
+        if (row.etag == kCtUnconfirmedEtag)
+            SYNC_ERR("%s(%d) was deleted before the server's answer to it was known", Kind::kName, id);
+        if (Kind::forget(*mpStore, id) != kOk) mIsOver = true;
+        return;
+    }
+    if (isOfServer(row)) {
+        SYNC_ERR("%s(%s) belongs to the server, the device's deletion is not sent", Kind::kName,
+                 row.uri.c_str());
+        row.deleted = row.dirty = 0;
+        return store<Kind>(row, {}, row.version);
+    }
+    CtUpReply reply;
+    for (int attempt = 0; attempt < 2; ++attempt) {
+        if (attempt > 0 || row.etag.empty()) {
+            reply = mTask.read(type, row.uri);
+            if (!reply.isAccepted()) break;
+            SYNC_ERR("%s(%s) has moved on, the device's deletion wins", Kind::kName, row.uri.c_str());
+            row.etag = reply.meta.etag;
+        }
+        reply = mTask.remove(type, row.uri, row.etag);
+        if (reply.answer != CtAnswer::kConflict) break;
+    }
+    if (!reply.isAccepted() && reply.answer != CtAnswer::kGone) return fail(Kind::kName, id, row.uri, reply);
+    ++mSent;
+    row.deleted = row.dirty = 0;
+    store<Kind>(row, {}, row.version);
+}
+
+// --- what the records learn
+
+namespace {
+
+int setServerId(CtContactKind /*kind*/, contacts_record_h record, const std::string& entry) {
+    std::vector<contacts_record_h> old;
+    forEachChild(record, CONTACTS_CONTACT_EXTENSIONS, [&old](contacts_record_h extension) {
+        if (intOf(extension, CONTACTS_EXTENSION_DATA1) == ct_wire::kOriginExtension) old.push_back(extension);
+    });
+    for (const contacts_record_h extension : old) {
+        if (contacts_record_remove_child_record(record, CONTACTS_CONTACT_EXTENSIONS, extension) ==
+            PLATFORM_ERROR_NONE)
+            contacts_record_destroy(extension, true);
+    }
+    contacts_record_h raw = nullptr;
+    if (contacts_record_create(_contacts_extension, &raw) != PLATFORM_ERROR_NONE) return kFailed;
+    ContactsRecord origin(raw);
+    if (contacts_record_set_int(raw, CONTACTS_EXTENSION_DATA1, ct_wire::kOriginExtension) !=
+            PLATFORM_ERROR_NONE ||
+        contacts_record_set_str(raw, CONTACTS_EXTENSION_DATA2, ct_wire::kOriginName) != PLATFORM_ERROR_NONE ||
+        contacts_record_set_str(raw, CONTACTS_EXTENSION_DATA3, entry.c_str()) != PLATFORM_ERROR_NONE ||
+        contacts_record_add_child_record(record, CONTACTS_CONTACT_EXTENSIONS, raw) != PLATFORM_ERROR_NONE) {
+        return kFailed;
+    }
+    (void)origin.release();
+    return kOk;
+}
+
+int setServerId(CtGroupKind /*kind*/, contacts_record_h record, const std::string& uri) {
+    return contacts_record_set_str(record, CONTACTS_GROUP_SYNC_DATA1, uri.c_str()) == PLATFORM_ERROR_NONE
+               ? kOk
+               : kFailed;
+}
+
+std::vector<unsigned> serverIdProperties(CtContactKind /*kind*/) {
+    return {CONTACTS_CONTACT_ID, CONTACTS_CONTACT_ADDRESS_BOOK_ID, CONTACTS_CONTACT_EXTENSIONS};
+}
+std::vector<unsigned> serverIdProperties(CtGroupKind /*kind*/) {
+    return {CONTACTS_GROUP_ID, CONTACTS_GROUP_ADDRESS_BOOK_ID, CONTACTS_GROUP_SYNC_DATA1};
+}
+
+}  // namespace
+
+template <class Kind>
+int CtUploader::writeBack(const std::vector<Sent>& sent) {
+    if (sent.empty()) return kOk;
+    std::vector<std::pair<int, int>> versions;  // by record
+    {
+        CtTransaction transaction;
+        if (!transaction.begun()) return kFailed;
+        for (const Sent& item : sent) {
+            ContactsList list;
+            contacts_record_h record = nullptr;
+            const int code = contacts_read::readPart(Kind::kView, Kind::kIdProperty, item.id,
+                                                     serverIdProperties(Kind()), &list, &record);
+            if (code == PLATFORM_ERROR_NOT_FOUND) continue;
+            std::vector<size_t> skipped;
+            const int expected[] = {item.version};
+            const record_write_options_s options{
+                .by_sync = true, .expected_versions = expected, .skipped = &skipped};
+            if (code != PLATFORM_ERROR_NONE || setServerId(Kind(), record, item.text) != kOk ||
+                contacts_db_update_record(record, options) != PLATFORM_ERROR_NONE) {
+                return kFailed;
+            }
+            int version = 0;
+            if (skipped.empty() && contacts_db_get_last_change_version(&version) == PLATFORM_ERROR_NONE)
+                versions.emplace_back(item.id, version);
+        }
+        if (!transaction.commit()) return kFailed;
+    }
+    SyncTransaction transaction(mpStore->database());
+    if (!transaction.begun()) return kFailed;
+    std::vector<typename Kind::Row> rows;
+    if (Kind::getAll(*mpStore, mAddressBookId, &rows) != kOk) return kFailed;
+    for (const auto& [id, version] : versions) {
+        for (auto& row : rows) {
+            if (row.*Kind::kId != id) continue;
+            row.version = version;
+            if (Kind::update(*mpStore, row) != kOk) return kFailed;
+        }
+    }
+    return transaction.commit();
+}

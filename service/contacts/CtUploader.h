@@ -1,0 +1,74 @@
+// CtUploader: sends the marked groups and contacts of one account.
+// Owner: an upload run.   Threads: one worker.
+//
+// A mark is cleared when the server took the change, or no longer has what was to be deleted; whatever else happens it stays for the
+// next run. A new item is marked as sent before it goes out, in the store: should its answer be lost, the next run looks for it in
+// the server's list before it is sent again.
+#pragma once
+
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "common/SyncDirector.h"
+#include "contacts/CtGroupMap.h"
+#include "contacts/CtItemKind.h"
+#include "contacts/CtUpSyncTask.h"
+
+class CtUploader {
+public:
+    // Nothing is owned; `stopQuery` may be NULL.
+    CtUploader(CtMetaDataDBHelper* store, int addressBookId, CtCurl* curl, IStopQuery* stopQuery);
+
+    // 0, 1 when stopped, -5, or -1 with failure(). What could be sent was sent.
+    [[nodiscard]] int run();
+
+    [[nodiscard]] const std::string& failure() const { return mFailure; }
+    [[nodiscard]] int sent() const { return mSent; }
+
+private:
+    // What the record learns of the server's answer.
+    struct Sent {
+        int id = 0;
+        int version = 0;   // that was sent
+        std::string text;  // the entry of a contact, the id of a group
+    };
+
+    [[nodiscard]] bool isOver() const {
+        return mIsOver || (mpStopQuery != nullptr && mpStopQuery->isStopped());
+    }
+    void fail(const char* itemName, int id, const std::string& uri, const CtUpReply& reply);
+    template <class Kind>
+    void store(typename Kind::Row& row, const CtUpReply& reply, int version);
+    template <class Kind>
+    [[nodiscard]] int markAsSent(std::vector<typename Kind::Row>* rows);
+    template <class Kind>
+    void sendDeleted(CtItemType type, typename Kind::Row& row);
+    // Forgets what the server knew of the item: it is sent as new.
+    template <class Kind>
+    void renew(typename Kind::Row& row);
+    template <class Kind>
+    [[nodiscard]] int writeBack(const std::vector<Sent>& sent);
+
+    void sendGroup(CtGroupSyncRow& row);
+    void sendContact(CtContactSyncRow& row, const ContactComposer& composer);
+    // Takes the entry into `row`; false when the contact's fields were not taken.
+    [[nodiscard]] bool sendFields(CtContactSyncRow& row, contacts_record_h record,
+                                  const ContactComposer& composer);
+    [[nodiscard]] CtUpReply updateContact(const CtContactSyncRow& row, contacts_record_h record,
+                                          const ContactComposer& composer);
+    [[nodiscard]] bool sendPhoto(CtContactSyncRow& row, contacts_record_h record);
+
+    CtMetaDataDBHelper* const mpStore;
+    const int mAddressBookId;
+    CtUpSyncTask mTask;
+    const std::string mFeedBase;
+    IStopQuery* const mpStopQuery;
+
+    std::vector<Sent> mSentContacts;
+    std::vector<Sent> mSentGroups;
+    bool mIsOver = false;
+    int mResult = sync_result::kOk;
+    int mSent = 0;
+    std::string mFailure;
+};

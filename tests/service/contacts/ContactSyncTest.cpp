@@ -1,0 +1,386 @@
+// Both directions of the contacts sync against a feed server in the same process. A user's edits are plain writes to the store.
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <memory>
+#include <set>
+
+#include "common/Account.h"
+#include "common/SyncResult.h"
+#include "contacts/CtDataManager.h"
+#include "contacts/CtDownSyncDirector.h"
+#include "contacts/CtUpSyncDirector.h"
+#include "platform/contacts_read.h"
+#include "service/contacts/FeedServer.h"
+#include "support/TestRoot.h"
+
+using contacts_read::forEachChild;
+using contacts_read::intOf;
+using contacts_read::textOf;
+using sync_result::kFailed;
+using sync_result::kOk;
+
+namespace {
+
+Json named(const std::string& name, const Json& more = Json::object()) {
+    Json entry = {{"gd$name", {{"gd$givenName", {{"$t", name}}}}}};
+    entry.update(more);
+    return entry;
+}
+
+// One account on the process's device, which the manager is bound to.
+class ContactSync : public testing::Test {
+protected:
+    ContactSync() : mAccount(record()), mDown(&mAccount, nullptr), mUp(&mAccount, nullptr) {
+        EXPECT_EQ(manager().prepareSync(), kOk);
+        EXPECT_EQ(manager().addAccount(mAccount.getAccountId()), kOk);
+        EXPECT_EQ(manager().getAddressBookId(mAccount.getAccountId(), &mBook), kOk);
+    }
+
+    static CtDataManager& manager() { return CtDataManager::getInstance(); }
+    static TestRoot& root() {
+        static TestRoot* const instance = new TestRoot;
+        return *instance;
+    }
+    vantor_pim_sync_account_s record() {
+        static int accounts = 0;
+        root();
+        mUrl = mServer.url();
+        vantor_pim_sync_account_s fields{};
+        fields.account_id = ++accounts;
+        fields.ctsync = true;
+        fields.ctserver = mUrl.data();
+        return fields;
+    }
+
+    void sync() {
+        ASSERT_EQ(mDown.run(), kOk) << mDown.lastFailure();
+        ASSERT_EQ(mUp.run(), kOk) << mUp.lastFailure();
+    }
+    // Nothing is left to do for either side.
+    void expectQuiet() {
+        (void)mServer.takeWrites();
+        int before = 0;
+        int after = 0;
+        EXPECT_EQ(contacts_db_get_current_version(&before), 0);
+        sync();
+        EXPECT_EQ(contacts_db_get_current_version(&after), 0);
+        EXPECT_EQ(mServer.takeWrites(), 0);
+        EXPECT_EQ(before, after);
+        EXPECT_FALSE(manager().hasSomethingToSend(mAccount.getAccountId()));
+    }
+
+    [[nodiscard]] std::map<std::string, int> deviceContacts() const {
+        std::map<std::string, int> found;
+        contacts_query_h rawQuery = nullptr;
+        contacts_list_h rawList = nullptr;
+        EXPECT_EQ(contacts_query_create(_contacts_contact, &rawQuery), 0);
+        const ContactsQuery query(rawQuery);
+        EXPECT_EQ(contacts_query_add_filter_int(rawQuery, CONTACTS_CONTACT_ADDRESS_BOOK_ID, mBook), 0);
+        EXPECT_EQ(contacts_db_get_records_with_query(rawQuery, 0, 0, &rawList), 0);
+        const ContactsList list(rawList);
+        contacts_read::forEach(rawList, [&found](contacts_record_h record) {
+            std::string name;
+            forEachChild(record, CONTACTS_CONTACT_NAMES,
+                         [&name](contacts_record_h child) { name = textOf(child, CONTACTS_NAME_FIRST); });
+            found.emplace(name, intOf(record, CONTACTS_CONTACT_ID));
+        });
+        return found;
+    }
+    [[nodiscard]] std::set<std::string> serverNames() {
+        std::set<std::string> names;
+        for (const auto& [id, entry] : mServer.all("contacts"))
+            names.insert(entry.value("/gd$name/gd$givenName/$t"_json_pointer, "(none)"));
+        return names;
+    }
+    [[nodiscard]] std::set<std::string> deviceNames() const {
+        std::set<std::string> names;
+        for (const auto& [name, id] : deviceContacts()) names.insert(name);
+        return names;
+    }
+    void expectSame() { EXPECT_EQ(deviceNames(), serverNames()); }
+
+    static std::string imageOf(int contactId) {
+        contacts_record_h raw = nullptr;
+        if (contacts_db_get_record(_contacts_contact, contactId, &raw) != 0) return "(gone)";
+        const ContactsRecord record(raw);
+        std::string bytes;
+        forEachChild(raw, CONTACTS_CONTACT_IMAGES, [&bytes](contacts_record_h image) {
+            std::ifstream file(root().at(textOf(image, CONTACTS_IMAGE_PATH)));
+            bytes.assign(std::istreambuf_iterator<char>(file), {});
+        });
+        return bytes;
+    }
+
+    // --- what a user does
+    int add(const std::string& name, int groupId = 0) {
+        contacts_record_h raw = nullptr;
+        EXPECT_EQ(contacts_record_create(_contacts_contact, &raw), 0);
+        const ContactsRecord record(raw);
+        EXPECT_EQ(contacts_record_set_int(raw, CONTACTS_CONTACT_ADDRESS_BOOK_ID, mBook), 0);
+        contacts_record_h child = nullptr;
+        EXPECT_EQ(contacts_record_create(_contacts_name, &child), 0);
+        EXPECT_EQ(contacts_record_set_str(child, CONTACTS_NAME_FIRST, name.c_str()), 0);
+        EXPECT_EQ(contacts_record_add_child_record(raw, CONTACTS_CONTACT_NAMES, child), 0);
+        if (groupId != 0) {
+            EXPECT_EQ(contacts_record_create(_contacts_group_relation, &child), 0);
+            EXPECT_EQ(contacts_record_set_int(child, CONTACTS_GROUP_RELATION_GROUP_ID, groupId), 0);
+            EXPECT_EQ(contacts_record_add_child_record(raw, CONTACTS_CONTACT_GROUP_RELATIONS, child), 0);
+        }
+        int id = 0;
+        EXPECT_EQ(contacts_db_insert_record(raw, &id), 0);
+        return id;
+    }
+    static void rename(int contactId, const std::string& name) {
+        contacts_record_h raw = nullptr;
+        ASSERT_EQ(contacts_db_get_record(_contacts_contact, contactId, &raw), 0);
+        const ContactsRecord record(raw);
+        forEachChild(raw, CONTACTS_CONTACT_NAMES, [&name](contacts_record_h child) {
+            EXPECT_EQ(contacts_record_set_str(child, CONTACTS_NAME_FIRST, name.c_str()), 0);
+        });
+        ASSERT_EQ(contacts_db_update_record(raw), 0);
+    }
+    // Empty bytes: no image.
+    static void setImage(int contactId, const std::string& bytes) {
+        contacts_record_h raw = nullptr;
+        ASSERT_EQ(contacts_db_get_record(_contacts_contact, contactId, &raw), 0);
+        const ContactsRecord record(raw);
+        std::vector<contacts_record_h> images;
+        forEachChild(raw, CONTACTS_CONTACT_IMAGES,
+                     [&images](contacts_record_h image) { images.push_back(image); });
+        for (const contacts_record_h image : images) {
+            ASSERT_EQ(contacts_record_remove_child_record(raw, CONTACTS_CONTACT_IMAGES, image), 0);
+            contacts_record_destroy(image, true);
+        }
+        if (!bytes.empty()) {
+            std::ofstream(root().at("/tmp/mine")) << bytes;
+            contacts_record_h image = nullptr;
+            ASSERT_EQ(contacts_record_create(_contacts_image, &image), 0);
+            ASSERT_EQ(contacts_record_set_str(image, CONTACTS_IMAGE_PATH, "/tmp/mine"), 0);
+            ASSERT_EQ(contacts_record_add_child_record(raw, CONTACTS_CONTACT_IMAGES, image), 0);
+        }
+        ASSERT_EQ(contacts_db_update_record(raw), 0);
+    }
+    static void erase(int contactId) {
+        ASSERT_EQ(contacts_db_delete_record(_contacts_contact, contactId), 0);
+    }
+
+    FeedServer mServer;
+    std::string mUrl;
+    Account mAccount;
+    CtDownSyncDirector mDown;
+    CtUpSyncDirector mUp;
+    int mBook = 0;
+};
+
+}  // namespace
+
+TEST_F(ContactSync, EverythingTravelsBothWaysOnce) {
+    mServer.put("groups", "6",
+                {{"title", {{"$t", "System"}}}, {"gContact$systemGroup", {{"id", "Contacts"}}}});
+    mServer.put("groups", "g1", {{"title", {{"$t", "Friends"}}}});
+    for (const char* id : {"a", "b", "c", "d", "e"}) mServer.put("contacts", id, named(id));
+    mServer.put(
+        "contacts", "f",
+        named("f", {{"gContact$gender", {{"value", "x"}}},
+                    {"gContact$groupMembershipInfo", {{{"href", "http://s/groups/a%40x.com/base/g1"}}}}}));
+    sync();
+    expectSame();
+    expectQuiet();
+    int group = 0;
+    ASSERT_EQ(manager().getGroupId("g1", mBook, &group), kOk);
+    auto device = deviceContacts();
+    rename(device["f"], "f edited");
+    erase(device["a"]);
+    mServer.erase("contacts", "b");
+    mServer.put("contacts", "c", named("c moved"));
+    add("fresh", group);
+    sync();
+    expectSame();
+    EXPECT_EQ(serverNames(), (std::set<std::string>{"c moved", "d", "e", "f edited", "fresh"}));
+    EXPECT_EQ(mServer.all("contacts")["f"]["gContact$gender"]["value"], "x");
+    for (const auto& [id, entry] : mServer.all("contacts")) {
+        if (id[0] != 'n') continue;
+        EXPECT_NE(entry["gContact$groupMembershipInfo"][0]["href"].get<std::string>().find("/base/g1"),
+                  std::string::npos);
+    }
+    sync();
+    expectQuiet();
+}
+
+TEST_F(ContactSync, GroupsOfTheDeviceGoUpButNotThoseOfTheServer) {
+    mServer.put("groups", "6",
+                {{"title", {{"$t", "System"}}}, {"gContact$systemGroup", {{"id", "Contacts"}}}});
+    sync();
+    contacts_record_h raw = nullptr;
+    ASSERT_EQ(contacts_record_create(_contacts_group, &raw), 0);
+    const ContactsRecord record(raw);
+    ASSERT_EQ(contacts_record_set_int(raw, CONTACTS_GROUP_ADDRESS_BOOK_ID, mBook), 0);
+    ASSERT_EQ(contacts_record_set_str(raw, CONTACTS_GROUP_NAME, "Mine & <yours>"), 0);
+    int mine = 0;
+    int system = 0;
+    ASSERT_EQ(contacts_db_insert_record(raw, &mine), 0);
+    ASSERT_EQ(manager().getGroupId("6", mBook, &system), kOk);
+    ASSERT_EQ(contacts_db_delete_record(_contacts_group, system), 0);
+    add("member", mine);
+    sync();
+    const auto groups = mServer.all("groups");
+    ASSERT_EQ(groups.size(), 2U);
+    EXPECT_EQ(groups.rbegin()->second["title"]["$t"], "Mine & <yours>");
+    const auto contacts = mServer.all("contacts");
+    ASSERT_EQ(contacts.size(), 1U);
+    EXPECT_NE(contacts.begin()->second["gContact$groupMembershipInfo"][0]["href"].get<std::string>().find(
+                  groups.rbegin()->first),
+              std::string::npos);
+    sync();
+    EXPECT_EQ(manager().getGroupId("6", mBook, &system), kOk) << "the server's group comes back";
+    expectQuiet();
+    ASSERT_EQ(contacts_db_delete_record(_contacts_group, mine), 0);
+    sync();
+    EXPECT_EQ(mServer.all("groups").size(), 1U);
+}
+
+TEST_F(ContactSync, PhotosGoBothWays) {
+    mServer.put("contacts", "a", named("a"));
+    mServer.putPhoto("a", "first photo");
+    mServer.put("contacts", "b", named("b"));
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["a"]), "first photo");
+    expectQuiet();
+    mServer.put("contacts", "a", named("a2"));
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["a2"]), "first photo") << "an edit of another field keeps it";
+    setImage(deviceContacts()["a2"], "mine");
+    setImage(deviceContacts()["b"], "mine too");
+    sync();
+    EXPECT_EQ(mServer.photo("a"), "mine");
+    EXPECT_EQ(mServer.photo("b"), "mine too");
+    expectQuiet();
+    setImage(deviceContacts()["b"], "");
+    sync();
+    EXPECT_EQ(mServer.photo("b"), "");
+    expectQuiet();
+    mServer.photoStatus = 404;
+    mServer.putPhoto("a", "newer");
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["a2"]), "mine") << "what cannot be had leaves what is there";
+    mServer.photoStatus = 200;
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["a2"]), "newer") << "and is asked for again";
+    expectQuiet();
+    EXPECT_TRUE(std::filesystem::is_empty(root().at("/tmp")) ||
+                !std::filesystem::exists(root().at("/tmp/a")));
+}
+
+TEST_F(ContactSync, WhenBothSidesChangedTheDeviceWins) {
+    for (const char* id : {"a", "b", "c"}) mServer.put("contacts", id, named(id));
+    sync();
+    const auto device = deviceContacts();
+    rename(device.at("a"), "a device");
+    mServer.put("contacts", "a", named("a server", {{"gContact$gender", {{"value", "new"}}}}));
+    rename(device.at("b"), "b device");
+    mServer.erase("contacts", "b");
+    erase(device.at("c"));
+    mServer.put("contacts", "c", named("c server"));
+    ASSERT_EQ(mUp.run(), kOk);  // the upload finds out by itself
+    sync();
+    EXPECT_EQ(serverNames(), (std::set<std::string>{"a device", "b device"}));
+    EXPECT_EQ(mServer.all("contacts")["a"]["gContact$gender"]["value"], "new")
+        << "what only the server knows stays";
+    expectSame();
+    // The same when the download sees it first.
+    rename(deviceContacts()["a device"], "a again");
+    mServer.put("contacts", "a", named("a server", {{"gContact$gender", {{"value", "newer"}}}}));
+    rename(deviceContacts()["b device"], "b again");
+    for (const auto& [id, entry] : mServer.all("contacts")) {
+        if (id != "a") mServer.erase("contacts", id);
+    }
+    sync();
+    EXPECT_EQ(serverNames(), (std::set<std::string>{"a again", "b again"}));
+    EXPECT_EQ(mServer.all("contacts")["a"]["gContact$gender"]["value"], "newer");
+    expectSame();
+    sync();
+    expectQuiet();
+}
+
+TEST_F(ContactSync, ALostAnswerDoublesNothing) {
+    for (int round = 0; round < 2; ++round) {
+        add("lost " + std::to_string(round));
+        mServer.failNextWrites = 1;
+        EXPECT_EQ(mUp.run(), kFailed);
+        mServer.failNextWrites = 0;
+        if (round == 0) {
+            ASSERT_EQ(mUp.run(), kOk) << "the upload looks first";
+        }
+        sync();
+        EXPECT_EQ(mServer.all("contacts").size(), static_cast<size_t>(round) + 1);
+    }
+    expectSame();
+    rename(deviceContacts()["lost 0"], "edited");
+    mServer.failNextWrites = 1;
+    EXPECT_EQ(mUp.run(), kFailed);
+    mServer.failNextWrites = 0;
+    sync();
+    EXPECT_EQ(serverNames(), (std::set<std::string>{"edited", "lost 1"}));
+    sync();
+    expectQuiet();
+}
+
+TEST_F(ContactSync, OnlyACompleteListDeletes) {
+    for (int i = 0; i < 30; ++i)
+        mServer.put("contacts", "c" + std::to_string(10 + i), named("n" + std::to_string(i)));
+    sync();
+    mServer.erase("contacts", "c10");
+    mServer.endsEarly = true;
+    EXPECT_EQ(mDown.run(), kFailed);
+    EXPECT_EQ(deviceNames().size(), 30U);
+    mServer.endsEarly = false;
+    sync();
+    EXPECT_EQ(deviceNames().size(), 29U);
+    mServer.isEmpty = true;
+    sync();  // an empty side is believed at the second look
+    EXPECT_EQ(deviceNames().size(), 0U);
+    mServer.isEmpty = false;
+    sync();
+    expectSame();
+    expectQuiet();
+}
+
+TEST_F(ContactSync, TheWholeFeedAtOnceSaysTheSame) {
+    mServer.put("groups", "g1", {{"title", {{"$t", "Friends"}}}});
+    for (const char* id : {"a", "b", "c", "d", "e"}) mServer.put("contacts", id, named(id));
+    ASSERT_EQ(mDown.processGroups(), kOk);
+    ASSERT_EQ(mDown.processContacts(), kOk);
+    expectSame();
+    mServer.put("contacts", "b", named("b2"));
+    mServer.erase("contacts", "c");
+    ASSERT_EQ(mDown.processContacts(), kOk);
+    expectSame();
+    expectQuiet();
+}
+
+TEST_F(ContactSync, RowsThatWereCutOffAreTakenOver) {
+    for (const char* id : {"a", "b", "c"}) mServer.put("contacts", id, named(id));
+    mServer.put("groups", "g1", {{"title", {{"$t", "Friends"}}}});
+    sync();
+    add("mine");
+    sync();
+    rename(deviceContacts()["b"], "b edited");
+    for (const auto& [name, id] : deviceContacts()) ASSERT_EQ(manager().metaData()->forgetContact(id), kOk);
+    int group = 0;
+    ASSERT_EQ(manager().getGroupId("g1", mBook, &group), kOk);
+    ASSERT_EQ(manager().metaData()->forgetGroup(group), kOk);
+    sync();
+    EXPECT_EQ(serverNames(), (std::set<std::string>{"a", "b edited", "c", "mine"}));
+    EXPECT_EQ(mServer.all("contacts").size(), 4U);
+    expectSame();
+    EXPECT_EQ(deviceContacts().size(), 4U);
+    sync();
+    expectQuiet();
+    // Records that are gone although nobody deleted them are made again.
+    ASSERT_EQ(contacts_db_delete_record(_contacts_contact, deviceContacts()["a"], {.by_sync = true}), 0);
+    ASSERT_EQ(contacts_db_delete_record(_contacts_address_book, mBook), 0);
+    sync();
+    ASSERT_EQ(manager().getAddressBookId(mAccount.getAccountId(), &mBook), kOk);
+    expectSame();
+}

@@ -1,0 +1,50 @@
+// FeedServer: a contacts service in a test: entries by id, pages of two, etags that are checked. Not strict about content.
+#pragma once
+
+#include <httplib.h>
+
+#include <map>
+#include <mutex>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "service/contacts/AtomReader.h"
+
+class FeedServer {
+public:
+    FeedServer();
+    ~FeedServer();
+    [[nodiscard]] std::string url() const { return "http://127.0.0.1:" + std::to_string(mPort); }
+
+    // Feeds are "contacts" and "groups".
+    void put(const std::string& feed, const std::string& id, const Json& fields);
+    void erase(const std::string& feed, const std::string& id);
+    void putPhoto(const std::string& id, const std::string& bytes);
+    [[nodiscard]] std::map<std::string, Json> all(const std::string& feed);
+    [[nodiscard]] std::string photo(const std::string& id);
+    // Requests that wrote since the last call.
+    [[nodiscard]] int takeWrites();
+
+    // Faults, read under the lock.
+    int failNextWrites = 0;  // answered with 500 although they were carried out
+    bool isEmpty = false;    // lists nothing
+    bool endsEarly = false;  // the second page is an error
+    int photoStatus = 200;
+
+private:
+    void serveFeeds(const std::string& feed);
+    void servePhotos();
+    Json entry(const std::string& feed, const std::string& id) const;
+    void writeDone(httplib::Response& response, const Json& body, int status);
+    std::string nextEtag() { return "\"" + std::to_string(++mRevision) + "\""; }
+
+    std::mutex mMutex;
+    std::map<std::string, std::map<std::string, Json>> mEntries;
+    std::map<std::string, std::pair<std::string, std::string>> mPhotos;  // etag and bytes
+    int mRevision = 0;
+    int mWrites = 0;
+    httplib::Server mServer;
+    int mPort = 0;
+    std::thread mThread;
+};

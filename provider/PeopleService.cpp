@@ -30,7 +30,9 @@ Reply PeopleService::profile(const Call& call) {
     const auto lock = mContext.store.guard();
     const Person& person = mContext.store.person(call.ids[0]);
     Json body = {{"id", call.ids[0]}};
-    for (const auto& [name, value] : person.profile.items()) body[name] = value;
+    for (const auto& [name, value] : person.profile.items()) {
+        if (name != "id") body[name] = value;
+    }
     const std::string image = person.photo.isThere() ? call.ids[0] : "default";
     body["image"] = {{"url", call.origin + "/img/" + image}, {"isDefault", !person.photo.isThere()}};
     return jsonReply(body);

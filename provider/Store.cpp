@@ -370,7 +370,8 @@ void Store::loadTaskList(Account& account, const Json& state) {
 }
 
 void Store::loadPerson(const Json& state) {
-    if (!state.is_object() || !state.contains("profile")) invalid("people");
+    if (!state.is_object() || !state.contains("profile") || !state.at("profile").is_object())
+        invalid("people");
     Person& person = putPerson(textOf(state, "id", ""), state.at("profile"));
     if (state.contains("photo")) person.photo = Image::load(state.at("photo"));
 }

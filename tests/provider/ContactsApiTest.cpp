@@ -299,6 +299,15 @@ TEST_F(Contacts, AreChangedFromOutside) {
     loaded.load(dump);
     EXPECT_EQ(loaded.dump(), dump);
     EXPECT_EQ(loaded.contacts("a@x.example").get(FeedKind::kContact, "c").photo.bytes, "bytes");
+    for (const char* bad :
+         {R"([])", R"({"contacts":[{"fields":{"gContact$birthday":{}}}]})",
+          R"({"contacts":[{"fields":{},"photo":{"bytes":"*"}}]})",
+          R"({"groups":[{"id":"x","etag":"1","fields":{}},{"id":"x","etag":"1","fields":{}}]})"}) {
+        Json state = {{"accounts", {{{"email", "b@x.example"}}}}};
+        state["accounts"][0]["contacts"] = Json::parse(bad);
+        EXPECT_THROW(loaded.load(state), ApiError) << bad;
+        EXPECT_EQ(loaded.dump(), dump) << bad;
+    }
     EXPECT_EQ(send("DELETE", contacts + "/c/photo").status, 200);
     EXPECT_EQ(send("PUT", contacts + "/c", R"({"title":{"$t":"T"}})").status, 200);
     EXPECT_FALSE(entry("c").contains("gd$name"));
@@ -306,6 +315,8 @@ TEST_F(Contacts, AreChangedFromOutside) {
     const Json listed = read(std::string(kContacts) + kJson).body["feed"]["entry"];
     ASSERT_EQ(listed.size(), 1U);
     EXPECT_TRUE(listed[0].contains("gd$deleted") && listed[0].contains("deleted"));
+    loaded.load(get("/admin/dump").body);
+    EXPECT_TRUE(loaded.contacts("a@x.example").entries(FeedKind::kContact).at(0)->isDeleted);
     EXPECT_EQ(read(path("c")).status, 404);
     EXPECT_EQ(send("DELETE", admin + "groups/g").status, 200);
     EXPECT_EQ(send("GET", admin + "groups").body["items"].size(), 2U);
@@ -315,10 +326,11 @@ TEST_F(Contacts, PeopleShowThemselvesToAnybody) {
     const httplib::Headers open = {{"Authorization", ""}};
     const std::string person = "/orbit/v1/people/p?key=k";
     EXPECT_EQ(send("GET", person, "", open).status, 404);
-    const char* profile = R"({"name":{"givenName":"A","familyName":"B"},"nickname":"N"})";
+    const char* profile = R"({"id":"q","name":{"givenName":"A","familyName":"B"},"nickname":"N"})";
     EXPECT_EQ(send("PUT", "/admin/people/p", profile).status, 200);
     EXPECT_EQ(send("GET", "/orbit/v1/people/p", "", open).status, 400);
     const Json plain = send("GET", person, "", open).body;
+    EXPECT_EQ(plain["id"], "p");
     EXPECT_EQ(plain["name"]["familyName"], "B");
     EXPECT_EQ(plain["image"]["isDefault"], true);
     EXPECT_EQ(send("GET", "/img/default?sz=720", "", open).text.substr(1, 3), "PNG");

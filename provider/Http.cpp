@@ -8,12 +8,25 @@ namespace provider {
 namespace {
 
 constexpr std::size_t kMaxBodyBytes = 4 << 20;
+constexpr std::size_t kMaxImageBytes = 10 << 20;
 
 int hexValue(char c) {
     if (c >= '0' && c <= '9') return c - '0';
     if (c >= 'a' && c <= 'f') return c - 'a' + 10;
     if (c >= 'A' && c <= 'F') return c - 'A' + 10;
     return -1;
+}
+
+// The content type in lower case, which is how its names compare.
+std::string contentType(const Call& call) {
+    std::string type = call.header("Content-Type");
+    std::transform(type.begin(), type.end(), type.begin(), [](unsigned char c) { return std::tolower(c); });
+    return type;
+}
+
+void checkSize(const Call& call, std::size_t limit) {
+    if (call.body.empty()) throw ApiError{400, "required", "Required: a body", ""};
+    if (call.body.size() > limit) throw ApiError{413, "uploadTooLarge", "Request is too large", ""};
 }
 
 }  // namespace
@@ -64,11 +77,10 @@ Reply jsonReply(const Json& body, int status) {
     return reply;
 }
 
-Json jsonBody(const Call& call) {
-    std::string type = call.header("Content-Type");
-    std::transform(type.begin(), type.end(), type.begin(), [](unsigned char c) { return std::tolower(c); });
+void requireBody(const Call& call, std::string_view wantedMedia) {
+    const std::string type = contentType(call);
     const std::string media = type.substr(0, type.find_first_of("; "));
-    if (media != "application/json") {
+    if (media != wantedMedia) {
         throw ApiError{415, "unsupportedMediaType", "Unsupported content type: '" + media + "'",
                        "Content-Type"};
     }
@@ -76,8 +88,19 @@ Json jsonBody(const Call& call) {
     if (charset != std::string::npos && type.find("utf-8", charset) == std::string::npos) {
         throw ApiError{415, "unsupportedMediaType", "Only UTF-8 is accepted", "Content-Type"};
     }
-    if (call.body.empty()) throw ApiError{400, "required", "Required: a body", ""};
-    if (call.body.size() > kMaxBodyBytes) throw ApiError{413, "uploadTooLarge", "Request is too large", ""};
+    checkSize(call, kMaxBodyBytes);
+}
+
+std::string imageType(const Call& call) {
+    const std::string type = contentType(call);
+    if (!type.starts_with("image/") || type == "image/")
+        throw ApiError{415, "unsupportedMediaType", "Not an image: '" + type + "'", "Content-Type"};
+    checkSize(call, kMaxImageBytes);
+    return type;
+}
+
+Json jsonBody(const Call& call) {
+    requireBody(call, "application/json");
     Json body = Json::parse(call.body, nullptr, false);
     if (body.is_discarded()) throw ApiError{400, "parseError", "Parse Error", ""};
     if (!body.is_object()) throw ApiError{400, "parseError", "The body must be a JSON object", ""};

@@ -30,6 +30,7 @@ struct Call {
     std::vector<std::string> ids;  // what stands at the "*" of the route, decoded
     std::multimap<std::string, std::string> query;
     std::string body;
+    std::string origin;                              // scheme and host, as the client addressed them
     std::string account;                             // e-mail of the token's owner; empty on open routes
     std::function<std::string(const char*)> header;  // "" when absent
 
@@ -51,6 +52,10 @@ struct Reply {
 
 Reply jsonReply(const Json& body, int status = 200);
 
+// Throws 400 without a body, 413 above the limit, 415 when the content type is another one or not in UTF-8.
+void requireBody(const Call& call, std::string_view wantedMedia);
+// The content type of a body that is an image. Throws 400 without a body, 413 above 10 MB, 415 for other content.
+std::string imageType(const Call& call);
 // The body as a JSON object. Throws 400 without a body or with a bad one, 413 above the limit, 415 when the
 // content type is not JSON.
 Json jsonBody(const Call& call);

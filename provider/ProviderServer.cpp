@@ -177,6 +177,7 @@ void ProviderServer::serve(const httplib::Request& request, httplib::Response& r
     call.query = readQuery(request.target);
     call.body = request.body;
     call.header = [&request](const char* name) { return request.get_header_value(name); };
+    call.origin = std::string(mOptions.isTls ? "https" : "http") + "://" + call.header("Host");
     Outcome outcome;
     answer(call, outcome);
     if (outcome.isReset) {

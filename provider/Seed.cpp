@@ -3,6 +3,8 @@
 #include <array>
 #include <cstdio>
 
+#include "FeedNames.h"
+
 namespace provider {
 
 namespace {
@@ -53,12 +55,33 @@ void addBulkEvents(Calendar& calendar, std::size_t events) {
     }
 }
 
+void addBulkContacts(ContactBook& book, std::size_t contacts) {
+    // What the provider adds to a stored contact: addresses, dates, links.
+    constexpr std::size_t kOwnBytes = 700;
+    const std::string kind = kKindRel;
+    const std::size_t before = book.entries(FeedKind::kContact).size();
+    for (std::size_t i = before; i < before + contacts; ++i) {
+        const std::string number = std::to_string(i);
+        Json fields;
+        fields["gd$name"]["gd$givenName"]["$t"] = "Person";
+        fields["gd$name"]["gd$familyName"]["$t"] = "Number " + number;
+        fields["gd$email"].push_back(
+            {{"rel", kind + "home"}, {"address", "p" + number + "@provider.example"}});
+        fields["gd$phoneNumber"].push_back({{"rel", kind + "mobile"}, {"$t", "+1 555 " + number}});
+        fields["gContact$groupMembershipInfo"].push_back({{"href", "/m8/feeds/groups/default/base/6"}});
+        const std::size_t used = fields.dump().size() + kOwnBytes;
+        fields["content"]["$t"] = filler(i, used < kBulkBytes ? kBulkBytes - used : 0);
+        book.insert(FeedKind::kContact, fields);
+    }
+}
+
 void seedBulk(Store& store, std::size_t events) {
     Account& account = store.addAccount("bulk@provider.example", "Bulk");
     Json members;
     members["id"] = account.email;
     members["summary"] = "Bulk";
     addBulkEvents(store.addCalendar(account, members), events);
+    addBulkContacts(*account.contacts, events);
 }
 
 }  // namespace provider

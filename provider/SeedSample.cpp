@@ -304,6 +304,7 @@ void seedSample(Store& store) {
     addTasks(store, first, "first-home", "Home", kHomeTasks);
     addTasks(store, first, "first-work", "Work", kWorkTasks);
     addTasks(store, second, "second-home", "Second's list", kHomeTasks);
+    seedContacts(store, first.email);
 }
 
 }  // namespace provider

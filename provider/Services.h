@@ -57,6 +57,37 @@ private:
     Context& mContext;
 };
 
+// /m8/feeds: contacts, their groups and photos.
+class ContactService : public Service {
+public:
+    explicit ContactService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    void addFeedRoutes(Router& router, FeedKind kind);
+    Reply list(const Call& call, FeedKind kind);
+    Reply get(const Call& call, FeedKind kind);
+    Reply insert(const Call& call, FeedKind kind);
+    Reply replace(const Call& call, FeedKind kind);
+    Reply remove(const Call& call, FeedKind kind);
+    Reply getPhoto(const Call& call);
+    Reply putPhoto(const Call& call);
+    Reply deletePhoto(const Call& call);
+    Context& mContext;
+};
+
+// /orbit and /img: profiles that people show to everybody.
+class PeopleService : public Service {
+public:
+    explicit PeopleService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    Reply profile(const Call& call);
+    Reply image(const Call& call);
+    Context& mContext;
+};
+
 // /admin: the content, for tests and people.
 class AdminDataService : public Service {
 public:
@@ -81,6 +112,19 @@ public:
 
 private:
     void addTaskRoutes(Router& router, const std::string& tasks);
+    Context& mContext;
+};
+
+// /admin: contacts, groups, photos and people.
+class AdminContactService : public Service {
+public:
+    explicit AdminContactService(Context& context) : mContext(context) {}
+    void addRoutes(Router& router) override;
+
+private:
+    void addFeedRoutes(Router& router, FeedKind kind, const std::string& feed);
+    void addPhotoRoutes(Router& router, const std::string& photo);
+    void addPeopleRoutes(Router& router);
     Context& mContext;
 };
 

@@ -59,6 +59,23 @@ const Json& listOf(const Json& object, const char* name) {
     return *found;
 }
 
+Json dumpAccount(const Account& account) {
+    Json entries = Json::array();
+    for (const CalendarEntry& entry : account.calendars) {
+        entries.push_back({{"id", entry.calendarId}, {"accessRole", entry.accessRole}, {"etag", entry.etag}});
+    }
+    Json lists = Json::array();
+    for (const auto& list : account.taskLists) {
+        Json tasks = Json::array();
+        for (const auto& task : list->tasks()) {
+            if (!task->isDeleted) tasks.push_back(task->body);
+        }
+        lists.push_back({{"id", list->id}, {"title", list->title}, {"etag", list->etag}, {"tasks", tasks}});
+    }
+    return {{"email", account.email}, {"name", account.name}, {"refreshToken", account.refreshToken},
+            {"calendars", entries},   {"taskLists", lists},   {"contacts", account.contacts->dump()}};
+}
+
 }  // namespace
 
 const CalendarEntry* Account::find(const std::string& calendarId) const {
@@ -80,6 +97,7 @@ Account& Store::addBareAccount(const std::string& email, const std::string& name
     Account& account = mAccounts[email];
     account.email = email;
     account.name = name.empty() ? email.substr(0, email.find('@')) : name;
+    account.contacts = std::make_unique<ContactBook>(email, mRevisions);
     return account;
 }
 
@@ -220,30 +238,27 @@ TaskList& Store::taskList(const std::string& email, const std::string& listId) {
     throw ApiError{404, "notFound", "No such task list", "tasklist"};
 }
 
+Person& Store::putPerson(const std::string& personId, const Json& profile) {
+    if (personId.empty() || personId == "default" || personId.find('/') != std::string::npos) invalid("id");
+    Person& person = mPeople[personId];
+    person.profile = profile;
+    return person;
+}
+
+Person& Store::person(const std::string& personId) {
+    const auto found = mPeople.find(personId);
+    if (found == mPeople.end()) throw ApiError{404, "notFound", "No such person", "id"};
+    return found->second;
+}
+
+void Store::setPersonPhoto(const std::string& personId, const std::string& bytes, const std::string& type) {
+    person(personId).photo = {bytes, type, etagOf(mRevisions.next())};
+}
+
 Json Store::dump() const {
     Json out = {{"clientId", clientId}, {"clientSecret", clientSecret}, {"revision", mRevisions.last()}};
     out["accounts"] = Json::array();
-    for (const auto& [email, account] : mAccounts) {
-        Json entries = Json::array();
-        for (const CalendarEntry& entry : account.calendars) {
-            entries.push_back(
-                {{"id", entry.calendarId}, {"accessRole", entry.accessRole}, {"etag", entry.etag}});
-        }
-        Json lists = Json::array();
-        for (const auto& list : account.taskLists) {
-            Json tasks = Json::array();
-            for (const auto& task : list->tasks()) {
-                if (!task->isDeleted) tasks.push_back(task->body);
-            }
-            lists.push_back(
-                {{"id", list->id}, {"title", list->title}, {"etag", list->etag}, {"tasks", tasks}});
-        }
-        out["accounts"].push_back({{"email", email},
-                                   {"name", account.name},
-                                   {"refreshToken", account.refreshToken},
-                                   {"calendars", entries},
-                                   {"taskLists", lists}});
-    }
+    for (const auto& [email, account] : mAccounts) out["accounts"].push_back(dumpAccount(account));
     out["calendars"] = Json::array();
     for (const auto& [calendarId, calendar] : mCalendars) {
         Json item = {{"id", calendarId}, {"etag", calendar->etag}, {"updated", calendar->updated}};
@@ -259,7 +274,21 @@ Json Store::dump() const {
         }
         out["calendars"].push_back(std::move(item));
     }
+    out["people"] = Json::array();
+    for (const auto& [personId, person] : mPeople) {
+        out["people"].push_back({{"id", personId}, {"profile", person.profile}});
+        if (person.photo.isThere()) out["people"].back()["photo"] = person.photo.dump();
+    }
     return out;
+}
+
+void Store::swap(Store& other) {
+    std::swap(mAccounts, other.mAccounts);
+    std::swap(mCalendars, other.mCalendars);
+    std::swap(mPeople, other.mPeople);
+    std::swap(mRevisions, other.mRevisions);
+    std::swap(clientId, other.clientId);
+    std::swap(clientSecret, other.clientSecret);
 }
 
 void Store::load(const Json& state) {
@@ -273,20 +302,13 @@ void Store::load(const Json& state) {
         fresh.mRevisions.restore(revision->get<std::uint64_t>());
     }
     // The calendars refer to the revisions of the store that they live in, so they are made here, not moved.
-    std::swap(mAccounts, fresh.mAccounts);
-    std::swap(mCalendars, fresh.mCalendars);
-    std::swap(mRevisions, fresh.mRevisions);
-    std::swap(clientId, fresh.clientId);
-    std::swap(clientSecret, fresh.clientSecret);
+    swap(fresh);
     try {
         for (const Json& calendar : listOf(state, "calendars")) loadCalendar(calendar);
         for (const Json& account : listOf(state, "accounts")) loadAccount(account);
+        for (const Json& person : listOf(state, "people")) loadPerson(person);
     } catch (...) {
-        std::swap(mAccounts, fresh.mAccounts);
-        std::swap(mCalendars, fresh.mCalendars);
-        std::swap(mRevisions, fresh.mRevisions);
-        std::swap(clientId, fresh.clientId);
-        std::swap(clientSecret, fresh.clientSecret);
+        swap(fresh);
         throw;
     }
 }
@@ -335,6 +357,7 @@ void Store::loadAccount(const Json& state) {
         entry.etag = textOf(item, "etag", calendar(calendarId).etag);
     }
     for (const Json& list : listOf(state, "taskLists")) loadTaskList(account, list);
+    if (state.contains("contacts")) account.contacts->load(state.at("contacts"));
 }
 
 void Store::loadTaskList(Account& account, const Json& state) {
@@ -344,6 +367,13 @@ void Store::loadTaskList(Account& account, const Json& state) {
         if (!task.is_object()) invalid("accounts.taskLists.tasks");
         list.put(task);
     }
+}
+
+void Store::loadPerson(const Json& state) {
+    if (!state.is_object() || !state.contains("profile") || !state.at("profile").is_object())
+        invalid("people");
+    Person& person = putPerson(textOf(state, "id", ""), state.at("profile"));
+    if (state.contains("photo")) person.photo = Image::load(state.at("photo"));
 }
 
 }  // namespace provider

@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "Calendar.h"
+#include "ContactBook.h"
 #include "TaskList.h"
 
 namespace provider {
@@ -27,8 +28,15 @@ struct Account {
     std::string refreshToken;  // empty: revoked
     std::vector<CalendarEntry> calendars;
     std::vector<std::unique_ptr<TaskList>> taskLists;
+    std::unique_ptr<ContactBook> contacts;
 
     [[nodiscard]] const CalendarEntry* find(const std::string& calendarId) const;
+};
+
+// A person who shows a profile to everybody.
+struct Person {
+    Json profile;
+    Image photo;
 };
 
 class Store {
@@ -57,6 +65,12 @@ public:
     void removeTaskList(Account& account, const std::string& listId);
     TaskList& taskList(const std::string& email, const std::string& listId);
 
+    ContactBook& contacts(const std::string& email) { return *account(email).contacts; }
+    // Adds the person or takes the place of the profile that is there.
+    Person& putPerson(const std::string& personId, const Json& profile);
+    Person& person(const std::string& personId);
+    void setPersonPhoto(const std::string& personId, const std::string& bytes, const std::string& type);
+
     // The whole content, and back; load takes over all or nothing.
     [[nodiscard]] Json dump() const;
     void load(const Json& state);
@@ -70,11 +84,14 @@ private:
     void loadCalendar(const Json& state);
     void loadAccount(const Json& state);
     void loadTaskList(Account& account, const Json& state);
+    void loadPerson(const Json& state);
+    void swap(Store& other);
     void touch(Calendar& calendar);
 
     mutable std::mutex mMutex;
     std::map<std::string, Account> mAccounts;
     std::map<std::string, std::unique_ptr<Calendar>> mCalendars;
+    std::map<std::string, Person> mPeople;
     Revisions mRevisions;
 };
 

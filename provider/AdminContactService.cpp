@@ -1,0 +1,116 @@
+#include "FeedJson.h"
+#include "Services.h"
+
+namespace provider {
+
+namespace {
+
+Reply done() {
+    return jsonReply(Json::object());
+}
+
+// An entry's own members are plain here: the id is no address.
+Json plainEntry(const FeedEntry& entry, const std::string& origin) {
+    Json out = {{"id", entry.id}, {"etag", entry.etag}, {"updated", entry.updated}};
+    if (entry.isDeleted) out["deleted"] = true;
+    if (entry.photo.isThere()) out["photo"] = entry.photo.etag;
+    for (const auto& [name, value] : entry.fields.items()) out[name] = shown(value, origin);
+    return out;
+}
+
+Reply entryReply(const Call& call, const FeedEntry& entry) {
+    return jsonReply(plainEntry(entry, call.origin));
+}
+
+std::string chosenId(const Json& body) {
+    const auto found = body.find("id");
+    if (found == body.end()) return "";
+    if (!found->is_string()) throw ApiError{400, "invalid", "Invalid value for: id", "id"};
+    return found->get<std::string>();
+}
+
+}  // namespace
+
+void AdminContactService::addRoutes(Router& router) {
+    const std::string account = "/admin/accounts/*/";
+    addFeedRoutes(router, FeedKind::kContact, account + "contacts");
+    addFeedRoutes(router, FeedKind::kGroup, account + "groups");
+    addPhotoRoutes(router, account + "contacts/*/photo");
+    addPeopleRoutes(router);
+}
+
+void AdminContactService::addFeedRoutes(Router& router, FeedKind kind, const std::string& feed) {
+    router.add("GET", feed, Access::kAdmin, [this, kind](const Call& call) {
+        const auto lock = mContext.store.guard();
+        Json body;
+        body["items"] = Json::array();
+        for (const auto& entry : mContext.store.contacts(call.ids[0]).entries(kind)) {
+            if (!entry->isDeleted || entry->isListed)
+                body["items"].push_back(plainEntry(*entry, call.origin));
+        }
+        return jsonReply(body);
+    });
+    router.add("POST", feed, Access::kAdmin, [this, kind](const Call& call) {
+        const Json body = jsonBody(call);
+        const auto lock = mContext.store.guard();
+        return entryReply(call, mContext.store.contacts(call.ids[0]).insert(kind, body, chosenId(body)));
+    });
+    router.add("GET", feed + "/*", Access::kAdmin, [this, kind](const Call& call) {
+        const auto lock = mContext.store.guard();
+        return entryReply(call, mContext.store.contacts(call.ids[0]).get(kind, call.ids[1]));
+    });
+    router.add("PATCH", feed + "/*", Access::kAdmin, [this, kind](const Call& call) {
+        const Json body = jsonBody(call);
+        const auto lock = mContext.store.guard();
+        return entryReply(call, mContext.store.contacts(call.ids[0]).patch(kind, call.ids[1], body));
+    });
+    router.add("PUT", feed + "/*", Access::kAdmin, [this, kind](const Call& call) {
+        const Json body = jsonBody(call);
+        const auto lock = mContext.store.guard();
+        return entryReply(call, mContext.store.contacts(call.ids[0]).replace(kind, call.ids[1], body));
+    });
+    router.add("DELETE", feed + "/*", Access::kAdmin, [this, kind](const Call& call) {
+        const auto lock = mContext.store.guard();
+        mContext.store.contacts(call.ids[0]).remove(kind, call.ids[1], call.param("deleted") == "listed");
+        return done();
+    });
+}
+
+void AdminContactService::addPhotoRoutes(Router& router, const std::string& photo) {
+    router.add("GET", photo, Access::kAdmin, [this](const Call& call) {
+        const auto lock = mContext.store.guard();
+        const Image& image = mContext.store.contacts(call.ids[0]).get(FeedKind::kContact, call.ids[1]).photo;
+        if (!image.isThere()) throw ApiError{404, "notFound", "Photo not found", ""};
+        Reply reply;
+        reply.body = image.bytes;
+        reply.contentType = image.type;
+        reply.headers["ETag"] = image.etag;
+        return reply;
+    });
+    router.add("PUT", photo, Access::kAdmin, [this](const Call& call) {
+        const std::string type = imageType(call);
+        const auto lock = mContext.store.guard();
+        return entryReply(call, mContext.store.contacts(call.ids[0]).setPhoto(call.ids[1], call.body, type));
+    });
+    router.add("DELETE", photo, Access::kAdmin, [this](const Call& call) {
+        const auto lock = mContext.store.guard();
+        return entryReply(call, mContext.store.contacts(call.ids[0]).setPhoto(call.ids[1], "", ""));
+    });
+}
+
+void AdminContactService::addPeopleRoutes(Router& router) {
+    router.add("PUT", "/admin/people/*", Access::kAdmin, [this](const Call& call) {
+        const Json profile = jsonBody(call);
+        const auto lock = mContext.store.guard();
+        mContext.store.putPerson(call.ids[0], profile);
+        return done();
+    });
+    router.add("PUT", "/admin/people/*/photo", Access::kAdmin, [this](const Call& call) {
+        const std::string type = imageType(call);
+        const auto lock = mContext.store.guard();
+        mContext.store.setPersonPhoto(call.ids[0], call.body, type);
+        return done();
+    });
+}
+
+}  // namespace provider

@@ -189,7 +189,10 @@ Action buildAccountAdd(CLI::App& app) {
             throw Misuse("--server is required (see --help)");
         }
         addAccount(*options);
-        output::line(named(options->id) + " is added (calendars only: contacts sync is not available yet)");
+        const bool hasContacts = options->contacts.value_or(false);
+        output::line(named(options->id) + (hasContacts
+                                               ? " is added"
+                                               : " is added (calendars only; --contacts adds the contacts)"));
         return kExitDone;
     };
 }

@@ -66,9 +66,6 @@ void AccountOptions::checkTexts() const {
     checkServer(server, "--server");
     checkServer(calendarServer, "--calendar-server");
     checkServer(contactsServer, "--contacts-server");
-    if (!contactsServer.empty() || contacts.value_or(false)) {
-        throw Failure("contacts sync is not available yet; leave out --contacts and --contacts-server");
-    }
 }
 
 bool AccountOptions::saysNothing() const {

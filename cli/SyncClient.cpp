@@ -60,10 +60,11 @@ std::string refusal(int code, int id, vantor_pim_sync_type_e kind) {
     if (record == nullptr) {
         return "the daemon does not have the account " + number + "; see: vantor-pim-syncctl account list";
     }
-    if (kind == VANTOR_PIM_SYNC_TYPE_CONTACTS && !record->ctsync) return "contacts sync is not available yet";
-    if (kind == VANTOR_PIM_SYNC_TYPE_CALENDAR && !record->calsync) {
-        return "calendar sync of the account " + number +
-               " is off; turn it on with: vantor-pim-syncctl account update " + number + " --calendar";
+    const bool isCalendar = kind == VANTOR_PIM_SYNC_TYPE_CALENDAR;
+    if (isCalendar ? !record->calsync : !record->ctsync) {
+        const std::string name = isCalendar ? "calendar" : "contacts";
+        return name + " sync of the account " + number +
+               " is off; turn it on with: vantor-pim-syncctl account update " + number + " --" + name;
     }
     return "the daemon refused; its log tells why";
 }

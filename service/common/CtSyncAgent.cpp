@@ -18,7 +18,8 @@ bool CtSyncAgent::hasSomethingToSend() {
 void CtSyncAgent::countPending(int* dirty, int* deleted) {
     *dirty = *deleted = 0;
     const int accountId = mpAccount->getAccountId();
-    if (CtDataManager::getInstance().countPending(accountId, dirty, deleted) != sync_result::kOk) *dirty = *deleted = 0;
+    if (CtDataManager::getInstance().countPending(accountId, dirty, deleted) != sync_result::kOk)
+        *dirty = *deleted = 0;
 }
 
 // An upload that was queued goes with the stop; the next change asks for another.

@@ -127,7 +127,7 @@ TEST_F(DaemonTool, AnAccountIsAddedChangedAndRemoved) {
 
     ASSERT_EQ(mTool.run({"account", "update", "7", "--no-calendar"}).status, 0);
     EXPECT_THAT(mTool.run({"sync", "7"}).error, HasSubstr("account update 7 --calendar"));
-    EXPECT_THAT(mTool.run({"sync", "7", "contacts"}).error, HasSubstr("not available yet"));
+    EXPECT_THAT(mTool.run({"sync", "7", "contacts"}).error, HasSubstr("account update 7 --contacts"));
     EXPECT_THAT(mTool.run({"sync", "8"}).error, HasSubstr("account 8"));
 
     ASSERT_EQ(mTool.run({"account", "remove", "7"}).status, 0);

@@ -59,7 +59,7 @@ TEST(Tool, TellsMisuseFromFailureAndSaysWhyInOneLine) {
         {{"account", "add", "--id", "7", "--email", "a@b"}, 2},
         {{"account", "add", "--id", "7", "--email", "me", "--server", "pim.example"}, 2},
         {{"account", "add", "--id", "7", "--email", "a@b", "--server", "ftp://x"}, 2},
-        {{"account", "add", "--id", "7", "--email", "a@b", "--server", "x", "--contacts-server", "y"}, 1},
+        {{"account", "add", "--id", "7", "--email", "a@b", "--server", "x", "--contacts-server", "ftp://y"}, 2},
         {{"account", "add", "--id", "7", "--email", "a@b", "--server", "x", "--calendar-period", "-1"}, 2},
         {{"sync", "7", "mail"}, 2},
         {{"sync", "7"}, 1},

@@ -92,7 +92,7 @@ void requireBody(const Call& call, std::string_view wantedMedia) {
 }
 
 std::string imageType(const Call& call) {
-    const std::string type = contentType(call);
+    std::string type = contentType(call);
     if (!type.starts_with("image/") || type == "image/")
         throw ApiError{415, "unsupportedMediaType", "Not an image: '" + type + "'", "Content-Type"};
     checkSize(call, kMaxImageBytes);

@@ -240,7 +240,7 @@ TaskList& Store::taskList(const std::string& email, const std::string& listId) {
 
 Person& Store::putPerson(const std::string& personId, const Json& profile) {
     if (personId.empty() || personId == "default" || personId.find('/') != std::string::npos) invalid("id");
-    Person& person = mPeople[personId];
+    Person& person = mPeople.try_emplace(personId, profile).first->second;
     person.profile = profile;
     return person;
 }

@@ -35,6 +35,8 @@ struct Account {
 
 // A person who shows a profile to everybody.
 struct Person {
+    explicit Person(const Json& shown) : profile(shown) {}
+
     Json profile;
     Image photo;
 };

@@ -137,7 +137,6 @@ int CtDownSyncDirector::syncContacts(Feed feed) {
             CtContactBatch batch = planContacts(page, snapshot, composer, &sent);
             if (const int photos = fetchPhotos(&batch); photos != kOk) return photos;
             if (writeBatch(&batch, feed, &inserted, &updated) != kOk) written = kFailed;
-            if (!page.nextPageToken.empty()) SYNC_INFO("Go next page :%s", page.nextPageToken.c_str());
             return kOk;
         },
         stopped);

@@ -34,10 +34,13 @@ int CtDownSyncTask::getContactPage(const std::string& url, CtContactPage* page) 
         SYNC_ERR("Getting contacts from remote failed! %d", result);
         return result;
     }
-    if (CtContactListJsonParser::parse(text, page) == kOk) return kOk;
-    SYNC_ERR("JSON parsing Failed");
-    logSuspicious(text);
-    return kFailed;
+    if (CtContactListJsonParser::parse(text, page) != kOk) {
+        SYNC_ERR("JSON parsing Failed");
+        logSuspicious(text);
+        return kFailed;
+    }
+    if (!page->nextPageToken.empty()) SYNC_INFO("Go next page :%s", page->nextPageToken.c_str());
+    return kOk;
 }
 
 int CtDownSyncGroupListTask::getListPageByPage(const std::string& url, CtGroupPage* page) {

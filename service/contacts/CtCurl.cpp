@@ -167,19 +167,9 @@ int CtCurl::getImpl(const std::string& url, std::string* text) {
     return exchange(transfer);
 }
 
-int CtCurl::insertImpl(const std::string& url, const std::string& entry, std::string* reply) {
-    HttpTransfer transfer = makeTransfer(url, "POST", Access::kAccount);
-    transfer.headers.insert(transfer.headers.end(), {kEntryHeader, kNoExpect});
-    addBearer(&transfer.headers, mUsedToken);
-    transfer.body = entry.c_str();
-    reply->clear();
-    transfer.reply = reply;
-    return exchange(transfer);
-}
-
-int CtCurl::updateImpl(const std::string& url, const std::string& etag, const std::string& entry,
-                       std::string* reply) {
-    HttpTransfer transfer = makeTransfer(url, "PUT", Access::kAccount);
+int CtCurl::sendEntry(const char* method, const std::string& url, const std::string& etag,
+                      const std::string& entry, std::string* reply) {
+    HttpTransfer transfer = makeTransfer(url, method, Access::kAccount);
     transfer.headers.insert(transfer.headers.end(), {kEntryHeader, kNoExpect});
     addBearer(&transfer.headers, mUsedToken);
     addMatch(&transfer.headers, etag);
@@ -187,6 +177,15 @@ int CtCurl::updateImpl(const std::string& url, const std::string& etag, const st
     reply->clear();
     transfer.reply = reply;
     return exchange(transfer);
+}
+
+int CtCurl::insertImpl(const std::string& url, const std::string& entry, std::string* reply) {
+    return sendEntry("POST", url, {}, entry, reply);
+}
+
+int CtCurl::updateImpl(const std::string& url, const std::string& etag, const std::string& entry,
+                       std::string* reply) {
+    return sendEntry("PUT", url, etag, entry, reply);
 }
 
 int CtCurl::removeImpl(const std::string& url, const std::string& etag, std::string* reply) {
@@ -199,16 +198,20 @@ int CtCurl::removeImpl(const std::string& url, const std::string& etag, std::str
     return exchange(transfer);
 }
 
-int CtCurl::getImageImpl(const std::string& url, const std::string& etag, CtStagedPhoto* photo) {
-    HttpTransfer transfer = makeTransfer(url, "GET", Access::kAccount);
-    addBearer(&transfer.headers, mUsedToken);
-    addMatch(&transfer.headers, etag);
+int CtCurl::fetchImage(HttpTransfer& transfer, CtStagedPhoto* photo) {
     transfer.replyFile = photo->file();
     transfer.maxReplyBytes = kMaxPhotoBytes;
     if (fseek(photo->file(), 0, SEEK_SET) != 0 || ftruncate(fileno(photo->file()), 0) != 0) return kFailed;
     const int result = exchange(transfer);
     if (result != kOk || !http_status::isSuccess(mHttpStatus)) return result;
     return photo->finish(transfer.contentType) ? kOk : kFailed;
+}
+
+int CtCurl::getImageImpl(const std::string& url, const std::string& etag, CtStagedPhoto* photo) {
+    HttpTransfer transfer = makeTransfer(url, "GET", Access::kAccount);
+    addBearer(&transfer.headers, mUsedToken);
+    addMatch(&transfer.headers, etag);
+    return fetchImage(transfer, photo);
 }
 
 int CtCurl::upsertImageImpl(const std::string& url, const std::string& etag, const std::string& path) {
@@ -236,12 +239,7 @@ int CtCurl::getOrbitImpl(const std::string& url, std::string* profile) {
 
 int CtCurl::getOrbitImageImpl(const std::string& url, CtStagedPhoto* photo) {
     HttpTransfer transfer = makeTransfer(url, "GET", Access::kOpen);
-    transfer.replyFile = photo->file();
-    transfer.maxReplyBytes = kMaxPhotoBytes;
-    if (fseek(photo->file(), 0, SEEK_SET) != 0 || ftruncate(fileno(photo->file()), 0) != 0) return kFailed;
-    const int result = exchange(transfer);
-    if (result != kOk || !http_status::isSuccess(mHttpStatus)) return result;
-    return photo->finish(transfer.contentType) ? kOk : kFailed;
+    return fetchImage(transfer, photo);
 }
 
 // --- operations

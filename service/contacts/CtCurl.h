@@ -53,6 +53,9 @@ private:
     [[nodiscard]] HttpTransfer makeTransfer(const std::string& url, const char* method, Access access);
     // One exchange: 0 with lastHttpStatus(), -1, or -2 when it timed out.
     [[nodiscard]] int exchange(HttpTransfer& transfer);
+    [[nodiscard]] int sendEntry(const char* method, const std::string& url, const std::string& etag,
+                                const std::string& entry, std::string* reply);
+    [[nodiscard]] int fetchImage(HttpTransfer& transfer, CtStagedPhoto* photo);
     [[nodiscard]] int getImpl(const std::string& url, std::string* text);
     [[nodiscard]] int insertImpl(const std::string& url, const std::string& entry, std::string* reply);
     [[nodiscard]] int updateImpl(const std::string& url, const std::string& etag, const std::string& entry,

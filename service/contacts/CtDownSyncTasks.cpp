@@ -18,6 +18,16 @@ void logSuspicious(const std::string& text) {
     for (size_t at = 0; at < text.size(); at += kLogSlice) SYNC_DBG("%s", text.substr(at, kLogSlice).c_str());
 }
 
+int readGroups(int result, const std::string& text, CtGroupPage* page) {
+    if (result != kOk) {
+        SYNC_ERR("Curl Get Operation Failed! %d", result);
+        return result;
+    }
+    if (CtGroupListJsonParser::parse(text, page) == kOk) return kOk;
+    logSuspicious(text);
+    return kFailed;
+}
+
 }  // namespace
 
 int CtDownSyncTask::getEntireFeed(CtItemType type, std::string* text) {
@@ -46,25 +56,13 @@ int CtDownSyncTask::getContactPage(const std::string& url, CtContactPage* page) 
 int CtDownSyncGroupListTask::getListPageByPage(const std::string& url, CtGroupPage* page) {
     std::string text;
     const int result = mpCurl->get(url.empty() ? mpCurl->feedBase() + kGroupPages : url, &text);
-    if (result != kOk) {
-        SYNC_ERR("Curl Get Operation Failed! %d", result);
-        return result;
-    }
-    if (CtGroupListJsonParser::parse(text, page) == kOk) return kOk;
-    logSuspicious(text);
-    return kFailed;
+    return readGroups(result, text, page);
 }
 
 int CtDownSyncGroupListTask::getList(CtGroupPage* page) {
     std::string text;
     const int result = getEntireFeed(CtItemType::kGroup, &text);
-    if (result != kOk) {
-        SYNC_ERR("Curl Get Operation Failed! %d", result);
-        return result;
-    }
-    if (CtGroupListJsonParser::parse(text, page) == kOk) return kOk;
-    logSuspicious(text);
-    return kFailed;
+    return readGroups(result, text, page);
 }
 
 int CtDownSyncContactPhotoTask::get(const std::string& href, const std::string& etag,

@@ -7,6 +7,7 @@
 #include "common/JsonText.h"
 #include "common/SyncLog.h"
 #include "contacts/CtIdUtil.h"
+#include "contacts/CtRecordRead.h"
 #include "platform/contacts_read.h"
 
 using contacts_read::forEachChild;
@@ -125,15 +126,6 @@ void carryOverExtensions(JsonObject* origin, CtXmlElement* entry) {
 
 }  // namespace
 
-std::string originOf(contacts_record_h contact) {
-    std::string origin;
-    forEachChild(contact, CONTACTS_CONTACT_EXTENSIONS, [&](contacts_record_h extension) {
-        if (intOf(extension, CONTACTS_EXTENSION_DATA1) == ct_wire::kOriginExtension && origin.empty())
-            origin = textOf(extension, CONTACTS_EXTENSION_DATA3);
-    });
-    return origin;
-}
-
 CtXmlElement makeAtomEntry(const char* term, const std::string& etag, bool withContactNamespace) {
     CtXmlElement entry{
         .name = "atom:entry",
@@ -227,7 +219,7 @@ std::vector<CtXmlElement> ContactComposer::composeSection(const CtSection& secti
 
 std::string ContactComposer::compose(contacts_record_h contact, const std::string& etag,
                                      const std::string& originText) const {
-    const JsonNodePtr root = json_text::parse(originText.empty() ? originOf(contact) : originText);
+    const JsonNodePtr root = json_text::parse(originText.empty() ? ct_record::originOf(contact) : originText);
     JsonObject* origin = json_access::objectIn(root.get());
     CtXmlElement entry = makeAtomEntry(ct_wire::kContactTerm, etag, /*withContactNamespace=*/true);
     const std::string id = json_access::textOr(json_access::object(origin, "id"), "$t", "");

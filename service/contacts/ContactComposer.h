@@ -54,8 +54,5 @@ private:
     const UriLookup mUriOf;
 };
 
-// The server's entry that is kept with a contact, empty when there is none.
-std::string originOf(contacts_record_h contact);
-
 // The root of an entry: namespaces, etag and category.
 CtXmlElement makeAtomEntry(const char* term, const std::string& etag, bool withContactNamespace);

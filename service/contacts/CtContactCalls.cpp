@@ -7,10 +7,10 @@
 #include "contacts/CtGroupMap.h"
 #include "contacts/CtItemWriter.h"
 #include "contacts/CtLocalChanges.h"
+#include "contacts/CtRecordRead.h"
 #include "platform/contacts_read.h"
 
 using contacts_read::intOf;
-using contacts_read::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 
@@ -114,9 +114,7 @@ int CtDataManager::getContactData(int contactId, const std::string& feedBase, Ct
     data.etag = row.uri.empty() ? std::string() : row.etag;
     data.version = intOf(raw, CONTACTS_CONTACT_VERSION);
     data.entry = groups.composer(feedBase).compose(raw, data.etag);
-    contacts_read::forEachChild(raw, CONTACTS_CONTACT_IMAGES, [&data](contacts_record_h image) {
-        if (data.photoPath.empty()) data.photoPath = textOf(image, CONTACTS_IMAGE_PATH);
-    });
+    data.photoPath = ct_record::imageOf(raw);
     *out = std::move(data);
     return kOk;
 }

@@ -5,12 +5,12 @@
 
 #include "common/SyncLog.h"
 #include "contacts/CtJsonOrbitPeopleConverter.h"
+#include "contacts/CtRecordRead.h"
 #include "contacts/CtTransaction.h"
 #include "platform/contacts_read.h"
 
 using contacts_read::forEachChild;
 using contacts_read::intOf;
-using contacts_read::textOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 
@@ -24,15 +24,9 @@ int lastChangeVersion() {
 std::string imageOf(int contactId) {
     ContactsList list;
     contacts_record_h record = nullptr;
-    std::string path;
-    if (contacts_read::readPart(_contacts_contact, CONTACTS_CONTACT_ID, contactId, {CONTACTS_CONTACT_IMAGES},
-                                &list, &record) != PLATFORM_ERROR_NONE) {
-        return path;
-    }
-    forEachChild(record, CONTACTS_CONTACT_IMAGES, [&path](contacts_record_h image) {
-        if (path.empty()) path = textOf(image, CONTACTS_IMAGE_PATH);
-    });
-    return path;
+    const int code = contacts_read::readPart(_contacts_contact, CONTACTS_CONTACT_ID, contactId,
+                                             {CONTACTS_CONTACT_IMAGES}, &list, &record);
+    return code == PLATFORM_ERROR_NONE ? ct_record::imageOf(record) : std::string();
 }
 
 void setImage(contacts_record_h contact, const std::string& path) {

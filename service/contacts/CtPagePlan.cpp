@@ -51,7 +51,10 @@ Finding<Kind> find(const CtEntryInfo& entry, const CtSnapshot<Kind>& snapshot, C
         SYNC_INFO("%s(%s) is the device's %d, which was sent before", Kind::kName, entry.id.c_str(),
                   finding.row.*Kind::kId);
     }
-    if (finding.standing == Standing::kDeviceWins) {
+    if (finding.standing == Standing::kChanged && finding.row.etag.empty()) {
+        SYNC_ERR("This uri[%s] has no etag yet. We will overwrite this with server's item!",
+                 entry.id.c_str());
+    } else if (finding.standing == Standing::kDeviceWins) {
         SYNC_ERR("%s(%s, %s) was changed on both sides, the device's %s wins", Kind::kName, entry.id.c_str(),
                  entry.title.c_str(), finding.row.deleted != 0 ? "deletion" : "change");
     } else if (finding.standing == Standing::kEditedOrphan) {

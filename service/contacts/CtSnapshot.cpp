@@ -3,9 +3,9 @@
 #include "common/JsonAccess.h"
 #include "common/JsonText.h"
 #include "common/SyncLog.h"
-#include "contacts/ContactComposer.h"
 #include "contacts/CtIdUtil.h"
 #include "contacts/CtLocalChanges.h"
+#include "contacts/CtRecordRead.h"
 #include "platform/contacts_read.h"
 
 using contacts_read::intOf;
@@ -17,7 +17,7 @@ namespace {
 
 // What a record says of the server's item that it stands for; an empty uri when it does not.
 void readServerId(CtContactKind /*kind*/, contacts_record_h record, std::string* uri, std::string* etag) {
-    const JsonNodePtr root = json_text::parse(originOf(record));
+    const JsonNodePtr root = json_text::parse(ct_record::originOf(record));
     JsonObject* origin = json_access::objectIn(root.get());
     const std::string id = json_access::textOr(json_access::object(origin, "id"), "$t", "");
     if (!id.empty()) *uri = CtIdUtil::idAfterBase(id);

@@ -3,6 +3,7 @@
 #include "common/JsonAccess.h"
 #include "common/JsonText.h"
 #include "common/SyncLog.h"
+#include "contacts/CtRecordRead.h"
 #include "contacts/CtTransaction.h"
 #include "contacts/GroupComposer.h"
 #include "platform/contacts_read.h"
@@ -19,17 +20,9 @@ namespace {
 
 constexpr const char* kStoreFails = "the device's stores cannot be written";
 
-std::string imageOf(contacts_record_h contact) {
-    std::string path;
-    forEachChild(contact, CONTACTS_CONTACT_IMAGES, [&path](contacts_record_h image) {
-        if (path.empty()) path = textOf(image, CONTACTS_IMAGE_PATH);
-    });
-    return path;
-}
-
 // Which version of the server's entry is kept with the contact.
 std::string keptEtag(contacts_record_h contact) {
-    const JsonNodePtr root = json_text::parse(originOf(contact));
+    const JsonNodePtr root = json_text::parse(ct_record::originOf(contact));
     return json_access::textOr(json_access::objectIn(root.get()), "gd$etag", "");
 }
 
@@ -246,7 +239,7 @@ CtUpReply CtUploader::updateContact(const CtContactSyncRow& row, contacts_record
 }
 
 bool CtUploader::sendPhoto(CtContactSyncRow& row, contacts_record_h record) {
-    const std::string path = imageOf(record);
+    const std::string path = ct_record::imageOf(record);
     // The server has none, as far as is known.
     if (path.empty() && row.photo_etag.empty()) return true;
     CtUpReply reply;

@@ -14,8 +14,7 @@ inline constexpr const char* kContactNamespace = CT_CONTACT_NAMESPACE;
 inline constexpr const char* kKindScheme = CT_KIND_NAMESPACE "#kind";
 inline constexpr const char* kContactTerm = CT_CONTACT_NAMESPACE "#contact";
 inline constexpr const char* kGroupTerm = CT_CONTACT_NAMESPACE "#group";
-inline constexpr const char* kPhotoRel = CT_CONTACT_NAMESPACE "/rel#photo";
-// What the fragment of a photo link's rel ends with, whatever stands before it.
+// What a photo link's rel ends with, whatever namespace stands before it.
 inline constexpr const char* kPhotoRelEnd = "rel#photo";
 
 #undef CT_ATOM_NAMESPACE

@@ -22,7 +22,6 @@ struct CtXmlElement {
 
     // The child of this name, made when there is none.
     CtXmlElement& child(const std::string& childName);
-    [[nodiscard]] bool isEmpty() const { return attributes.empty() && text.empty() && children.empty(); }
     void write(std::string* out) const;
 
     // A member of the feed's JSON as the element it was made from; false when a name in it cannot be written.

@@ -264,12 +264,29 @@ TEST_F(ContactSync, PhotosGoBothWays) {
     mServer.putPhoto("a", "newer");
     sync();
     EXPECT_EQ(imageOf(deviceContacts()["a2"]), "mine") << "what cannot be had leaves what is there";
+    int before = 0;
+    int after = 0;
+    EXPECT_EQ(contacts_db_get_current_version(&before), 0);
+    sync();
+    EXPECT_EQ(contacts_db_get_current_version(&after), 0);
+    EXPECT_EQ(before, after) << "a contact is not written again for a photo that cannot be had";
     mServer.photoStatus = 200;
     sync();
     EXPECT_EQ(imageOf(deviceContacts()["a2"]), "newer") << "and is asked for again";
     expectQuiet();
     EXPECT_TRUE(std::filesystem::is_empty(root().at("/tmp")) ||
                 !std::filesystem::exists(root().at("/tmp/a")));
+}
+
+TEST_F(ContactSync, AProfileFillsWhatIsOpen) {
+    const Json website = {{{"href", mServer.url() + "/profiles/p1"}, {"rel", "home"}}};
+    mServer.put("contacts", "a", {{"gContact$website", website}});
+    mServer.put("contacts", "b", named("Own", {{"gContact$website", website}}));
+    mServer.putPhoto("b", "own photo");
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["Public"]), "profile image 720");
+    EXPECT_EQ(imageOf(deviceContacts()["Own"]), "own photo");
+    expectQuiet();
 }
 
 TEST_F(ContactSync, WhenBothSidesChangedTheDeviceWins) {
@@ -337,10 +354,17 @@ TEST_F(ContactSync, OnlyACompleteListDeletes) {
     mServer.endsEarly = false;
     sync();
     EXPECT_EQ(deviceNames().size(), 29U);
-    mServer.isEmpty = true;
-    sync();  // an empty side is believed at the second look
-    EXPECT_EQ(deviceNames().size(), 0U);
-    mServer.isEmpty = false;
+    mServer.emptyLists = 1;
+    sync();
+    EXPECT_EQ(deviceNames().size(), 29U) << "an empty list is not believed at once";
+    mServer.put("contacts", "", named("without id"));
+    mServer.erase("contacts", "c11");
+    sync();
+    EXPECT_EQ(deviceNames().size(), 29U) << "a list that cannot be read whole deletes nothing";
+    mServer.erase("contacts", "");
+    mServer.emptyLists = 2;
+    sync();
+    EXPECT_EQ(deviceNames().size(), 0U) << "a side that stays empty is believed";
     sync();
     expectSame();
     expectQuiet();

@@ -21,6 +21,7 @@ FeedServer::FeedServer() {
     serveFeeds("contacts");
     serveFeeds("groups");
     servePhotos();
+    servePeople();
     mPort = mServer.bind_to_any_port("127.0.0.1");
     mThread = std::thread([this] { mServer.listen_after_bind(); });
     while (!mServer.is_running()) std::this_thread::yield();
@@ -96,6 +97,8 @@ void FeedServer::serveFeeds(const std::string& feed) {
             response.status = 503;
             return;
         }
+        const bool isEmpty = feed == "contacts" && start == 0 && emptyLists > 0;
+        if (isEmpty) --emptyLists;
         Json shown = {{"entry", Json::array()}, {"link", Json::array()}};
         size_t at = 0;
         for (const auto& [id, fields] : mEntries[feed]) {
@@ -145,6 +148,18 @@ void FeedServer::serveFeeds(const std::string& feed) {
     };
     mServer.Put(one, change);
     mServer.Delete(one, change);
+}
+
+void FeedServer::servePeople() {
+    mServer.Get("/orbit/v1/people/p1", [this](const httplib::Request& request, httplib::Response& response) {
+        const bool isOpen = request.has_param("key") && !request.has_header("Authorization");
+        response.status = isOpen ? 200 : 400;
+        const Json profile = {{"givenName", "Public"}, {"image", {{"url", url() + "/img/p1?sz=50"}}}};
+        response.set_content(profile.dump(), "application/json");
+    });
+    mServer.Get("/img/p1", [](const httplib::Request& request, httplib::Response& response) {
+        response.set_content("profile image " + request.get_param_value("sz"), "image/jpeg");
+    });
 }
 
 void FeedServer::servePhotos() {

@@ -28,13 +28,14 @@ public:
 
     // Faults, read under the lock.
     int failNextWrites = 0;  // answered with 500 although they were carried out
-    bool isEmpty = false;    // lists nothing
+    int emptyLists = 0;      // so many requests for the first page of the contacts list nothing
     bool endsEarly = false;  // the second page is an error
     int photoStatus = 200;
 
 private:
     void serveFeeds(const std::string& feed);
     void servePhotos();
+    void servePeople();  // "p1", with an image
     Json entry(const std::string& feed, const std::string& id) const;
     void writeDone(httplib::Response& response, const Json& body, int status);
     std::string nextEtag() { return "\"" + std::to_string(++mRevision) + "\""; }

@@ -22,13 +22,6 @@ std::string dateText(int date) {
     return text;
 }
 
-const char* wordOf(std::span<const CtTypeRow> rows, int code) {
-    for (const CtTypeRow& row : rows) {
-        if (row.code == code) return row.word;
-    }
-    return nullptr;
-}
-
 std::string onWire(const CtTypeTable& types, const char* word) {
     return types.isFragment ? std::string(ct_wire::kKindNamespace) + "#" + word : word;
 }
@@ -39,11 +32,11 @@ std::pair<std::string, std::string> typeOf(const CtSection& section, contacts_re
     const std::string label = textOf(child, section.labelProperty);
     // Of relations, 1 is a word and, with a label, a custom one.
     const bool isNamedByLabel = !label.empty() && (code == 0 || code == 1);
-    if (const char* word = wordOf(types.rows, code); word != nullptr && !isNamedByLabel)
+    if (const char* word = contact_types::wordOf(types.rows, code); word != nullptr && !isNamedByLabel)
         return {types.attribute, onWire(types, word)};
     if (!label.empty()) return {"label", label};
     if (!types.labels.empty()) {
-        const char* word = wordOf(types.labels, code);
+        const char* word = contact_types::wordOf(types.labels, code);
         return {"label", word != nullptr ? word : types.labels.front().word};
     }
     return {types.attribute, onWire(types, kCtOtherWord)};

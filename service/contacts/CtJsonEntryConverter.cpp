@@ -36,10 +36,8 @@ ContactsRecord create(const char* view) {
 int codeOf(const CtTypeTable& types, const std::string& value) {
     const size_t hash = types.isFragment ? value.rfind('#') : std::string::npos;
     const std::string word = hash == std::string::npos ? value : value.substr(hash + 1);
-    for (const CtTypeRow& row : types.rows) {
-        if (word == row.word) return row.code;
-    }
-    return types.unknownCode;
+    const CtTypeRow* row = contact_types::rowOf(types.rows, word);
+    return row != nullptr ? row->code : types.unknownCode;
 }
 
 void readType(const CtSection& section, JsonObject* element, contacts_record_h child) {

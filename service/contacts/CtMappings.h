@@ -4,13 +4,11 @@
 #include <span>
 
 #include "contacts/CtWire.h"
+#include "platform/contact_types.h"
 #include "platform/contacts.h"
 
 // A type code and its word on the wire: the fragment of a rel, or a plain word.
-struct CtTypeRow {
-    int code;
-    const char* word;
-};
+using CtTypeRow = contact_type_word_s;
 
 struct CtTypeTable {
     std::span<const CtTypeRow> rows;
@@ -68,33 +66,18 @@ struct CtSection {
 
 namespace ct_mappings {
 
-inline constexpr CtTypeRow kPhoneRows[] = {{64, "mobile"},         {2, "home"},      {4, "work"},
-                                           {20, "work_fax"},       {18, "home_fax"}, {128, "pager"},
-                                           {1 << 30, "assistant"}, {1024, "car"},    {16, "fax"},
-                                           {2048, "isdn"},         {0, "other"},     {68, "work_mobile"},
-                                           {132, "work_pager"}};
-inline constexpr CtTypeRow kEmailRows[] = {{2, "home"}, {4, "work"}, {8, "mobile"}};
-inline constexpr CtTypeRow kAddressRows[] = {{2, "home"}, {4, "work"}};
-inline constexpr CtTypeRow kCompanyRows[] = {{2, "work"}};
-inline constexpr CtTypeRow kProtocolRows[] = {{2, "VANTOR_TALK"}, {3, "MSN"}, {4, "YAHOO"},  {6, "ICQ"},
-                                              {7, "AIM"},         {8, "QQ"},  {9, "JABBER"}, {10, "SKYPE"}};
 inline constexpr CtTypeRow kProtocolLabels[] = {{0, "Other"}, {11, "IRC"}, {5, "FACEBOOK"}};
-inline constexpr CtTypeRow kRelationRows[] = {
-    {1, "assistant"},    {2, "brother"},   {3, "child"},   {4, "domestic-partner"}, {5, "father"},
-    {6, "friend"},       {7, "manager"},   {8, "mother"},  {9, "parent"},           {10, "partner"},
-    {11, "referred-by"}, {12, "relative"}, {13, "sister"}, {14, "spouse"}};
-inline constexpr CtTypeRow kWebsiteRows[] = {{2, "home"}, {3, "work"}, {0, "other"}};
 inline constexpr CtTypeRow kEventRows[] = {{3, "anniversary"}};
 
-inline constexpr CtTypeTable kPhoneTypes{.rows = kPhoneRows, .mustBeThere = true};
-inline constexpr CtTypeTable kEmailTypes{.rows = kEmailRows};
-inline constexpr CtTypeTable kAddressTypes{.rows = kAddressRows, .labelCode = 0};
-inline constexpr CtTypeTable kCompanyTypes{.rows = kCompanyRows, .labelCode = 0};
+inline constexpr CtTypeTable kPhoneTypes{.rows = contact_types::kPhone, .mustBeThere = true};
+inline constexpr CtTypeTable kEmailTypes{.rows = contact_types::kEmail};
+inline constexpr CtTypeTable kAddressTypes{.rows = contact_types::kAddress, .labelCode = 0};
+inline constexpr CtTypeTable kCompanyTypes{.rows = contact_types::kCompany, .labelCode = 0};
 inline constexpr CtTypeTable kProtocols{
-    .rows = kProtocolRows, .attribute = "protocol", .labels = kProtocolLabels};
-inline constexpr CtTypeTable kRelationTypes{.rows = kRelationRows, .isFragment = false};
+    .rows = contact_types::kProtocol, .attribute = "protocol", .labels = kProtocolLabels};
+inline constexpr CtTypeTable kRelationTypes{.rows = contact_types::kRelationship, .isFragment = false};
 inline constexpr CtTypeTable kWebsiteTypes{
-    .rows = kWebsiteRows, .isFragment = false, .unknownCode = 1, .labelCode = 0};
+    .rows = contact_types::kUrl, .isFragment = false, .unknownCode = 1, .labelCode = 0};
 inline constexpr CtTypeTable kEventTypes{.rows = kEventRows, .isFragment = false};
 
 inline constexpr CtField kNameFields[] = {

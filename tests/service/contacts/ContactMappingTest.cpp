@@ -106,7 +106,7 @@ Json fullEntry() {
     fill("gContact$event", {{"gd$when", {{"startTime", "1835-07-08"}}}}, ct_mappings::kEventTypes);
     fill("gContact$relation", {{"$t", "William"}}, ct_mappings::kRelationTypes);
     fill("gContact$website", {{"href", "http://ada.example/?a=1&b=2"}}, ct_mappings::kWebsiteTypes);
-    for (const CtTypeRow& row : ct_mappings::kProtocolRows) {
+    for (const CtTypeRow& row : contact_types::kProtocol) {
         entry["gd$im"].push_back(
             {{"address", "ada"}, {"rel", kindRel("other")}, {"protocol", kindRel(row.word)}});
     }

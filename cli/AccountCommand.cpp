@@ -83,6 +83,7 @@ void addAccount(const AccountOptions& options) {
     const AccountRecord record = sync_client::emptyRecord();
     record->account_id = options.id;
     record->calsync = true;
+    record->ctsync = true;
     options.apply(*record);
 
     Undo undo;
@@ -189,10 +190,7 @@ Action buildAccountAdd(CLI::App& app) {
             throw Misuse("--server is required (see --help)");
         }
         addAccount(*options);
-        const bool hasContacts = options->contacts.value_or(false);
-        output::line(named(options->id) + (hasContacts
-                                               ? " is added"
-                                               : " is added (calendars only; --contacts adds the contacts)"));
+        output::line(named(options->id) + " is added");
         return kExitDone;
     };
 }

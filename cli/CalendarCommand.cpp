@@ -1,9 +1,7 @@
 // calendars: the books of the device's calendar store.
-#include <cstdio>
-
 #include "CalendarStore.h"
 #include "Command.h"
-#include "Failure.h"
+#include "ItemCommand.h"
 #include "Names.h"
 #include "Output.h"
 #include "RecordAccess.h"
@@ -23,20 +21,16 @@ Json calendarJson(calendar_record_h book) {
             {"readOnly", intOf(book, CALENDAR_BOOK_MODE) == kModeReadOnly}};
 }
 
-struct Options {
-    int account = 0;
-    bool isJson = false;
-};
-
-void listJson(const CalendarList& books) {
+void listJson(std::optional<int> account) {
     output::JsonArray array;
-    record_access::forEach(books, [&array](calendar_record_h book) { array.add(calendarJson(book)); });
+    record_access::forEach(CalendarStore::calendars(account),
+                           [&array](calendar_record_h book) { array.add(calendarJson(book)); });
     array.end();
 }
 
-void listTable(const CalendarList& books) {
+void listTable(std::optional<int> account) {
     output::Table table({"ID", "ACCOUNT", "KIND", "MODE", "NAME"});
-    record_access::forEach(books, [&table](calendar_record_h record) {
+    record_access::forEach(CalendarStore::calendars(account), [&table](calendar_record_h record) {
         const Json book = calendarJson(record);
         table.add({book["id"].dump(), book["account"].dump(), book["kind"],
                    book["readOnly"] ? "read-only" : "", book["name"]});
@@ -47,14 +41,5 @@ void listTable(const CalendarList& books) {
 }  // namespace
 
 Action buildCalendarsList(CLI::App& app) {
-    auto options = std::make_shared<Options>();
-    command::addId(app, "--account", options->account, "Only those of this account");
-    command::addJson(app, options->isJson);
-    return [options] {
-        const CalendarStore store;
-        const CalendarList books =
-            CalendarStore::calendars(options->account > 0 ? std::optional(options->account) : std::nullopt);
-        options->isJson ? listJson(books) : listTable(books);
-        return kExitDone;
-    };
+    return item_command::buildAccountList<CalendarStore>(app, listJson, listTable);
 }

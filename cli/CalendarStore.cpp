@@ -12,23 +12,17 @@ CalendarStore::~CalendarStore() {
     calendar_disconnect();
 }
 
+namespace {
+
+using Service =
+    store_access::Service<calendar_query_create, calendar_db_get_records_with_query, CalendarList>;
+using store_access::Filter;
+
+}  // namespace
+
 CalendarList CalendarStore::find(const char* view, const std::vector<Filter>& filters, unsigned sortBy,
                                  std::span<const unsigned> projection) {
-    calendar_query_h raw = nullptr;
-    check(calendar_query_create(view, &raw), "the calendar store");
-    const CalendarQuery query(raw);
-    for (const Filter& filter : filters) {
-        check(calendar_query_add_filter_int(query.get(), filter.property, filter.value),
-              "the calendar store");
-    }
-    if (!projection.empty()) {
-        check(calendar_query_set_projection(query.get(), projection.data(), projection.size()),
-              "the calendar store");
-    }
-    check(calendar_query_set_sort(query.get(), sortBy, /*ascending=*/true), "the calendar store");
-    calendar_list_h list = nullptr;
-    check(calendar_db_get_records_with_query(query.get(), 0, 0, &list), "reading the calendar store");
-    return CalendarList(list);
+    return store_access::find<Service>("the calendar store", view, filters, sortBy, projection);
 }
 
 CalendarList CalendarStore::calendars(std::optional<int> account) {
@@ -48,28 +42,14 @@ CalendarRecord CalendarStore::calendar(int id) {
     return CalendarRecord(record);
 }
 
-namespace {
-
-FoundItem item(const char* view, unsigned idProperty, int id, std::span<const unsigned> projection,
-               const char* name) {
-    CalendarList list = CalendarStore::find(view, {{idProperty, id}}, idProperty, projection);
-    calendar_record_h found = nullptr;
-    if (calendar_list_first(list.get()) != PLATFORM_ERROR_NONE ||
-        calendar_list_get_current_record_p(list.get(), &found) != PLATFORM_ERROR_NONE) {
-        throw Failure(std::string("there is no ") + name + " " + std::to_string(id) +
-                      "; see: vantor-pim-syncctl " + name + "s list");
-    }
-    return {std::move(list), found};
-}
-
-}  // namespace
-
 FoundItem CalendarStore::event(int id, std::span<const unsigned> projection) {
-    return item(_calendar_event, CALENDAR_EVENT_ID, id, projection, "event");
+    return store_access::one(find(_calendar_event, {{CALENDAR_EVENT_ID, id}}, CALENDAR_EVENT_ID, projection),
+                             "event", id);
 }
 
 FoundItem CalendarStore::todo(int id, std::span<const unsigned> projection) {
-    return item(_calendar_todo, CALENDAR_TODO_ID, id, projection, "todo");
+    return store_access::one(find(_calendar_todo, {{CALENDAR_TODO_ID, id}}, CALENDAR_TODO_ID, projection),
+                             "todo", id);
 }
 
 void CalendarStore::checkWritable(int calendarId, const char* kind) {

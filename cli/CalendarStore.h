@@ -3,21 +3,13 @@
 
 #include <optional>
 #include <span>
-#include <string>
 #include <vector>
 
+#include "StoreAccess.h"
 #include "platform/calendar.h"
 
-// One event or to-do of the store; the list that it came in owns it.
-class FoundItem {
-public:
-    FoundItem(CalendarList list, calendar_record_h record) : mList(std::move(list)), mpRecord(record) {}
-    [[nodiscard]] calendar_record_h get() const { return mpRecord; }
-
-private:
-    CalendarList mList;
-    calendar_record_h mpRecord;
-};
+// One event or to-do of the store.
+using FoundItem = store_access::Found<CalendarList>;
 
 // Open while the object lives.
 class CalendarStore {
@@ -27,13 +19,8 @@ public:
     CalendarStore(const CalendarStore&) = delete;
     CalendarStore& operator=(const CalendarStore&) = delete;
 
-    struct Filter {
-        unsigned property;
-        int value;
-    };
-    // The records of `view` that meet all filters, by ascending `sortBy`. An empty projection reads everything.
-    static CalendarList find(const char* view, const std::vector<Filter>& filters, unsigned sortBy,
-                             std::span<const unsigned> projection = {});
+    static CalendarList find(const char* view, const std::vector<store_access::Filter>& filters,
+                             unsigned sortBy, std::span<const unsigned> projection = {});
     static CalendarList calendars(std::optional<int> account);
     // A Failure when there is none.
     static CalendarRecord calendar(int id);

@@ -26,6 +26,10 @@ constexpr Noun kNouns[] = {
     {"event", "One event"},
     {"todos", "To-dos of this device"},
     {"todo", "One to-do"},
+    {"contacts", "Contacts of this device"},
+    {"contact", "One contact"},
+    {"groups", "Groups of contacts of this device"},
+    {"group", "One group of contacts"},
 };
 
 constexpr Command kCommands[] = {
@@ -76,6 +80,26 @@ constexpr Command kCommands[] = {
     {"todo", "set", "Change fields of a to-do",
      "todo set 12 status=completed\ntodo set 12 due=2014-05-01T10:00:00Z summary=Post", buildTodoSet},
     {"todo", "delete", "Delete a to-do", "todo delete 12", buildTodoDelete},
+    {"contacts", "list", "List contacts", "contacts list\ncontacts list --account 7 --json",
+     buildContactsList},
+    {"contact", "show", "Show one contact", "contact show 12\ncontact show 12 --json > contact.json",
+     buildContactShow},
+    {"contact", "add", "Add the contact of a JSON file",
+     "contact add contact.json\ncontact add --account 7 - < contact.json", buildContactAdd},
+    {"contact", "set", "Change fields of a contact",
+     "contact set 12 name.first=Mira nickname=Mi\ncontact set 12 photo=mira.jpg\ncontact set 12 photo=\n"
+     "contact set 12 groups=[3,5] 'phones=[{\"value\": \"+49 30 1234\", \"type\": \"mobile\"}]'",
+     buildContactSet},
+    {"contact", "photo", "Save a contact's photo to a file",
+     "contact photo 12 mira.jpg\ncontact photo 12 - > mira.jpg", buildContactPhoto},
+    {"contact", "delete", "Delete a contact", "contact delete 12", buildContactDelete},
+    {"groups", "list", "List groups of contacts", "groups list\ngroups list --account 7 --json",
+     buildGroupsList},
+    {"group", "show", "Show one group", "group show 3\ngroup show 3 --json > group.json", buildGroupShow},
+    {"group", "add", "Add the group of a JSON file",
+     "group add group.json\ngroup add --account 7 - < group.json", buildGroupAdd},
+    {"group", "set", "Change a group's name", "group set 3 name=Choir", buildGroupSet},
+    {"group", "delete", "Delete a group; its contacts stay", "group delete 3", buildGroupDelete},
 };
 
 const std::string kExamplesTitle = "Examples:\n";
@@ -192,7 +216,8 @@ std::span<const Command> allCommands() {
 }
 
 int runCommandLine(int argc, const char* const* argv) {
-    CLI::App app("Keeps calendars of this device in step with an account's services.", kProgram);
+    CLI::App app("Keeps calendars, to-dos and contacts of this device in step with an account's services.",
+                 kProgram);
     Action chosen;
     try {
         declare(app, chosen);

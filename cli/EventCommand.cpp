@@ -181,12 +181,15 @@ void showEvent(int id, bool isJson) {
 }  // namespace
 
 Action buildEventShow(CLI::App& app) {
-    return item_command::buildShow(app, "The event", showEvent);
+    return item_command::buildShow<CalendarStore>(app, "The event", showEvent);
 }
 
 Action buildEventAdd(CLI::App& app) {
-    return item_command::buildAdd(app, "JSON as 'event show --json' prints it; '-' reads standard input",
-                                  addEvent, showEvent);
+    return item_command::buildAdd<CalendarStore>(
+        app,
+        {"JSON as 'event show --json' prints it; '-' reads standard input", "--calendar",
+         "The calendar, instead of the file's"},
+        addEvent, showEvent);
 }
 
 Action buildEventSet(CLI::App& app) {

@@ -6,7 +6,7 @@ namespace item_list {
 
 std::vector<CalendarList> find(const View& view, const ListOptions& options,
                                std::span<const unsigned> projection) {
-    const auto query = [&](const std::vector<CalendarStore::Filter>& filters) {
+    const auto query = [&](const std::vector<store_access::Filter>& filters) {
         return CalendarStore::find(view.uri, filters, view.id, projection);
     };
     std::vector<CalendarList> lists;

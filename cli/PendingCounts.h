@@ -9,5 +9,6 @@ struct PendingCounts {
 namespace pending_counts {
 
 PendingCounts calendarOf(int accountId);
+PendingCounts contactsOf(int accountId);
 
 }  // namespace pending_counts

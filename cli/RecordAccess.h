@@ -1,4 +1,4 @@
-// RecordAccess.h: short reads and writes of calendar records. A refused write is a Failure that names the field.
+// RecordAccess.h: short reads and writes of records of both services. A refused write is a Failure that names the field.
 #pragma once
 
 #include <string>
@@ -40,8 +40,8 @@ inline CalendarRecord create(const char* view) {
 }
 
 // Calls `use` for each record of a list, in order.
-template <class Use>
-void forEach(const CalendarList& list, Use use) {
+template <class List, class Use>
+void forEach(const List& list, Use use) {
     calendar_read::forEach(list.get(), use);
 }
 

@@ -24,7 +24,8 @@ PendingCounts pendingOf(int account, vantor_pim_sync_type_e kind, const SyncStat
     const auto dirty = published.dirty();
     const auto deleted = published.deleted();
     if (isRunning && dirty && deleted) return {*dirty, *deleted};
-    return kind == VANTOR_PIM_SYNC_TYPE_CALENDAR ? pending_counts::calendarOf(account) : PendingCounts();
+    return kind == VANTOR_PIM_SYNC_TYPE_CALENDAR ? pending_counts::calendarOf(account)
+                                                 : pending_counts::contactsOf(account);
 }
 
 int64_t lastSyncOf(int account, vantor_pim_sync_type_e kind, const StoredAccount& stored, bool isRunning) {

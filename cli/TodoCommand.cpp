@@ -75,12 +75,15 @@ Action buildTodosList(CLI::App& app) {
 }
 
 Action buildTodoShow(CLI::App& app) {
-    return item_command::buildShow(app, "The to-do", showTodo);
+    return item_command::buildShow<CalendarStore>(app, "The to-do", showTodo);
 }
 
 Action buildTodoAdd(CLI::App& app) {
-    return item_command::buildAdd(app, "JSON as 'todo show --json' prints it; '-' reads standard input",
-                                  addTodo, showTodo);
+    return item_command::buildAdd<CalendarStore>(
+        app,
+        {"JSON as 'todo show --json' prints it; '-' reads standard input", "--calendar",
+         "The calendar, instead of the file's"},
+        addTodo, showTodo);
 }
 
 Action buildTodoSet(CLI::App& app) {
@@ -96,11 +99,5 @@ Action buildTodoSet(CLI::App& app) {
 }
 
 Action buildTodoDelete(CLI::App& app) {
-    auto options = std::make_shared<ItemOptions>();
-    command::addId(app, "ID", options->id, "The to-do")->required();
-    return [options] {
-        const CalendarStore store;
-        deleteTodo(options->id);
-        return kExitDone;
-    };
+    return item_command::buildDelete<CalendarStore>(app, "The to-do", deleteTodo);
 }

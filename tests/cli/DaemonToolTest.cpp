@@ -110,7 +110,7 @@ TEST_F(DaemonTool, AnAccountIsAddedChangedAndRemoved) {
     EXPECT_EQ(
         expected.dump(),
         R"({"id":7,"email":"me@example.com","registered":true,"configured":true,"calendar":{"enabled":true,)"
-        R"("server":"http://127.0.0.1:9/base","port":null,"period":0},"contacts":{"enabled":false,)"
+        R"("server":"http://127.0.0.1:9/base","port":null,"period":0},"contacts":{"enabled":true,)"
         R"("server":"http://127.0.0.1:9/base","port":null,"period":0},"ssl":false,"roaming":false})");
     ASSERT_EQ(mTool
                   .run({"account", "update", "7", "--calendar-period", "30", "--roaming", "--calendar-server",
@@ -125,7 +125,7 @@ TEST_F(DaemonTool, AnAccountIsAddedChangedAndRemoved) {
     EXPECT_EQ(mTool.json({"account", "show", "7", "--json"}).dump(), expected.dump());
     EXPECT_EQ(token_file::read(7), "renewed");
 
-    ASSERT_EQ(mTool.run({"account", "update", "7", "--no-calendar"}).status, 0);
+    ASSERT_EQ(mTool.run({"account", "update", "7", "--no-calendar", "--no-contacts"}).status, 0);
     EXPECT_THAT(mTool.run({"sync", "7"}).error, HasSubstr("account update 7 --calendar"));
     EXPECT_THAT(mTool.run({"sync", "7", "contacts"}).error, HasSubstr("account update 7 --contacts"));
     EXPECT_THAT(mTool.run({"sync", "8"}).error, HasSubstr("account 8"));

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include "platform/contacts.h"
+
 namespace {
 const std::string kTool = std::string(VPS_BIN_DIR) + "/vantor-pim-syncctl";
 }
@@ -43,5 +45,32 @@ int ToolRoot::addCalendar(int account, const char* name, bool isReadOnly, int st
     int id = 0;
     EXPECT_EQ(calendar_db_insert_record(raw, &id), 0);
     calendar_disconnect();
+    return id;
+}
+
+int ToolRoot::addAddressBook(int account) {
+    EXPECT_EQ(contacts_connect_with_flags(0), 0);
+    contacts_record_h raw = nullptr;
+    EXPECT_EQ(contacts_record_create(_contacts_address_book, &raw), 0);
+    const ContactsRecord book(raw);
+    EXPECT_EQ(contacts_record_set_int(raw, CONTACTS_ADDRESS_BOOK_ACCOUNT_ID, account), 0);
+    int id = 0;
+    EXPECT_EQ(contacts_db_insert_record(raw, &id), 0);
+    contacts_disconnect();
+    return id;
+}
+
+int ToolRoot::addSystemGroup(int book, const char* name) {
+    EXPECT_EQ(contacts_connect_with_flags(0), 0);
+    contacts_record_h raw = nullptr;
+    EXPECT_EQ(contacts_record_create(_contacts_group, &raw), 0);
+    const ContactsRecord group(raw);
+    EXPECT_EQ(contacts_record_set_int(raw, CONTACTS_GROUP_ADDRESS_BOOK_ID, book), 0);
+    EXPECT_EQ(contacts_record_set_str(raw, CONTACTS_GROUP_NAME, name), 0);
+    EXPECT_EQ(contacts_record_set_str(raw, CONTACTS_GROUP_SYSTEM_ID, name), 0);
+    EXPECT_EQ(contacts_record_set_int(raw, CONTACTS_GROUP_IS_READ_ONLY, 1), 0);
+    int id = 0;
+    EXPECT_EQ(contacts_db_insert_record(raw, &id), 0);
+    contacts_disconnect();
     return id;
 }

@@ -22,6 +22,8 @@ public:
 
     // A calendar of the store, made as another program would.
     static int addCalendar(int account, const char* name, bool isReadOnly = false, int storeType = 1);
+    static int addAddressBook(int account);
+    static int addSystemGroup(int book, const char* name);
     static int addTaskList(int account, const char* name) { return addCalendar(account, name, false, 2); }
 
 private:

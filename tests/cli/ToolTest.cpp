@@ -24,7 +24,7 @@ TEST(Tool, TellsMisuseFromFailureAndSaysWhyInOneLine) {
     const StatusRow rows[] = {
         {{}, 2},
         {{"dance"}, 2},
-        {{"contacts", "list"}, 2},
+        {{"contacts", "show"}, 2},
         {{"todo", "show", "0"}, 2},
         {{"todo", "show", "1"}, 1},
         {{"event"}, 2},

@@ -221,13 +221,15 @@ int CtDownSyncDirector::fetchPhoto(BulkItem& item) {
 }
 
 void CtDownSyncDirector::fetchProfile(BulkItem& item, bool wantsImage) {
-    const std::string prefix = mCurl.peopleBase() + ct_wire::kProfiles;
+    if (item.entry->websites.empty()) return;
+    const std::string base = mCurl.peopleBase();
+    const std::string prefix = base + ct_wire::kProfiles;
     for (const std::string& website : item.entry->websites) {
         if (!website.starts_with(prefix)) continue;
         std::string profile;
         std::string url;
         if (mCurl.getOrbit(website.substr(prefix.size()), &profile) != kOk ||
-            CtJsonOrbitPeopleConverter::getPhotoUrl(profile, mCurl.peopleBase(), &url) != kOk) {
+            CtJsonOrbitPeopleConverter::getPhotoUrl(profile, base, &url) != kOk) {
             return;
         }
         item.profile = std::move(profile);

@@ -309,7 +309,7 @@ int CtCurl::getOrbit(const std::string& personId, std::string* profile) {
         return kFailed;
     }
     const std::string url =
-        peopleBase() + ct_wire::kPeople + url_text::segment(personId) + "?key=" + ct_wire::kPeopleKey;
+        peopleBase() + ct_wire::kPeople + url_text::hrefSegment(personId) + "?key=" + ct_wire::kPeopleKey;
     return decide("Getting XML from server Failed!", Access::kOpen, Timeouts::kRepeated,
                   [&] { return getOrbitImpl(url, profile); });
 }

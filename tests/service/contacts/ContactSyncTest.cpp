@@ -240,6 +240,36 @@ TEST_F(ContactSync, GroupsOfTheDeviceGoUpButNotThoseOfTheServer) {
     EXPECT_EQ(mServer.all("groups").size(), 1U);
 }
 
+TEST_F(ContactSync, IdsThatAreEncodedInHrefsAreFoundAgain) {
+    const std::vector<std::string> ids = {"c:1 @x", "c%2Fb", "c\xC3\xA9"};
+    mServer.put("groups", "g:1 %", {{"title", {{"$t", "Friends"}}}});
+    for (const std::string& id : ids) mServer.put("contacts", id, named(id));
+    sync();
+    expectSame();
+    int group = 0;
+    ASSERT_EQ(manager().getGroupId("g%3A1%20%25", mBook, &group), kOk);
+    add("member", group);
+    for (const std::string& id : ids) rename(deviceContacts()[id], id + " edited");
+    setImage(deviceContacts()[ids[0] + " edited"], "mine");
+    sync();
+    ASSERT_EQ(mServer.all("contacts").size(), 4U) << "nothing is doubled";
+    for (const std::string& id : ids)
+        EXPECT_EQ(mServer.all("contacts")[id]["gd$name"]["gd$givenName"]["$t"], id + " edited");
+    EXPECT_EQ(mServer.photo(ids[0]), "mine");
+    const Json member = mServer.all("contacts").rbegin()->second;
+    EXPECT_TRUE(
+        member["gContact$groupMembershipInfo"][0]["href"].get<std::string>().ends_with("/base/g%3A1%20%25"))
+        << member;
+    sync();
+    expectQuiet();
+    for (const std::string& id : ids) erase(deviceContacts()[id + " edited"]);
+    ASSERT_EQ(contacts_db_delete_record(_contacts_group, group), 0);
+    sync();
+    EXPECT_EQ(serverNames(), std::set<std::string>{"member"});
+    EXPECT_TRUE(mServer.all("groups").empty());
+    expectSame();
+}
+
 TEST_F(ContactSync, PhotosGoBothWays) {
     mServer.put("contacts", "a", named("a"));
     mServer.putPhoto("a", "first photo");

@@ -14,6 +14,16 @@ Json fieldsOf(const Json& atom) {
     return fields;
 }
 
+std::string encoded(const std::string& id) {
+    std::string text;
+    for (const unsigned char c : id) {
+        char code[8];
+        std::snprintf(code, sizeof code, std::isalnum(c) != 0 ? "%c" : "%%%02X", c);
+        text += code;
+    }
+    return text;
+}
+
 }  // namespace
 
 FeedServer::FeedServer() {
@@ -69,12 +79,12 @@ int FeedServer::takeWrites() {
 Json FeedServer::entry(const std::string& feed, const std::string& id) const {
     const std::string base = url() + kHost + feed + "/a%40x.com/";
     Json shown = mEntries.at(feed).at(id);
-    shown["id"] = {{"$t", base + "base/" + id}};
+    shown["id"] = {{"$t", base + "base/" + encoded(id)}};
     shown["updated"] = {{"$t", "2026-03-01T10:00:00.000Z"}};
-    shown["link"] = {{{"rel", "edit"}, {"href", base + "full/" + id}}};
+    shown["link"] = {{{"rel", "edit"}, {"href", base + "full/" + encoded(id)}}};
     if (mPhotos.contains(id) && feed == "contacts") {
         shown["link"].push_back({{"rel", "http://any/rel#photo"},
-                                 {"href", url() + kHost + "photos/media/a%40x.com/" + id},
+                                 {"href", url() + kHost + "photos/media/a%40x.com/" + encoded(id)},
                                  {"gd$etag", mPhotos.at(id).first}});
     }
     return shown;

@@ -1,4 +1,5 @@
-// FeedServer: a contacts service in a test: entries by id, pages of two, etags that are checked. Not strict about content.
+// FeedServer: a contacts service in a test: entries by id, pages of two, etags that are checked. In hrefs ids are
+// percent-encoded. Not strict about content.
 #pragma once
 
 #include <httplib.h>

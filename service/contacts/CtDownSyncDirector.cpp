@@ -83,8 +83,8 @@ int CtDownSyncDirector::syncGroups(Feed feed) {
         SYNC_INFO("%zu groups are no longer listed, the list is fetched again", listing.unlisted().size());
         result = readPages<CtGroupPage>(
             fetch,
-            [&listing](CtGroupPage& page) {
-                listing.take(&page);
+            [&listing](const CtGroupPage& page) {
+                listing.takeAgain(page);
                 return kOk;
             },
             stopped);
@@ -144,8 +144,8 @@ int CtDownSyncDirector::syncContacts(Feed feed) {
         SYNC_INFO("%zu contacts are no longer listed, the list is fetched again", listing.unlisted().size());
         result = readPages<CtContactPage>(
             fetch,
-            [&listing](CtContactPage& page) {
-                listing.take(&page);
+            [&listing](const CtContactPage& page) {
+                listing.takeAgain(page);
                 return kOk;
             },
             stopped);

@@ -12,6 +12,7 @@
 #include "contacts/CtUpSyncDirector.h"
 #include "platform/contacts_read.h"
 #include "service/contacts/FeedServer.h"
+#include "support/LogCapture.h"
 #include "support/TestRoot.h"
 
 using contacts_read::forEachChild;
@@ -398,6 +399,34 @@ TEST_F(ContactSync, OnlyACompleteListDeletes) {
     sync();
     expectSame();
     expectQuiet();
+}
+
+TEST_F(ContactSync, AGroupIsMissedTwiceBeforeItsManyMembershipsGo) {
+    const Json membership = {{{"href", "http://s/groups/a%40x.com/base/big"}}};
+    for (const char* id : {"big", "g1", "g2"}) mServer.put("groups", id, {{"title", {{"$t", id}}}});
+    for (int i = 0; i < 12; ++i)
+        mServer.put("contacts", "c" + std::to_string(i),
+                    named("n" + std::to_string(i), {{"gContact$groupMembershipInfo", membership}}));
+    sync();
+    int before = 0;
+    int after = 0;
+    ASSERT_EQ(manager().getGroupId("big", mBook, &before), kOk);
+    const LogCapture log;
+    mServer.hiddenGroup = "big";
+    mServer.hiddenLists = 1;
+    sync();
+    ASSERT_EQ(manager().getGroupId("big", mBook, &after), kOk);
+    EXPECT_EQ(before, after);
+    EXPECT_FALSE(log.has("is listed twice")) << "the second look is no second entry";
+    expectQuiet();
+    mServer.hiddenGroup = "g1";
+    mServer.hiddenLists = 1;
+    sync();
+    EXPECT_EQ(manager().getGroupId("g1", mBook, &after), kFailed) << "little is believed at once";
+    mServer.hiddenGroup = "big";
+    mServer.hiddenLists = 2;
+    sync();
+    EXPECT_EQ(manager().getGroupId("big", mBook, &after), kFailed);
 }
 
 TEST_F(ContactSync, TheWholeFeedAtOnceSaysTheSame) {

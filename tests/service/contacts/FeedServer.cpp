@@ -109,9 +109,11 @@ void FeedServer::serveFeeds(const std::string& feed) {
         }
         const bool isEmpty = feed == "contacts" && start == 0 && emptyLists > 0;
         if (isEmpty) --emptyLists;
+        if (feed == "groups" && start == 0) mHidesGroup = hiddenLists-- > 0;
         Json shown = {{"entry", Json::array()}, {"link", Json::array()}};
         size_t at = 0;
         for (const auto& [id, fields] : mEntries[feed]) {
+            if (feed == "groups" && mHidesGroup && id == hiddenGroup) continue;
             if (at >= start && at < start + page && !isEmpty) shown["entry"].push_back(entry(feed, id));
             ++at;
         }

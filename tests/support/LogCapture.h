@@ -13,9 +13,12 @@ public:
     LogCapture(const LogCapture&) = delete;
     LogCapture& operator=(const LogCapture&) = delete;
 
-    [[nodiscard]] bool has(const std::string& text) const {
+    // How often a text was logged.
+    [[nodiscard]] int count(const std::string& text) const {
         const std::lock_guard lock(mMutex);
-        return mLines.find(text) != std::string::npos;
+        int found = 0;
+        for (size_t at = mLines.find(text); at != std::string::npos; at = mLines.find(text, at + 1)) ++found;
+        return found;
     }
 
 private:

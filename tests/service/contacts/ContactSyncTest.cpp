@@ -11,6 +11,7 @@
 #include "contacts/CtDownSyncDirector.h"
 #include "contacts/CtUpSyncDirector.h"
 #include "platform/contacts_read.h"
+#include "platform/settings.h"
 #include "service/contacts/FeedServer.h"
 #include "support/LogCapture.h"
 #include "support/TestRoot.h"
@@ -320,6 +321,62 @@ TEST_F(ContactSync, AProfileFillsWhatIsOpen) {
     expectQuiet();
 }
 
+TEST_F(ContactSync, AProfileThatCannotBeHadTakesNothingAndIsAskedForAgain) {
+    const Json website = {{{"href", mServer.url() + "/profiles/p1"}, {"rel", "home"}}};
+    mServer.put("contacts", "a", {{"gContact$website", website}});
+    sync();
+    // Neither the fields nor the image go with an answer that says nothing; the rest of the entry comes down.
+    mServer.profileStatus = 500;
+    mServer.put("contacts", "a", {{"gContact$website", website}, {"content", {{"$t", "edited"}}}});
+    mServer.put("contacts", "b", named("New", {{"gContact$website", website}}));
+    sync();
+    EXPECT_EQ(deviceNames(), (std::set<std::string>{"Public", "New"}));
+    EXPECT_EQ(imageOf(deviceContacts()["Public"]), "profile image 720");
+    CtContactData data;
+    ASSERT_EQ(manager().getContactData(deviceContacts()["Public"], mServer.url(), &data), kOk);
+    const Json shown = readAtom(data.entry);
+    EXPECT_EQ(shown["content"]["$t"], "edited");
+    EXPECT_EQ(shown["gContact$birthday"]["when"], "1985-03-07");
+    expectQuiet();
+    mServer.profileStatus = 200;
+    mServer.profileImageStatus = 404;
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["New"]), "");
+    EXPECT_EQ(imageOf(deviceContacts()["Public"]), "profile image 720");
+    expectQuiet();
+    mServer.profileImageStatus = 200;
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["New"]), "profile image 720");
+    const LogCapture log;
+    mServer.profileStatus = 500;
+    expectQuiet();
+    EXPECT_EQ(log.count("cannot be had"), 0) << "what was had is not asked for again";
+    // A person who is not there any more gives nothing.
+    mServer.profileStatus = 404;
+    mServer.put("contacts", "a", {{"gContact$website", website}});
+    sync();
+    EXPECT_EQ(deviceNames(), (std::set<std::string>{"", "New"}));
+    EXPECT_EQ(imageOf(deviceContacts()[""]), "");
+    expectQuiet();
+}
+
+TEST_F(ContactSync, APeopleServerThatDoesNotAnswerIsAskedOnce) {
+    const char* const base = "http://127.0.0.1:1";
+    ASSERT_EQ(vconf_set_str("db/vantor-pim-sync/people_server", base), 0);
+    for (const char* id : {"a", "b", "c"})
+        mServer.put("contacts", id,
+                    named(id, {{"gContact$website", {{{"href", std::string(base) + "/profiles/p1"}}}}}));
+    {
+        const LogCapture log;
+        sync();
+        EXPECT_EQ(log.count("cannot be had"), 3);
+        EXPECT_EQ(log.count("Getting XML from server Failed!"), 1);
+    }
+    expectSame();
+    expectQuiet();
+    ASSERT_EQ(vconf_unset("db/vantor-pim-sync/people_server"), 0);
+}
+
 TEST_F(ContactSync, WhenBothSidesChangedTheDeviceWins) {
     for (const char* id : {"a", "b", "c"}) mServer.put("contacts", id, named(id));
     sync();
@@ -417,7 +474,7 @@ TEST_F(ContactSync, AGroupIsMissedTwiceBeforeItsManyMembershipsGo) {
     sync();
     ASSERT_EQ(manager().getGroupId("big", mBook, &after), kOk);
     EXPECT_EQ(before, after);
-    EXPECT_FALSE(log.has("is listed twice")) << "the second look is no second entry";
+    EXPECT_EQ(log.count("is listed twice"), 0) << "the second look is no second entry";
     expectQuiet();
     mServer.hiddenGroup = "g1";
     mServer.hiddenLists = 1;

@@ -165,11 +165,16 @@ void FeedServer::serveFeeds(const std::string& feed) {
 void FeedServer::servePeople() {
     mServer.Get("/orbit/v1/people/p1", [this](const httplib::Request& request, httplib::Response& response) {
         const bool isOpen = request.has_param("key") && !request.has_header("Authorization");
-        response.status = isOpen ? 200 : 400;
-        const Json profile = {{"givenName", "Public"}, {"image", {{"url", url() + "/img/p1?sz=50"}}}};
+        const std::lock_guard lock(mMutex);
+        response.status = isOpen ? profileStatus : 400;
+        const Json profile = {{"givenName", "Public"},
+                              {"birthday", "1985-03-07"},
+                              {"image", {{"url", url() + "/img/p1?sz=50"}}}};
         response.set_content(profile.dump(), "application/json");
     });
-    mServer.Get("/img/p1", [](const httplib::Request& request, httplib::Response& response) {
+    mServer.Get("/img/p1", [this](const httplib::Request& request, httplib::Response& response) {
+        const std::lock_guard lock(mMutex);
+        response.status = profileImageStatus;
         response.set_content("profile image " + request.get_param_value("sz"), "image/jpeg");
     });
 }

@@ -34,6 +34,8 @@ public:
     int hiddenLists = 0;
     bool endsEarly = false;  // the second page is an error
     int photoStatus = 200;
+    int profileStatus = 200;
+    int profileImageStatus = 200;
 
 private:
     void serveFeeds(const std::string& feed);

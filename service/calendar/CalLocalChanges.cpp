@@ -121,52 +121,51 @@ public:
         }
     }
 
-    void mark(const LocalChange& change) {
+    [[nodiscard]] int mark(const LocalChange& change) {
         const auto known = mRows.find(change.itemId);
         CalEventMetaData* row = known != mRows.end() ? &known->second : nullptr;
-        if (row != nullptr && row->version == change.version) return;
+        if (row != nullptr && row->version == change.version) return kOk;
         if (mIsReadOnly) return pass(change, row);
-        if (change.status == RECORD_DELETED) {
-            if (mStore.markDeleted(change.itemId, 1) != kOk) SYNC_ERR("MetaDB update deleted fail");
-        } else if (row != nullptr) {
-            markChanged(change, *row);
-        } else if (!change.knownToSync()) {
-            markNew(change);
-        }
+        if (change.status == RECORD_DELETED)
+            return logged(mStore.markDeleted(change.itemId, 1), "MetaDB update deleted fail");
+        if (row != nullptr) return markChanged(change, *row);
         // A record of the sync that has no row is taken over by the next download, as changed.
+        return change.knownToSync() ? kOk : markNew(change);
     }
 
 private:
+    static int logged(int result, const char* failureText) {
+        if (result != kOk) SYNC_ERR_AS("mark", "%s", failureText);
+        return result;
+    }
+
     // Nobody will take it. The item counts as seen, so that the server's next change of it comes down.
-    void pass(const LocalChange& change, CalEventMetaData* row) {
+    int pass(const LocalChange& change, CalEventMetaData* row) {
         SYNC_ERR("%s(%s) is read-only, the device's change of %s(%d) is not sent", mKind.bookName,
                  mBook.uri.c_str(), mKind.itemName, change.itemId);
-        if (row == nullptr || change.status == RECORD_DELETED) return;
+        if (row == nullptr || change.status == RECORD_DELETED) return kOk;
         row->version = change.version;
-        if (mStore.updateItem(*row) != kOk) SYNC_ERR("MetaDB update dirty fail");
+        return logged(mStore.updateItem(*row), "MetaDB update dirty fail");
     }
 
-    void markChanged(const LocalChange& change, CalEventMetaData& row) {
+    int markChanged(const LocalChange& change, CalEventMetaData& row) {
         if (change.ownVersion > std::max(row.version, change.syncedVersion)) row.dirty = 1;
         row.version = change.version;
-        if (mStore.updateItem(row) != kOk) SYNC_ERR("MetaDB update dirty fail");
-        markChildren(row, change);
+        const int result = logged(mStore.updateItem(row), "MetaDB update dirty fail");
+        return result == kOk ? markChildren(row, change) : result;
     }
 
-    void markNew(const LocalChange& change) {
+    int markNew(const LocalChange& change) {
         CalEventMetaData row;
         row.event_id = change.itemId;
         row.calendar_id = mBook.calendar_id;
         row.version = change.version;
         row.dirty = 1;
-        if (mStore.insertItem(row) != kOk) {
-            SYNC_ERR("MetaDB insert fail");
-            return;
-        }
-        markChildren(row, change);
+        const int result = logged(mStore.insertItem(row), "MetaDB insert fail");
+        return result == kOk ? markChildren(row, change) : result;
     }
 
-    void markChildren(const CalEventMetaData& series, const LocalChange& change) {
+    int markChildren(const CalEventMetaData& series, const LocalChange& change) {
         for (const ChangedChild& child : change.children) {
             const auto known = mInstances.find({series.event_id, child.recurrenceId});
             const bool isKnown = known != mInstances.end();
@@ -185,9 +184,10 @@ private:
             row.event_id = child.eventId;
             row.version = child.version;
             row.dirty = 1;
-            if ((isKnown ? mStore.updateItem(row) : mStore.insertItem(row)) != kOk)
-                SYNC_ERR("MetaDB insert fail");
+            const int result = isKnown ? mStore.updateItem(row) : mStore.insertItem(row);
+            if (logged(result, "MetaDB insert fail") != kOk) return result;
         }
+        return kOk;
     }
 
     const CalItemKind& mKind;
@@ -233,7 +233,9 @@ int CalManager::setBookChanged(int calendarId) {
     // The version moves first, but only together with the marks: a walk that was cut off is walked again.
     SyncTransaction transaction(store->database());
     if (!transaction.begun() || store->books().updateVersion(calendarId, current) != kOk) return kFailed;
-    for (const LocalChange& change : changes) marker.mark(change);
+    for (const LocalChange& change : changes) {
+        if (marker.mark(change) != kOk) return kFailed;
+    }
     return transaction.commit();
 }
 

@@ -147,11 +147,20 @@ sqlite3_stmt* SyncDatabase::prepare(std::string_view sql) {
     return statement;
 }
 
+// SQLite undoes a transaction by itself, as on a full disk. What comes after must not be kept without what came before.
+bool SyncDatabase::isUndone() const {
+    return mTransactionDepth > 0 && sqlite3_get_autocommit(mpHandle) != 0;
+}
+
 int SyncDatabase::step(std::string_view sql, Params params) {
     const std::lock_guard lock(mMutex);
     if (mpHandle == nullptr && openDb() != kOk) {
         SYNC_ERR("Database is not opened");
         return kNotOpened;
+    }
+    if (isUndone()) {
+        SYNC_ERR("the transaction was undone, nothing more of it is written");
+        return SQLITE_ABORT_ROLLBACK;
     }
     sqlite3_stmt* statement = prepare(sql);
     if (statement == nullptr) return sqlite3_errcode(mpHandle);
@@ -191,7 +200,9 @@ int SyncDatabase::begin_trans() {
 int SyncDatabase::end_trans(bool success) {
     // The thread that began holds the mutex once for each begin; this is its last word at this depth.
     const std::unique_lock<std::recursive_mutex> lock(mMutex, std::adopt_lock);
+    const bool undone = isUndone();
     if (--mTransactionDepth != 0) return kOk;
+    if (undone) return success ? kFailed : kOk;
     if (success) {
         if (execRetried("COMMIT TRANSACTION") == kOk) return kOk;
         (void)step("ROLLBACK TRANSACTION", {});

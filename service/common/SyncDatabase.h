@@ -59,7 +59,8 @@ public:
     [[nodiscard]] int openDb();
     [[nodiscard]] int makeDb();
 
-    // One write statement outside or inside a transaction: SQLITE_DONE or SQLITE_ROW, else SQLite's error code;
+    // One write statement outside or inside a transaction: SQLITE_DONE or SQLITE_ROW, else SQLite's error code
+    // (SQLITE_ABORT_ROLLBACK when SQLite has undone the transaction: nothing more is written until its end, which fails);
     // kNotOpened when the store cannot be opened (logged).
     static constexpr int kNotOpened = -1;
     [[nodiscard]] int step(std::string_view sql, Params params);
@@ -83,6 +84,7 @@ public:
     [[nodiscard]] int changes() const;
 
 private:
+    [[nodiscard]] bool isUndone() const;
     [[nodiscard]] sqlite3_stmt* prepare(std::string_view sql);
     [[nodiscard]] int execRetried(const char* sql);
     [[nodiscard]] int read(std::string_view sql, Params params, bool firstOnly,

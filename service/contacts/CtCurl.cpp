@@ -118,15 +118,19 @@ std::string withPhotoSize(const std::string& imageUrl) {
 }
 
 CtCurl::CtCurl(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share)
-    : mpAccount(account),
-      mpObserver(observer),
-      mpShare(std::move(share)),
-      mFeedBase(server_address::contactsBase(*account) + ct_wire::kFeeds),
-      mPeopleBase(server_address::peopleBase(*account)) {}
+    : mpAccount(account), mpObserver(observer), mpShare(std::move(share)) {}
+
+std::string CtCurl::feedBase() const {
+    return server_address::contactsBase(*mpAccount) + ct_wire::kFeeds;
+}
+
+std::string CtCurl::peopleBase() const {
+    return server_address::peopleBase(*mpAccount);
+}
 
 bool CtCurl::isOwn(const std::string& url) const {
     const std::string origin = originOfUrl(url);
-    return !origin.empty() && origin == originOfUrl(mFeedBase);
+    return !origin.empty() && origin == originOfUrl(feedBase());
 }
 
 HttpTransfer CtCurl::makeTransfer(const std::string& url, const char* method, Access access) {
@@ -256,7 +260,7 @@ int CtCurl::get(const std::string& url, std::string* text) {
 
 int CtCurl::insert(CtItemType type, const std::string& entry, std::string* reply) {
     const std::string url =
-        mFeedBase + "/" +
+        feedBase() + "/" +
         (type == CtItemType::kGroup ? "groups/default/full?alt=json" : "contacts/default/full?alt=json");
     return decide("Inserting XML to server Failed!", Access::kAccount, Timeouts::kFinal,
                   [&] { return insertImpl(url, entry, reply); });
@@ -305,7 +309,7 @@ int CtCurl::getOrbit(const std::string& personId, std::string* profile) {
         return kFailed;
     }
     const std::string url =
-        mPeopleBase + ct_wire::kPeople + url_text::segment(personId) + "?key=" + ct_wire::kPeopleKey;
+        peopleBase() + ct_wire::kPeople + url_text::hrefSegment(personId) + "?key=" + ct_wire::kPeopleKey;
     return decide("Getting XML from server Failed!", Access::kOpen, Timeouts::kRepeated,
                   [&] { return getOrbitImpl(url, profile); });
 }

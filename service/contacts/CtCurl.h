@@ -21,10 +21,10 @@ public:
     // Nothing is owned; the observer and the share may be NULL.
     CtCurl(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share);
 
-    // Without a trailing slash.
-    [[nodiscard]] const std::string& feedBase() const { return mFeedBase; }
-    // Where the people service lives.
-    [[nodiscard]] const std::string& peopleBase() const { return mPeopleBase; }
+    // Where the contacts and the people service live, as the account and the settings say now: they may change while the
+    // client lives. Without a trailing slash.
+    [[nodiscard]] std::string feedBase() const;
+    [[nodiscard]] std::string peopleBase() const;
     // Whether a URL that the server gave leads to the server itself; nothing else gets the account's token.
     [[nodiscard]] bool isOwn(const std::string& url) const;
 
@@ -76,8 +76,6 @@ private:
     Account* mpAccount;
     IProgressObserver* mpObserver;
     std::shared_ptr<HttpShare> mpShare;
-    const std::string mFeedBase;
-    const std::string mPeopleBase;
     std::string mUsedToken;
     long mHttpStatus = 0;
 };

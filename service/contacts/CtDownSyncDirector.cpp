@@ -1,6 +1,7 @@
 #include "contacts/CtDownSyncDirector.h"
 
 #include "common/Account.h"
+#include "common/HttpStatus.h"
 #include "common/PageReader.h"
 #include "common/SyncLog.h"
 #include "contacts/CtDataManager.h"
@@ -8,6 +9,7 @@
 #include "contacts/CtJsonOrbitPeopleConverter.h"
 #include "contacts/CtListing.h"
 #include "contacts/CtPagePlan.h"
+#include "contacts/CtRecordRead.h"
 
 using sync_result::kFailed;
 using sync_result::kOk;
@@ -83,8 +85,8 @@ int CtDownSyncDirector::syncGroups(Feed feed) {
         SYNC_INFO("%zu groups are no longer listed, the list is fetched again", listing.unlisted().size());
         result = readPages<CtGroupPage>(
             fetch,
-            [&listing](CtGroupPage& page) {
-                listing.take(&page);
+            [&listing](const CtGroupPage& page) {
+                listing.takeAgain(page);
                 return kOk;
             },
             stopped);
@@ -120,6 +122,7 @@ int CtDownSyncDirector::syncContacts(Feed feed) {
         snapshot.load(*store, addressBookId) != kOk || groups.load(*store, addressBookId) != kOk) {
         return fail(kFailed, kStoresUnreadable);
     }
+    mHasPeople = true;
     const ContactComposer composer = groups.composer(mCurl.feedBase());
     CtListing<CtContactKind> listing(store, &snapshot);
     CtSentRows<CtContactKind> sent = readSentContacts(snapshot, composer);
@@ -135,7 +138,7 @@ int CtDownSyncDirector::syncContacts(Feed feed) {
         [&](CtContactPage& page) {
             listing.take(&page);
             CtContactBatch batch = planContacts(page, snapshot, composer, &sent);
-            if (const int photos = fetchPhotos(&batch); photos != kOk) return photos;
+            if (const int photos = fetchPhotos(&batch, groups); photos != kOk) return photos;
             if (writeBatch(&batch, feed, &inserted, &updated) != kOk) written = kFailed;
             return kOk;
         },
@@ -144,8 +147,8 @@ int CtDownSyncDirector::syncContacts(Feed feed) {
         SYNC_INFO("%zu contacts are no longer listed, the list is fetched again", listing.unlisted().size());
         result = readPages<CtContactPage>(
             fetch,
-            [&listing](CtContactPage& page) {
-                listing.take(&page);
+            [&listing](const CtContactPage& page) {
+                listing.takeAgain(page);
                 return kOk;
             },
             stopped);
@@ -183,29 +186,33 @@ int CtDownSyncDirector::writeBatch(CtContactBatch* batch, Feed feed, int* insert
     return mManager.writeContacts(accountId, &rows) == kOk ? first : kFailed;
 }
 
-// --- photos
+// --- photos and profiles
 
-int CtDownSyncDirector::fetchPhotos(CtContactBatch* batch) {
+int CtDownSyncDirector::fetchPhotos(CtContactBatch* batch, const CtGroupMap& groups) {
     for (std::vector<BulkItem>* items : {&batch->inserts, &batch->updates}) {
         for (BulkItem& item : *items) {
             if (isStopped()) return kStopped;
             if (const int result = fetchPhoto(item); result != kOk) return result;
         }
     }
-    std::erase_if(batch->updates, [](const BulkItem& item) { return item.isForPhoto && !item.photo; });
+    std::erase_if(batch->updates, [&](const BulkItem& item) {
+        return !item.photo && (item.isForPhoto || (item.row.etag.empty() && isHeld(item, groups)));
+    });
     return kOk;
 }
 
-// A photo that cannot be had leaves the contact with the image it has, and is asked for again in the next run.
+// A photo that cannot be had leaves the contact with the image it has, and is asked for again in the next run. So is a profile, or
+// the image in it: without an etag the row counts as changed.
 int CtDownSyncDirector::fetchPhoto(BulkItem& item) {
     const ContactInfo& entry = *item.entry;
-    if (entry.photoEtag.empty()) {
-        const bool hadPhoto = !std::exchange(item.row.photo_etag, std::string()).empty();
-        fetchProfile(item, /*wantsImage=*/!item.keepsImage);
-        if (!item.profile.empty() && !hadPhoto) item.keepsImage = true;
+    const bool hasPhoto = !entry.photoEtag.empty();
+    const bool hadPhoto = !hasPhoto && !std::exchange(item.row.photo_etag, std::string()).empty();
+    const bool isComplete = fetchProfile(item, /*wantsImage=*/!hasPhoto && !item.keepsImage);
+    if (!isComplete) item.row.etag.clear();
+    if (!hasPhoto) {
+        if ((!item.profile.empty() || !isComplete) && !hadPhoto) item.keepsImage = true;
         return kOk;
     }
-    fetchProfile(item, /*wantsImage=*/false);
     if (entry.photoEtag == item.row.photo_etag) {
         item.keepsImage = true;
         return kOk;
@@ -220,19 +227,65 @@ int CtDownSyncDirector::fetchPhoto(BulkItem& item) {
     return result == kTokenFailed ? result : kOk;
 }
 
-void CtDownSyncDirector::fetchProfile(BulkItem& item, bool wantsImage) {
-    const std::string prefix = mCurl.peopleBase() + ct_wire::kProfiles;
+// False when there is something that could not be had.
+bool CtDownSyncDirector::fetchProfile(BulkItem& item, bool wantsImage) {
+    if (item.entry->websites.empty()) return true;
+    const std::string base = mCurl.peopleBase();
+    const std::string prefix = base + ct_wire::kProfiles;
     for (const std::string& website : item.entry->websites) {
-        if (!website.starts_with(prefix)) continue;
+        if (!website.starts_with(prefix) || website == prefix) continue;
         std::string profile;
         std::string url;
-        if (mCurl.getOrbit(website.substr(prefix.size()), &profile) != kOk ||
-            CtJsonOrbitPeopleConverter::getPhotoUrl(profile, mCurl.peopleBase(), &url) != kOk) {
-            return;
+        const int result = getProfile(website.substr(prefix.size()), &profile);
+        if (result != kOk && http_status::isGone(mCurl.lastHttpStatus())) return true;  // there is none
+        if (result != kOk || CtJsonOrbitPeopleConverter::getPhotoUrl(profile, base, &url) != kOk) {
+            SYNC_ERR("the profile of contact(%s, %s) cannot be had, the next sync asks for it again",
+                     item.entry->id.c_str(), item.entry->title.c_str());
+            item.profile = formerProfile(item.row.contact_id);
+            return false;
         }
         item.profile = std::move(profile);
-        if (wantsImage && !url.empty() && mPhotoTask.getOfProfile(url, &item.photo) != kOk)
-            SYNC_ERR("Error occurred on photo downloading!");
-        return;
+        if (!wantsImage || url.empty() || mPhotoTask.getOfProfile(url, &item.photo) == kOk) return true;
+        SYNC_ERR("Error occurred on photo downloading!");
+        return false;
+    }
+    return true;
+}
+
+// A people server that does not answer is not waited for again in the same run.
+int CtDownSyncDirector::getProfile(const std::string& personId, std::string* profile) {
+    if (!mHasPeople) return kFailed;
+    const int result = mCurl.getOrbit(personId, profile);
+    if (result != kOk && mCurl.lastHttpStatus() == 0) mHasPeople = false;
+    return result;
+}
+
+std::string CtDownSyncDirector::formerProfile(int contactId) {
+    contacts_record_h raw = nullptr;
+    if (contactId == 0 || contacts_db_get_record(_contacts_contact, contactId, &raw) != PLATFORM_ERROR_NONE)
+        return {};
+    const ContactsRecord record(raw);
+    return CtJsonOrbitPeopleConverter::formerProfile(raw);
+}
+
+// Whether the device has all that could be had for the entry: it is not written again for what could not.
+bool CtDownSyncDirector::isHeld(const BulkItem& item, const CtGroupMap& groups) const {
+    contacts_record_h raw = nullptr;
+    if (item.rowWrite != CtRowWrite::kUpdate || !item.keepsImage ||
+        contacts_db_get_record(_contacts_contact, item.row.contact_id, &raw) != PLATFORM_ERROR_NONE) {
+        return false;
+    }
+    const ContactsRecord held(raw);
+    if (ct_record::originOf(raw) != item.entry->jsonText()) return false;
+    try {
+        ContactsRecord wanted;
+        if (groups.converter().convert(item.entry->object(), {}, &wanted, 0, /*withPhoto=*/false) != kOk)
+            return false;
+        if (!item.profile.empty()) (void)CtJsonOrbitPeopleConverter::convert(item.profile, wanted.get());
+        const ContactComposer composer = groups.composer(mCurl.feedBase());
+        return composer.composeFields(raw) == composer.composeFields(wanted.get());
+    } catch (const JsonException& error) {
+        SYNC_DBG("Handle this execption! (%s)", error.what());
+        return false;
     }
 }

@@ -14,6 +14,7 @@
 
 class Account;
 class CtDataManager;
+class CtGroupMap;
 
 class CtDownSyncDirector : public SyncDirector, private IProgressObserver {
 public:
@@ -40,9 +41,12 @@ private:
     [[nodiscard]] int syncGroups(Feed feed);
     [[nodiscard]] int syncContacts(Feed feed);
     [[nodiscard]] int writeBatch(CtContactBatch* batch, Feed feed, int* inserted, int* updated);
-    [[nodiscard]] int fetchPhotos(CtContactBatch* batch);
+    [[nodiscard]] int fetchPhotos(CtContactBatch* batch, const CtGroupMap& groups);
     [[nodiscard]] int fetchPhoto(BulkItem& item);
-    void fetchProfile(BulkItem& item, bool wantsImage);
+    [[nodiscard]] bool fetchProfile(BulkItem& item, bool wantsImage);
+    [[nodiscard]] int getProfile(const std::string& personId, std::string* profile);
+    [[nodiscard]] static std::string formerProfile(int contactId);
+    [[nodiscard]] bool isHeld(const BulkItem& item, const CtGroupMap& groups) const;
 
     Account* const mpAccount;
     IStopQuery* const mpStopQuery;
@@ -51,5 +55,6 @@ private:
     CtDownSyncTask mContactTask;
     CtDownSyncGroupListTask mGroupTask;
     CtDownSyncContactPhotoTask mPhotoTask;
+    bool mHasPeople = true;  // false once the people server did not answer
     std::string mFailure;
 };

@@ -1,10 +1,14 @@
 #include "contacts/CtJsonOrbitPeopleConverter.h"
 
+#include <cstdio>
+
 #include "common/JsonAccess.h"
 #include "common/JsonText.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 #include "contacts/CtJsonEntryConverter.h"
+#include "contacts/CtMappings.h"
+#include "contacts/CtRecordRead.h"
 #include "platform/contacts_read.h"
 
 using json_access::textOr;
@@ -21,6 +25,15 @@ constexpr NameRow kNameRows[] = {{"givenName", CONTACTS_NAME_FIRST},
                                  {"familyName", CONTACTS_NAME_LAST},
                                  {"honorificPrefix", CONTACTS_NAME_PREFIX},
                                  {"honorificSuffix", CONTACTS_NAME_SUFFIX}};
+
+constexpr const char* kNicknameMember = "nickname";
+constexpr const char* kBirthdayMember = "birthday";
+
+std::string dateText(int date) {
+    char text[32];
+    std::snprintf(text, sizeof text, "%04d-%02d-%02d", date / 10000, date / 100 % 100, date % 100);
+    return text;
+}
 
 // Members of the name may stand in an object of their own.
 std::string memberOf(JsonObject* profile, const char* member) {
@@ -103,11 +116,11 @@ int CtJsonOrbitPeopleConverter::convert(const std::string& profile, contacts_rec
         isAdded =
             addFilled(contact, CONTACTS_CONTACT_NICKNAMES, _contacts_nickname,
                       [person](contacts_record_h nickname) {
-                          return setText(nickname, CONTACTS_NICKNAME_NAME, memberOf(person, "nickname"));
+                          return setText(nickname, CONTACTS_NICKNAME_NAME, memberOf(person, kNicknameMember));
                       }) &&
             isAdded;
     }
-    const std::string birthday = textOr(person, "birthday", "");
+    const std::string birthday = textOr(person, kBirthdayMember, "");
     if (!birthday.empty() && !hasBirthday(contact)) {
         isAdded = addFilled(contact, CONTACTS_CONTACT_EVENTS, _contacts_event,
                             [&birthday](contacts_record_h event) {
@@ -121,4 +134,41 @@ int CtJsonOrbitPeopleConverter::convert(const std::string& profile, contacts_rec
                   isAdded;
     }
     return isAdded ? kOk : kFailed;
+}
+
+std::string CtJsonOrbitPeopleConverter::formerProfile(contacts_record_h contact) {
+    const JsonNodePtr root = json_text::parse(ct_record::originOf(contact));
+    JsonObject* origin = json_access::objectIn(root.get());
+    if (origin == nullptr) return {};
+    const JsonNodePtr profile(json_node_new(JSON_NODE_OBJECT));
+    json_node_take_object(profile.get(), json_object_new());
+    const auto keep = [&profile](const char* member, const std::string& value) {
+        if (!value.empty())
+            json_object_set_string_member(json_node_get_object(profile.get()), member, value.c_str());
+    };
+    const auto isOpen = [origin](const CtSection& section) {
+        JsonNode* node = json_access::member(origin, section.member);
+        return node == nullptr || JSON_NODE_HOLDS_NULL(node);
+    };
+    using contacts_read::forEachChild;
+    using contacts_read::textOf;
+    if (isOpen(ct_mappings::kName)) {
+        forEachChild(contact, CONTACTS_CONTACT_NAMES, [&keep](contacts_record_h name) {
+            for (const NameRow& row : kNameRows) keep(row.member, textOf(name, row.property));
+        });
+    }
+    if (isOpen(ct_mappings::kNickname)) {
+        forEachChild(contact, CONTACTS_CONTACT_NICKNAMES, [&keep](contacts_record_h nickname) {
+            keep(kNicknameMember, textOf(nickname, CONTACTS_NICKNAME_NAME));
+        });
+    }
+    if (isOpen(ct_mappings::kBirthday)) {
+        forEachChild(contact, CONTACTS_CONTACT_EVENTS, [&keep](contacts_record_h event) {
+            const int date = contacts_read::intOf(event, CONTACTS_EVENT_DATE);
+            if (contacts_read::intOf(event, CONTACTS_EVENT_TYPE) == ct_wire::kBirthday && date > 0)
+                keep(kBirthdayMember, dateText(date));
+        });
+    }
+    const bool isEmpty = json_object_get_size(json_node_get_object(profile.get())) == 0;
+    return isEmpty ? std::string() : json_text::textOf(profile.get());
 }

@@ -13,4 +13,8 @@ public:
 
     // Adds name, nickname and birthday where the contact has none. -1 (logged) when that fails.
     [[nodiscard]] static int convert(const std::string& profile, contacts_record_h contact);
+
+    // What an earlier profile gave: what the contact has of it and the server's entry that is kept with the contact has not. As a
+    // profile; empty when there is nothing.
+    [[nodiscard]] static std::string formerProfile(contacts_record_h contact);
 };

@@ -1,7 +1,10 @@
 #include "contacts/CtListing.h"
 
+#include <unordered_map>
+
 #include "common/DeletionProof.h"
 #include "common/SyncLog.h"
+#include "platform/contacts_read.h"
 
 using sync_result::kFailed;
 using sync_result::kOk;
@@ -14,6 +17,36 @@ void makeNew(CtContactSyncRow* row) {
 }
 
 void makeNew(CtGroupSyncRow* /*row*/) {}
+
+// What is deleted with an item, by its record's id. A group takes its memberships along.
+using Companions = std::unordered_map<int, size_t>;
+
+bool readCompanions(CtContactKind /*kind*/, int /*addressBookId*/, Companions* /*counts*/) {
+    return true;
+}
+
+bool readCompanions(CtGroupKind /*kind*/, int addressBookId, Companions* counts) {
+    constexpr unsigned kProperties[] = {CONTACTS_CONTACT_ID, CONTACTS_CONTACT_GROUP_RELATIONS};
+    contacts_query_h rawQuery = nullptr;
+    if (contacts_query_create(_contacts_contact, &rawQuery) != PLATFORM_ERROR_NONE) return false;
+    const ContactsQuery query(rawQuery);
+    contacts_list_h rawList = nullptr;
+    if (contacts_query_add_filter_int(rawQuery, CONTACTS_CONTACT_ADDRESS_BOOK_ID, addressBookId) !=
+            PLATFORM_ERROR_NONE ||
+        contacts_query_set_projection(rawQuery, kProperties, std::size(kProperties)) != PLATFORM_ERROR_NONE ||
+        contacts_db_get_records_with_query(rawQuery, 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
+        SYNC_ERR("get_records_with_query fail");
+        return false;
+    }
+    const ContactsList list(rawList);
+    contacts_read::forEach(rawList, [counts](contacts_record_h contact) {
+        contacts_read::forEachChild(
+            contact, CONTACTS_CONTACT_GROUP_RELATIONS, [counts](contacts_record_h relation) {
+                ++(*counts)[contacts_read::intOf(relation, CONTACTS_GROUP_RELATION_GROUP_ID)];
+            });
+    });
+    return true;
+}
 
 }  // namespace
 
@@ -40,10 +73,25 @@ auto CtListing<Kind>::unlisted() const -> std::vector<Row> {
 template <class Kind>
 bool CtListing<Kind>::needsSecondLook() const {
     if (!mIsProof) return false;
-    size_t known = 0;
-    for (const Row& row : mpSnapshot->rows()) known += row.uri.empty() ? 0 : 1;
-    const size_t gone = unlisted().size();
-    return deletion_proof::needsSecondLook(known, gone, gone == known);
+    const std::vector<Row> missing = unlisted();
+    if (missing.empty()) return false;
+    Companions companions;
+    if (!readCompanions(Kind(), mpSnapshot->addressBookId(), &companions)) return true;
+    const auto count = [&companions](const std::vector<Row>& rows, size_t* items) {
+        size_t all = 0;
+        for (const Row& row : rows) {
+            if (row.uri.empty()) continue;
+            const auto found = companions.find(row.*Kind::kId);
+            all += 1 + (found != companions.end() ? found->second : 0);
+            ++*items;
+        }
+        return all;
+    };
+    size_t missingItems = 0;
+    size_t knownItems = 0;
+    const size_t gone = count(missing, &missingItems);
+    const size_t known = count(mpSnapshot->rows(), &knownItems);
+    return deletion_proof::needsSecondLook(known, gone, missingItems == knownItems);
 }
 
 template <class Kind>

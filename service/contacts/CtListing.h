@@ -25,8 +25,17 @@ public:
         std::erase_if(page->entries, [this](const auto& entry) { return !takeEntry(*entry); });
     }
 
+    // Takes the ids of a page that is listed for the second time.
+    template <class Page>
+    void takeAgain(const Page& page) {
+        if (page.unreadable > 0) mIsProof = false;
+        mListed.insert(page.idOnly.begin(), page.idOnly.end());
+        for (const auto& entry : page.entries) (entry->isDeleted ? mMarked : mListed).insert(entry->id);
+    }
+
     // Known to the server and not listed, nor marked as deleted.
     [[nodiscard]] std::vector<Row> unlisted() const;
+    // Whether so much would go (with a group its memberships) that the list is to be read once more.
     [[nodiscard]] bool needsSecondLook() const;
     // Deletes what is gone from the device and its rows. What the device has changed stays and is sent as new.
     [[nodiscard]] int deleteGone();

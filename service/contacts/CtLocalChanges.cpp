@@ -32,31 +32,34 @@ bool readChange(contacts_record_h record, bool hasImage, CtLocalChange* change) 
     return true;
 }
 
+int logged(int result, const char* failureText) {
+    if (result != kOk) SYNC_ERR_AS("markOne", "%s", failureText);
+    return result;
+}
+
 template <class Kind>
-void markOne(CtMetaDataDBHelper& store, int addressBookId, const CtLocalChange& change,
-             typename Kind::Row* known) {
-    if (known != nullptr && known->version == change.version) return;
+int markOne(CtMetaDataDBHelper& store, int addressBookId, const CtLocalChange& change,
+            typename Kind::Row* known) {
+    if (known != nullptr && known->version == change.version) return kOk;
     if (change.type == RECORD_DELETED) {
-        if (known != nullptr && Kind::markDeleted(store, change.itemId) != kOk)
-            SYNC_ERR("MetaDB update deleted fail");
-        return;
+        if (known == nullptr) return kOk;
+        return logged(Kind::markDeleted(store, change.itemId), "MetaDB update deleted fail");
     }
     if (known != nullptr) {
         known->dirty = 1;
         known->version = change.version;
         Kind::noteImage(known, change.imageChanged != 0);
-        if (Kind::update(store, *known) != kOk) SYNC_ERR("MetaDB update dirty fail");
-        return;
+        return logged(Kind::update(store, *known), "MetaDB update dirty fail");
     }
     // A record of the sync that has no row is taken over by the next download, as changed.
-    if (change.syncedVersion != 0) return;
+    if (change.syncedVersion != 0) return kOk;
     typename Kind::Row row;
     row.*Kind::kId = change.itemId;
     row.addressbook_id = addressBookId;
     row.version = change.version;
     row.dirty = 1;
     Kind::noteImage(&row, change.imageChanged != 0);
-    if (Kind::insert(store, row) != kOk) SYNC_ERR("MetaDB insert fail");
+    return logged(Kind::insert(store, row), "MetaDB insert fail");
 }
 
 }  // namespace
@@ -117,7 +120,8 @@ int mark(CtMetaDataDBHelper& store, int addressBookId) {
     if (!transaction.begun()) return kFailed;
     for (const CtLocalChange& change : changes) {
         const auto row = known.find(change.itemId);
-        markOne<Kind>(store, addressBookId, change, row != known.end() ? row->second : nullptr);
+        typename Kind::Row* knownRow = row != known.end() ? row->second : nullptr;
+        if (markOne<Kind>(store, addressBookId, change, knownRow) != kOk) return kFailed;
     }
     if (Kind::updateLatest(store, addressBookId, current) != kOk) return kFailed;
     return transaction.commit();

@@ -28,7 +28,7 @@ template <class Kind>
 template <class Kind>
 [[nodiscard]] bool some(CtMetaDataDBHelper& store, int addressBookId);
 
-// Brings the rows' marks up to date, in one transaction.
+// Brings the rows' marks up to date, in one transaction: when one cannot be made, none is, and the next walk sees the changes again.
 template <class Kind>
 [[nodiscard]] int mark(CtMetaDataDBHelper& store, int addressBookId);
 

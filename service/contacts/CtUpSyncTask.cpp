@@ -81,7 +81,7 @@ CtUpReply CtUpSyncTask::remove(CtItemType type, const std::string& id, const std
 }
 
 std::string CtUpSyncTask::photoUrl(const std::string& contactId) const {
-    return mpCurl->feedBase() + ct_wire::kPhotos + url_text::segment(contactId);
+    return mpCurl->feedBase() + ct_wire::kPhotos + url_text::hrefSegment(contactId);
 }
 
 CtUpReply CtUpSyncTask::upsertPhoto(const std::string& contactId, const std::string& photoEtag,

@@ -67,6 +67,33 @@ TEST(CalItemWriter, AnEditThatTheSyncHasNotSeenWinsAndTheRowTakesTheEtag) {
     EXPECT_EQ(device.row("a").dirty, 1) << "the edit must still be found";
 }
 
+TEST(CalItemWriter, AChangeThatCannotBeMarkedIsSeenAgain) {
+    CalendarFixture device;
+    device.download({{event("a", "1"), event("b", "1"), event("c", "1")}});
+    const int calendar = device.book.calendar_id;
+    ASSERT_EQ(device.manager.setCalendarbookChanged(calendar), 0);
+    device.userSets("b", kSummary, "mine");
+    device.userSets("a", kSummary, "mine");
+    device.userDeletes("c");
+    (void)device.userAdds("new");
+    SyncDatabase& database = device.manager.metaData()->database();
+    const std::string when[] = {"UPDATE ON eventsync_table WHEN new.uri = 'a'",
+                                "UPDATE ON eventsync_table WHEN new.deleted = 1",
+                                "INSERT ON eventsync_table"};
+    for (const std::string& refused : when) {
+        ASSERT_EQ(
+            database.write(
+                "CREATE TRIGGER refuse BEFORE " + refused + " BEGIN SELECT RAISE(ABORT, 'refused'); END", {}),
+            0);
+        EXPECT_EQ(device.manager.setCalendarbookChanged(calendar), -1) << refused;
+        EXPECT_EQ(device.row("b").dirty, 0) << "all or nothing";
+        ASSERT_EQ(database.write("DROP TRIGGER refuse", {}), 0);
+    }
+    ASSERT_EQ(device.manager.setCalendarbookChanged(calendar), 0);
+    EXPECT_EQ(device.row("a").dirty + device.row("b").dirty + device.row("c").deleted, 3);
+    EXPECT_EQ(device.rowCount(), 4U);
+}
+
 TEST(CalItemWriter, InstancesOfASeriesFollowTheServer) {
     struct Step {
         const char* name;

@@ -21,6 +21,19 @@ void writeToken(const TestRoot& root, int id, const std::string& text) {
         << text;
 }
 
+// A disk that is full for whoever opens a store while the object lives.
+class FullDisk {
+public:
+    FullDisk() { EXPECT_EQ(sqlite3_auto_extension(mExtension), SQLITE_OK); }
+    ~FullDisk() { sqlite3_cancel_auto_extension(mExtension); }
+
+private:
+    static int allowTwoPages(sqlite3* database, const char**, const struct sqlite3_api_routines*) {
+        return sqlite3_exec(database, "PRAGMA max_page_count = 2", nullptr, nullptr, nullptr);
+    }
+    void (*const mExtension)() = reinterpret_cast<void (*)()>(&allowTwoPages);
+};
+
 }  // namespace
 
 TEST(Account, AnUpdateKeepsWhatItDoesNotName) {
@@ -93,12 +106,7 @@ TEST(AccountDBHelper, KeepsAccountsAndSyncTimes) {
 TEST(AccountDBHelper, AFullDiskIsToldAndLeavesWhatWasThere) {
     const TestRoot root;
     ASSERT_EQ(AccountDBHelper().insertAccount(Account(fields(7))), 0);
-    // A disk that is full for whoever opens a store from here on.
-    const auto allowTwoPages = [](sqlite3* database, const char**, const struct sqlite3_api_routines*) {
-        return sqlite3_exec(database, "PRAGMA max_page_count = 2", nullptr, nullptr, nullptr);
-    };
-    auto* const extension = reinterpret_cast<void (*)()>(+allowTwoPages);
-    ASSERT_EQ(sqlite3_auto_extension(extension), SQLITE_OK);
+    auto disk = std::make_unique<FullDisk>();
     AccountDBHelper store;
     std::string large(10'000, 'e');
     for (const int id : {7, 8}) {
@@ -106,7 +114,7 @@ TEST(AccountDBHelper, AFullDiskIsToldAndLeavesWhatWasThere) {
         record.email = large.data();
         EXPECT_EQ(id == 7 ? store.updateAccount(record) : store.insertAccount(Account(record)), -28) << id;
     }
-    sqlite3_cancel_auto_extension(extension);
+    disk.reset();
     std::list<int> ids;
     ASSERT_EQ(AccountDBHelper().getAllAccountIds(&ids), 0);
     EXPECT_EQ(ids, std::list<int>{7});
@@ -139,4 +147,30 @@ TEST(AccountDBHelper, TokensComeFromTheirFiles) {
     writeToken(root, 7, "abc");
     ASSERT_EQ(store.getAllAccounts(&accounts), 0);
     EXPECT_EQ(accounts.front()->getRefreshToken(), "abc");
+}
+
+TEST(SyncDatabase, WhatFollowsInATransactionThatSqliteUndidIsNotWritten) {
+    const TestRoot root;
+    const char* const schema[] = {"CREATE TABLE t(v TEXT)"};
+    const char* const insert = "INSERT INTO t(v) VALUES(?)";
+    const auto rows = [](SyncDatabase& database) {
+        int count = 0;
+        EXPECT_EQ(database.readAll("SELECT v FROM t", {}, [&count](const SyncDatabase::Row&) { ++count; }),
+                  0);
+        return count;
+    };
+    ASSERT_EQ(SyncDatabase("/opt/usr/dbspace/t.db", schema).openDb(), 0);
+    const FullDisk disk;
+    SyncDatabase database("/opt/usr/dbspace/t.db", schema);
+    {
+        SyncTransaction transaction(database);
+        ASSERT_TRUE(transaction.begun());
+        EXPECT_EQ(database.write(insert, {std::string("before")}), 0);
+        EXPECT_EQ(database.write(insert, {std::string(10'000, 'x')}), -1);
+        EXPECT_EQ(database.write(insert, {std::string("after")}), -1);
+        EXPECT_EQ(transaction.commit(), -1);
+    }
+    EXPECT_EQ(rows(database), 0);
+    EXPECT_EQ(database.write(insert, {std::string("next")}), 0) << "the next transaction is one again";
+    EXPECT_EQ(rows(database), 1);
 }

@@ -288,8 +288,12 @@ TEST_F(ContactMapping, IdsAndDates) {
                           {CtIdUtil::idAfterCom, "http://s/photos/media/a%40x.com/c5", "c5"},
                           {CtIdUtil::idAfterCom, "c6", "c6"}};
     for (const Case& row : cases) EXPECT_EQ(row.take(row.href), row.id) << row.href;
-    EXPECT_EQ(CtIdUtil::makeEditHref("B", CtItemType::kContact, "a/b?c"),
-              "B/contacts/default/full/a%2Fb%3Fc");
+    const char* const segments[][2] = {{"6", "6"},         {"a/b?c", "a%2Fb%3Fc"}, {"a%3Ab%2f", "a%3Ab%2f"},
+                                       {"100%", "100%25"}, {"%zz%4", "%25zz%254"}, {"a:b @\"", "a:b%20@%22"}};
+    for (const auto& row : segments) {
+        EXPECT_EQ(CtIdUtil::makeEditHref("B", CtItemType::kContact, row[0]),
+                  std::string("B/contacts/default/full/") + row[1]);
+    }
     EXPECT_EQ(CtIdUtil::makeEditHref("B", CtItemType::kGroup, "6"), "B/groups/default/full/6");
     EXPECT_EQ(CtIdUtil::makeEditHref("B", CtItemType::kPhoto, "6"), "");
     for (const std::string& bad :

@@ -190,6 +190,34 @@ TEST_F(ContactStore, AUsersChangesAreMarked) {
     EXPECT_EQ(row("c1").dirty + row("c1").image_dirty, 0);
 }
 
+TEST_F(ContactStore, AChangeThatCannotBeMarkedIsSeenAgain) {
+    std::vector<BulkItem> page =
+        items({contact("c1", "e", "Ada"), contact("c2", "e", "Bob"), contact("c3", "e", "Cy")});
+    ASSERT_EQ(mManager.insertContacts(kAccount, &page), kOk);
+    ASSERT_EQ(mManager.setAccountChanged(kAccount), kOk);
+    const int edited = row("c1").contact_id;
+    userWrites(row("c2").contact_id, CONTACTS_CONTACT_NOTES, _contacts_note, CONTACTS_NOTE_NOTE, "n");
+    userWrites(edited, CONTACTS_CONTACT_NOTES, _contacts_note, CONTACTS_NOTE_NOTE, "n");
+    ASSERT_EQ(contacts_db_delete_record(_contacts_contact, row("c3").contact_id), 0);
+    (void)userAdds();
+    SyncDatabase& database = mManager.metaData()->database();
+    const std::string when[] = {
+        "UPDATE ON contact_sync_table WHEN new.contact_id = " + std::to_string(edited),
+        "UPDATE ON contact_sync_table WHEN new.deleted = 1", "INSERT ON contact_sync_table"};
+    for (const std::string& refused : when) {
+        ASSERT_EQ(
+            database.write(
+                "CREATE TRIGGER refuse BEFORE " + refused + " BEGIN SELECT RAISE(ABORT, 'refused'); END", {}),
+            kOk);
+        EXPECT_EQ(mManager.setAccountChanged(kAccount), kFailed) << refused;
+        EXPECT_EQ(row("c2").dirty, 0) << "all or nothing";
+        EXPECT_TRUE(mManager.setContactChanged(mBook)) << refused;
+        ASSERT_EQ(database.write("DROP TRIGGER refuse", {}), kOk);
+    }
+    ASSERT_EQ(mManager.setAccountChanged(kAccount), kOk);
+    EXPECT_EQ(row("c1").dirty + row("c2").dirty + row("c3").deleted, 3);
+}
+
 TEST_F(ContactStore, AContactChangedMeanwhileIsNotOverwritten) {
     std::vector<BulkItem> page = items({contact("c1", "e1", "Ada"), contact("c2", "e1", "Bob")});
     ASSERT_EQ(mManager.insertContacts(kAccount, &page), kOk);

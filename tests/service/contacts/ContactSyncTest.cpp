@@ -11,7 +11,9 @@
 #include "contacts/CtDownSyncDirector.h"
 #include "contacts/CtUpSyncDirector.h"
 #include "platform/contacts_read.h"
+#include "platform/settings.h"
 #include "service/contacts/FeedServer.h"
+#include "support/LogCapture.h"
 #include "support/TestRoot.h"
 
 using contacts_read::forEachChild;
@@ -240,6 +242,36 @@ TEST_F(ContactSync, GroupsOfTheDeviceGoUpButNotThoseOfTheServer) {
     EXPECT_EQ(mServer.all("groups").size(), 1U);
 }
 
+TEST_F(ContactSync, IdsThatAreEncodedInHrefsAreFoundAgain) {
+    const std::vector<std::string> ids = {"c:1 @x", "c%2Fb", "c\xC3\xA9"};
+    mServer.put("groups", "g:1 %", {{"title", {{"$t", "Friends"}}}});
+    for (const std::string& id : ids) mServer.put("contacts", id, named(id));
+    sync();
+    expectSame();
+    int group = 0;
+    ASSERT_EQ(manager().getGroupId("g%3A1%20%25", mBook, &group), kOk);
+    add("member", group);
+    for (const std::string& id : ids) rename(deviceContacts()[id], id + " edited");
+    setImage(deviceContacts()[ids[0] + " edited"], "mine");
+    sync();
+    ASSERT_EQ(mServer.all("contacts").size(), 4U) << "nothing is doubled";
+    for (const std::string& id : ids)
+        EXPECT_EQ(mServer.all("contacts")[id]["gd$name"]["gd$givenName"]["$t"], id + " edited");
+    EXPECT_EQ(mServer.photo(ids[0]), "mine");
+    const Json member = mServer.all("contacts").rbegin()->second;
+    EXPECT_TRUE(
+        member["gContact$groupMembershipInfo"][0]["href"].get<std::string>().ends_with("/base/g%3A1%20%25"))
+        << member;
+    sync();
+    expectQuiet();
+    for (const std::string& id : ids) erase(deviceContacts()[id + " edited"]);
+    ASSERT_EQ(contacts_db_delete_record(_contacts_group, group), 0);
+    sync();
+    EXPECT_EQ(serverNames(), std::set<std::string>{"member"});
+    EXPECT_TRUE(mServer.all("groups").empty());
+    expectSame();
+}
+
 TEST_F(ContactSync, PhotosGoBothWays) {
     mServer.put("contacts", "a", named("a"));
     mServer.putPhoto("a", "first photo");
@@ -287,6 +319,62 @@ TEST_F(ContactSync, AProfileFillsWhatIsOpen) {
     EXPECT_EQ(imageOf(deviceContacts()["Public"]), "profile image 720");
     EXPECT_EQ(imageOf(deviceContacts()["Own"]), "own photo");
     expectQuiet();
+}
+
+TEST_F(ContactSync, AProfileThatCannotBeHadTakesNothingAndIsAskedForAgain) {
+    const Json website = {{{"href", mServer.url() + "/profiles/p1"}, {"rel", "home"}}};
+    mServer.put("contacts", "a", {{"gContact$website", website}});
+    sync();
+    // Neither the fields nor the image go with an answer that says nothing; the rest of the entry comes down.
+    mServer.profileStatus = 500;
+    mServer.put("contacts", "a", {{"gContact$website", website}, {"content", {{"$t", "edited"}}}});
+    mServer.put("contacts", "b", named("New", {{"gContact$website", website}}));
+    sync();
+    EXPECT_EQ(deviceNames(), (std::set<std::string>{"Public", "New"}));
+    EXPECT_EQ(imageOf(deviceContacts()["Public"]), "profile image 720");
+    CtContactData data;
+    ASSERT_EQ(manager().getContactData(deviceContacts()["Public"], mServer.url(), &data), kOk);
+    const Json shown = readAtom(data.entry);
+    EXPECT_EQ(shown["content"]["$t"], "edited");
+    EXPECT_EQ(shown["gContact$birthday"]["when"], "1985-03-07");
+    expectQuiet();
+    mServer.profileStatus = 200;
+    mServer.profileImageStatus = 404;
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["New"]), "");
+    EXPECT_EQ(imageOf(deviceContacts()["Public"]), "profile image 720");
+    expectQuiet();
+    mServer.profileImageStatus = 200;
+    sync();
+    EXPECT_EQ(imageOf(deviceContacts()["New"]), "profile image 720");
+    const LogCapture log;
+    mServer.profileStatus = 500;
+    expectQuiet();
+    EXPECT_EQ(log.count("cannot be had"), 0) << "what was had is not asked for again";
+    // A person who is not there any more gives nothing.
+    mServer.profileStatus = 404;
+    mServer.put("contacts", "a", {{"gContact$website", website}});
+    sync();
+    EXPECT_EQ(deviceNames(), (std::set<std::string>{"", "New"}));
+    EXPECT_EQ(imageOf(deviceContacts()[""]), "");
+    expectQuiet();
+}
+
+TEST_F(ContactSync, APeopleServerThatDoesNotAnswerIsAskedOnce) {
+    const char* const base = "http://127.0.0.1:1";
+    ASSERT_EQ(vconf_set_str("db/vantor-pim-sync/people_server", base), 0);
+    for (const char* id : {"a", "b", "c"})
+        mServer.put("contacts", id,
+                    named(id, {{"gContact$website", {{{"href", std::string(base) + "/profiles/p1"}}}}}));
+    {
+        const LogCapture log;
+        sync();
+        EXPECT_EQ(log.count("cannot be had"), 3);
+        EXPECT_EQ(log.count("Getting XML from server Failed!"), 1);
+    }
+    expectSame();
+    expectQuiet();
+    ASSERT_EQ(vconf_unset("db/vantor-pim-sync/people_server"), 0);
 }
 
 TEST_F(ContactSync, WhenBothSidesChangedTheDeviceWins) {
@@ -368,6 +456,34 @@ TEST_F(ContactSync, OnlyACompleteListDeletes) {
     sync();
     expectSame();
     expectQuiet();
+}
+
+TEST_F(ContactSync, AGroupIsMissedTwiceBeforeItsManyMembershipsGo) {
+    const Json membership = {{{"href", "http://s/groups/a%40x.com/base/big"}}};
+    for (const char* id : {"big", "g1", "g2"}) mServer.put("groups", id, {{"title", {{"$t", id}}}});
+    for (int i = 0; i < 12; ++i)
+        mServer.put("contacts", "c" + std::to_string(i),
+                    named("n" + std::to_string(i), {{"gContact$groupMembershipInfo", membership}}));
+    sync();
+    int before = 0;
+    int after = 0;
+    ASSERT_EQ(manager().getGroupId("big", mBook, &before), kOk);
+    const LogCapture log;
+    mServer.hiddenGroup = "big";
+    mServer.hiddenLists = 1;
+    sync();
+    ASSERT_EQ(manager().getGroupId("big", mBook, &after), kOk);
+    EXPECT_EQ(before, after);
+    EXPECT_EQ(log.count("is listed twice"), 0) << "the second look is no second entry";
+    expectQuiet();
+    mServer.hiddenGroup = "g1";
+    mServer.hiddenLists = 1;
+    sync();
+    EXPECT_EQ(manager().getGroupId("g1", mBook, &after), kFailed) << "little is believed at once";
+    mServer.hiddenGroup = "big";
+    mServer.hiddenLists = 2;
+    sync();
+    EXPECT_EQ(manager().getGroupId("big", mBook, &after), kFailed);
 }
 
 TEST_F(ContactSync, TheWholeFeedAtOnceSaysTheSame) {

@@ -8,6 +8,7 @@
 #include "common/SyncResult.h"
 #include "contacts/CtCurl.h"
 #include "platform/keys.h"
+#include "platform/settings.h"
 #include "support/ScriptedServer.h"
 #include "support/TestRoot.h"
 
@@ -112,6 +113,36 @@ TEST(CtCurl, TheTokenGoesToTheAccountsServerOnly) {
     EXPECT_EQ(client.header("Authorization"), "");
     EXPECT_EQ(client.server.refreshes, 0);
     EXPECT_EQ(client.curl.getOrbit("", &client.reply), kFailed);
+}
+
+TEST(CtCurl, AnAccountThatMovesTakesItsClientAlong) {
+    Client client;
+    client.account.setAccessToken("good");
+    const std::string oldFeed = client.curl.feedBase() + "/x";
+    ASSERT_EQ(client.curl.get(oldFeed, &client.reply), kOk);
+    ScriptedServer next;
+    const int requests = client.server.requests;
+    std::string nextUrl = next.url();
+    vantor_pim_sync_account_s change = client.record();
+    change.ctserver = nextUrl.data();
+    client.account.update(&change);
+    EXPECT_EQ(client.curl.insert(CtItemType::kContact, "<x/>", &client.reply), kOk);
+    EXPECT_EQ(client.curl.get(oldFeed, &client.reply), kFailed);
+    EXPECT_EQ(client.curl.get(client.curl.feedBase() + "/x", &client.reply), kOk);
+    EXPECT_EQ(client.server.requests, requests) << "nothing goes to the old server";
+    EXPECT_EQ(next.requests, 2);
+    (void)client.curl.getOrbit("p1", &client.reply);
+    EXPECT_EQ(next.requests, 3) << "people live at the account's server";
+    ASSERT_EQ(vconf_set_str("db/vantor-pim-sync/people_server", client.url.c_str()), 0);
+    (void)client.curl.getOrbit("p1", &client.reply);
+    EXPECT_EQ(client.server.requests, requests + 1) << "until a setting names another";
+    // Port and scheme are the account's as well.
+    std::string host = "127.0.0.1";
+    change.ctserver = host.data();
+    change.ctserverport = 8443;
+    change.ssl = true;
+    client.account.update(&change);
+    EXPECT_EQ(client.curl.feedBase(), "https://127.0.0.1:8443/m8/feeds");
 }
 
 TEST(CtCurl, PhotosAreStagedSafely) {

@@ -14,6 +14,16 @@ Json fieldsOf(const Json& atom) {
     return fields;
 }
 
+std::string encoded(const std::string& id) {
+    std::string text;
+    for (const unsigned char c : id) {
+        char code[8];
+        std::snprintf(code, sizeof code, std::isalnum(c) != 0 ? "%c" : "%%%02X", c);
+        text += code;
+    }
+    return text;
+}
+
 }  // namespace
 
 FeedServer::FeedServer() {
@@ -69,12 +79,12 @@ int FeedServer::takeWrites() {
 Json FeedServer::entry(const std::string& feed, const std::string& id) const {
     const std::string base = url() + kHost + feed + "/a%40x.com/";
     Json shown = mEntries.at(feed).at(id);
-    shown["id"] = {{"$t", base + "base/" + id}};
+    shown["id"] = {{"$t", base + "base/" + encoded(id)}};
     shown["updated"] = {{"$t", "2026-03-01T10:00:00.000Z"}};
-    shown["link"] = {{{"rel", "edit"}, {"href", base + "full/" + id}}};
+    shown["link"] = {{{"rel", "edit"}, {"href", base + "full/" + encoded(id)}}};
     if (mPhotos.contains(id) && feed == "contacts") {
         shown["link"].push_back({{"rel", "http://any/rel#photo"},
-                                 {"href", url() + kHost + "photos/media/a%40x.com/" + id},
+                                 {"href", url() + kHost + "photos/media/a%40x.com/" + encoded(id)},
                                  {"gd$etag", mPhotos.at(id).first}});
     }
     return shown;
@@ -99,9 +109,11 @@ void FeedServer::serveFeeds(const std::string& feed) {
         }
         const bool isEmpty = feed == "contacts" && start == 0 && emptyLists > 0;
         if (isEmpty) --emptyLists;
+        if (feed == "groups" && start == 0) mHidesGroup = hiddenLists-- > 0;
         Json shown = {{"entry", Json::array()}, {"link", Json::array()}};
         size_t at = 0;
         for (const auto& [id, fields] : mEntries[feed]) {
+            if (feed == "groups" && mHidesGroup && id == hiddenGroup) continue;
             if (at >= start && at < start + page && !isEmpty) shown["entry"].push_back(entry(feed, id));
             ++at;
         }
@@ -153,11 +165,16 @@ void FeedServer::serveFeeds(const std::string& feed) {
 void FeedServer::servePeople() {
     mServer.Get("/orbit/v1/people/p1", [this](const httplib::Request& request, httplib::Response& response) {
         const bool isOpen = request.has_param("key") && !request.has_header("Authorization");
-        response.status = isOpen ? 200 : 400;
-        const Json profile = {{"givenName", "Public"}, {"image", {{"url", url() + "/img/p1?sz=50"}}}};
+        const std::lock_guard lock(mMutex);
+        response.status = isOpen ? profileStatus : 400;
+        const Json profile = {{"givenName", "Public"},
+                              {"birthday", "1985-03-07"},
+                              {"image", {{"url", url() + "/img/p1?sz=50"}}}};
         response.set_content(profile.dump(), "application/json");
     });
-    mServer.Get("/img/p1", [](const httplib::Request& request, httplib::Response& response) {
+    mServer.Get("/img/p1", [this](const httplib::Request& request, httplib::Response& response) {
+        const std::lock_guard lock(mMutex);
+        response.status = profileImageStatus;
         response.set_content("profile image " + request.get_param_value("sz"), "image/jpeg");
     });
 }

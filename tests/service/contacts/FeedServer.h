@@ -1,4 +1,5 @@
-// FeedServer: a contacts service in a test: entries by id, pages of two, etags that are checked. Not strict about content.
+// FeedServer: a contacts service in a test: entries by id, pages of two, etags that are checked. In hrefs ids are
+// percent-encoded. Not strict about content.
 #pragma once
 
 #include <httplib.h>
@@ -27,10 +28,14 @@ public:
     [[nodiscard]] int takeWrites();
 
     // Faults, read under the lock.
-    int failNextWrites = 0;  // answered with 500 although they were carried out
-    int emptyLists = 0;      // so many requests for the first page of the contacts list nothing
+    int failNextWrites = 0;   // answered with 500 although they were carried out
+    int emptyLists = 0;       // so many requests for the first page of the contacts list nothing
+    std::string hiddenGroup;  // left out of so many lists:
+    int hiddenLists = 0;
     bool endsEarly = false;  // the second page is an error
     int photoStatus = 200;
+    int profileStatus = 200;
+    int profileImageStatus = 200;
 
 private:
     void serveFeeds(const std::string& feed);
@@ -45,6 +50,7 @@ private:
     std::map<std::string, std::pair<std::string, std::string>> mPhotos;  // etag and bytes
     int mRevision = 0;
     int mWrites = 0;
+    bool mHidesGroup = false;  // in the list that is being read
     httplib::Server mServer;
     int mPort = 0;
     std::thread mThread;

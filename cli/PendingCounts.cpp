@@ -64,7 +64,9 @@ constexpr Source kCalendarSources[] = {
 constexpr Source kContactsSources[] = {
     {kContactsFeed, kContactsStore, _contacts_contact_updated_info,
      "SELECT addressbook_id, contact_last_sync_version FROM address_book WHERE account_id=?1",
-     "SELECT contact_id, version, dirty, deleted FROM contact_sync_table WHERE addressbook_id=?1"},
+     "SELECT contact_id, version, (dirty<>0 OR image_dirty<>0) AND deleted=0, deleted FROM "
+     "contact_sync_table "
+     "WHERE addressbook_id=?1"},
     {kContactsFeed, kContactsStore, _contacts_group_updated_info,
      "SELECT addressbook_id, group_last_sync_version FROM address_book WHERE account_id=?1",
      "SELECT group_id, version, dirty, deleted FROM group_sync_table WHERE addressbook_id=?1"},

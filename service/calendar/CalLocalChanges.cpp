@@ -198,6 +198,11 @@ private:
     std::map<std::pair<int, std::string>, CalEventMetaData> mInstances;  // by series and recurrence id
 };
 
+bool areOwn(const std::vector<LocalChange>& changes) {
+    return std::all_of(changes.begin(), changes.end(),
+                       [](const LocalChange& change) { return change.ownWrite(); });
+}
+
 }  // namespace
 
 bool CalManager::setChanged(int calendarId) {
@@ -207,9 +212,19 @@ bool CalManager::setChanged(int calendarId) {
     (void)store->books().getVersion(calendarId, &since);
     std::vector<LocalChange> changes;
     int current = 0;
-    if (readChanges(mKind, calendarId, since, &changes, &current) != kOk) return false;
-    return std::any_of(changes.begin(), changes.end(),
-                       [](const LocalChange& change) { return !change.ownWrite(); });
+    return readChanges(mKind, calendarId, since, &changes, &current) == kOk && !areOwn(changes);
+}
+
+int CalManager::passOwnWrites(int calendarId) {
+    CalItemStore* store = prepared();
+    int since = 0;
+    std::vector<LocalChange> changes;
+    int current = 0;
+    if (store == nullptr || store->books().getVersion(calendarId, &since) != kOk ||
+        readChanges(mKind, calendarId, since, &changes, &current) != kOk) {
+        return kFailed;
+    }
+    return changes.empty() || !areOwn(changes) ? kOk : store->books().updateVersion(calendarId, current);
 }
 
 int CalManager::setBookChanged(int calendarId) {

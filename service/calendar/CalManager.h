@@ -44,6 +44,9 @@ public:
     [[nodiscard]] bool setChanged(int calendarId);
     // Brings the dirty and deleted marks of a book, or of all books of an account, up to date.
     [[nodiscard]] int setBookChanged(int calendarId);
+    // After a run: moves past its own writes, so that no later look goes through them again. A user's change among them stops it: that
+    // one is left for whoever is told of it.
+    [[nodiscard]] int passOwnWrites(int calendarId);
     [[nodiscard]] int setAccountChanged(int accountId);
     // Marks that wait, or changes not examined yet.
     [[nodiscard]] bool hasSomethingToSend(int accountId);

@@ -289,6 +289,5 @@ int CalUploader::writeBack() {
         SYNC_ERR("get svc fail");
         return kFailed;
     }
-    // Our own writes need not be walked again.
-    return mSide.manager().setBookChanged(mBook.calendar_id);
+    return mSide.manager().passOwnWrites(mBook.calendar_id);
 }

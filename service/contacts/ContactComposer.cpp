@@ -29,7 +29,7 @@ std::string onWire(const CtTypeTable& types, const char* word) {
 std::pair<std::string, std::string> typeOf(const CtSection& section, contacts_record_h child) {
     const CtTypeTable& types = *section.types;
     const int code = intOf(child, section.typeProperty);
-    const std::string label = textOf(child, section.labelProperty);
+    const std::string label = ctXmlText(textOf(child, section.labelProperty));
     // Of relations, 1 is a word and, with a label, a custom one.
     const bool isNamedByLabel = !label.empty() && (code == 0 || code == 1);
     if (const char* word = contact_types::wordOf(types.rows, code); word != nullptr && !isNamedByLabel)
@@ -69,6 +69,15 @@ std::vector<contacts_record_h> recordsOf(const CtSection& section, contacts_reco
             std::erase(records, birthday);
     }
     return records;
+}
+
+// Memberships whose group the device did not have when it took the contact: which ones they are, nobody knows any more.
+int countUnknownGroups(contacts_record_h contact) {
+    int count = 0;
+    forEachChild(contact, CONTACTS_CONTACT_GROUP_RELATIONS, [&count](contacts_record_h relation) {
+        count += intOf(relation, CONTACTS_GROUP_RELATION_GROUP_ID) == 0 ? 1 : 0;
+    });
+    return count;
 }
 
 bool isSectionMember(const std::string& name) {
@@ -140,7 +149,8 @@ std::string ContactComposer::fieldValue(const CtField& field, contacts_record_h 
         const std::string uri = mUriOf(intOf(child, field.property));
         return uri.empty() ? uri : CtIdUtil::makeGroupBaseHref(mFeedBase, uri);
     }
-    return textOf(child, field.property);
+    // What the wire cannot carry is no content.
+    return ctXmlText(textOf(child, field.property));
 }
 
 void ContactComposer::composeField(const CtField& field, contacts_record_h child, Composed* out) const {
@@ -204,8 +214,12 @@ std::vector<CtXmlElement> ContactComposer::composeSection(const CtSection& secti
             elements.push_back(std::move(composed.element));
         }
     }
+    const bool areMemberships = &section == &ct_mappings::kMembership;
+    int unknownGroups = areMemberships ? countUnknownGroups(contact) : 0;
     for (Original& original : originals) {
-        if (!original.isShown) elements.push_back(std::move(original.verbatim));
+        const bool isUnknownGroup = areMemberships && original.isShown && !original.isUsed &&
+                                    (!original.composed.hasContent || unknownGroups-- > 0);
+        if (!original.isShown || isUnknownGroup) elements.push_back(std::move(original.verbatim));
     }
     return elements;
 }
@@ -221,7 +235,8 @@ std::string ContactComposer::compose(contacts_record_h contact, const std::strin
             entry.children.push_back(std::move(element));
         if (section == &ct_mappings::kUserDefined) carryOverExtensions(origin, &entry);
     }
-    if (!id.empty()) entry.children.push_back({.name = "id", .text = id});
+    // A new entry gets an id of its own.
+    if (!id.empty() && !etag.empty()) entry.children.push_back({.name = "id", .text = id});
     std::string text;
     entry.write(&text);
     return text;

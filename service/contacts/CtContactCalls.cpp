@@ -201,6 +201,13 @@ int CtDataManager::markGroupChanged(int addressBookId) {
     return isDBPrepared() ? ct_changes::mark<CtGroupKind>(*mpMetaData, addressBookId) : kFailed;
 }
 
+int CtDataManager::passOwnWrites(int addressBookId) {
+    if (!isDBPrepared()) return kFailed;
+    const int contacts = ct_changes::passOwn<CtContactKind>(*mpMetaData, addressBookId);
+    const int groups = ct_changes::passOwn<CtGroupKind>(*mpMetaData, addressBookId);
+    return contacts == kOk ? groups : contacts;
+}
+
 bool CtDataManager::setContactChanged(int addressBookId) {
     return isDBPrepared() && ct_changes::some<CtContactKind>(*mpMetaData, addressBookId);
 }

@@ -102,6 +102,8 @@ public:
     // --- local changes
     [[nodiscard]] int markContactChanged(int addressBookId);
     [[nodiscard]] int markGroupChanged(int addressBookId);
+    // After a run, of contacts and groups: a user's change made meanwhile is left for the callback that tells of it.
+    [[nodiscard]] int passOwnWrites(int addressBookId);
     // Whether there is a change that is not the sync's own.
     [[nodiscard]] bool setContactChanged(int addressBookId);
     [[nodiscard]] bool setGroupChanged(int addressBookId);

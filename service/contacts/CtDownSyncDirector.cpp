@@ -137,7 +137,7 @@ int CtDownSyncDirector::syncContacts(Feed feed) {
         fetch,
         [&](CtContactPage& page) {
             listing.take(&page);
-            CtContactBatch batch = planContacts(page, snapshot, composer, &sent);
+            CtContactBatch batch = planContacts(page, snapshot, groups, composer, &sent);
             if (const int photos = fetchPhotos(&batch, groups); photos != kOk) return photos;
             if (writeBatch(&batch, feed, &inserted, &updated) != kOk) written = kFailed;
             return kOk;
@@ -205,6 +205,11 @@ int CtDownSyncDirector::fetchPhotos(CtContactBatch* batch, const CtGroupMap& gro
 // the image in it: without an etag the row counts as changed.
 int CtDownSyncDirector::fetchPhoto(BulkItem& item) {
     const ContactInfo& entry = *item.entry;
+    if (item.row.image_dirty != 0) {  // the device's image has not been sent yet, and wins
+        item.keepsImage = true;
+        if (!fetchProfile(item, /*wantsImage=*/false)) item.row.etag.clear();
+        return kOk;
+    }
     const bool hasPhoto = !entry.photoEtag.empty();
     const bool hadPhoto = !hasPhoto && !std::exchange(item.row.photo_etag, std::string()).empty();
     const bool isComplete = fetchProfile(item, /*wantsImage=*/!hasPhoto && !item.keepsImage);

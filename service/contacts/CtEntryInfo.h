@@ -22,8 +22,9 @@ struct CtEntryInfo {
 
 struct ContactInfo : CtEntryInfo {
     std::string photoHref;
-    std::string photoEtag;              // empty: the contact has no photo
-    std::vector<std::string> websites;  // hrefs, of which one may be a profile
+    std::string photoEtag;               // empty: the contact has no photo
+    std::vector<std::string> websites;   // hrefs, of which one may be a profile
+    std::vector<std::string> groupUris;  // of its memberships
 };
 
 struct GroupInfo : CtEntryInfo {

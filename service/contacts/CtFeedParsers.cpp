@@ -38,6 +38,9 @@ void readKind(JsonObject* entry, ContactInfo* info) {
     (void)photoLinkOf(entry, &info->photoHref, &info->photoEtag);
     forEachElement(entry, "gContact$website",
                    [info](JsonObject* website) { info->websites.push_back(textOr(website, "href", "")); });
+    forEachElement(entry, "gContact$groupMembershipInfo", [info](JsonObject* membership) {
+        info->groupUris.push_back(CtIdUtil::idAfterBase(textOr(membership, "href", "")));
+    });
 }
 
 void readKind(JsonObject* entry, GroupInfo* info) {

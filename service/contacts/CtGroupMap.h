@@ -26,6 +26,14 @@ public:
         const auto found = mIds.find(uri);
         return found != mIds.end() ? found->second : 0;
     }
+    // Of those that the device has.
+    [[nodiscard]] std::vector<int> idsOf(const std::vector<std::string>& uris) const {
+        std::vector<int> ids;
+        for (const std::string& uri : uris) {
+            if (const int id = idOf(uri); id != 0) ids.push_back(id);
+        }
+        return ids;
+    }
     [[nodiscard]] std::string uriOf(int groupId) const {
         const auto found = mUris.find(groupId);
         return found != mUris.end() ? found->second : std::string();

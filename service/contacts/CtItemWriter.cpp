@@ -21,12 +21,16 @@ int lastChangeVersion() {
     return contacts_db_get_last_change_version(&version) == PLATFORM_ERROR_NONE ? version : 0;
 }
 
+// The image on the device, which a write without it would take away.
 std::string imageOf(int contactId) {
     ContactsList list;
     contacts_record_h record = nullptr;
     const int code = contacts_read::readPart(_contacts_contact, CONTACTS_CONTACT_ID, contactId,
                                              {CONTACTS_CONTACT_IMAGES}, &list, &record);
-    return code == PLATFORM_ERROR_NONE ? ct_record::imageOf(record) : std::string();
+    if (code == PLATFORM_ERROR_NONE) return ct_record::imageOf(record);
+    if (code == PLATFORM_ERROR_NOT_FOUND) return {};
+    SYNC_ERR("get fail %d", code);
+    throw JsonException("get fail");
 }
 
 void setImage(contacts_record_h contact, const std::string& path) {
@@ -187,21 +191,18 @@ int CtItemWriter::writeGroupRecord(CtGroupItem& item, bool* isWritten) const {
          contacts_record_set_str(raw, CONTACTS_GROUP_SYSTEM_ID, systemId.get()) != PLATFORM_ERROR_NONE)) {
         return kFailed;
     }
-    std::vector<size_t> skipped;
     const int expected[] = {item.expectedVersion};
     const bool isNew = item.row.group_id == 0;
     record_write_options_s options{.by_sync = true};
-    if (!isNew) {
-        options.expected_versions = expected;
-        options.skipped = &skipped;
-    }
+    if (!isNew) options.expected_versions = expected;
     const int code = isNew ? contacts_db_insert_record(raw, &item.row.group_id, options)
                            : contacts_db_replace_record(raw, item.row.group_id, options);
-    if (code != PLATFORM_ERROR_NONE) {
+    *isWritten = code == PLATFORM_ERROR_NONE;
+    const bool isLeft = code == PLATFORM_ERROR_CONFLICT || code == PLATFORM_ERROR_NOT_FOUND;
+    if (!*isWritten && (isNew || !isLeft)) {
         SYNC_ERR("%s", isNew ? "insert records fail" : "replace records fail");
         return kFailed;
     }
-    *isWritten = skipped.empty();
     item.row.version = lastChangeVersion();
     return kOk;
 }

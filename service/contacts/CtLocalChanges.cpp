@@ -37,6 +37,17 @@ int logged(int result, const char* failureText) {
     return result;
 }
 
+// The feed tells of every image since the last walk, also of one that the sync wrote after it: what the row knows is older than that.
+bool hasNewImage(const CtLocalChange& change, int knownVersion) {
+    if (change.imageChanged == 0) return false;
+    ContactsList list;
+    contacts_record_h contact = nullptr;
+    const int code = contacts_read::readPart(_contacts_contact, CONTACTS_CONTACT_ID, change.itemId,
+                                             {CONTACTS_CONTACT_IMAGE_VERSION}, &list, &contact);
+    return code != PLATFORM_ERROR_NONE ||
+           contacts_read::intOf(contact, CONTACTS_CONTACT_IMAGE_VERSION) > knownVersion;
+}
+
 template <class Kind>
 int markOne(CtMetaDataDBHelper& store, int addressBookId, const CtLocalChange& change,
             typename Kind::Row* known) {
@@ -47,8 +58,8 @@ int markOne(CtMetaDataDBHelper& store, int addressBookId, const CtLocalChange& c
     }
     if (known != nullptr) {
         known->dirty = 1;
+        Kind::noteImage(known, hasNewImage(change, known->version));
         known->version = change.version;
-        Kind::noteImage(known, change.imageChanged != 0);
         return logged(Kind::update(store, *known), "MetaDB update dirty fail");
     }
     // A record of the sync that has no row is taken over by the next download, as changed.
@@ -88,26 +99,43 @@ int read(int addressBookId, int since, std::vector<CtLocalChange>* changes, int*
     return isReadable ? kOk : kFailed;
 }
 
+namespace {
+
+// The changes since the version that is stored for the address book.
+template <class Kind>
+int readNew(CtMetaDataDBHelper& store, int addressBookId, std::vector<CtLocalChange>* changes, int* current) {
+    int since = 0;
+    if (Kind::getLatest(store, addressBookId, &since) != kOk) return kFailed;
+    return read<Kind>(addressBookId, since, changes, current);
+}
+
+bool areOwn(const std::vector<CtLocalChange>& changes) {
+    return std::all_of(changes.begin(), changes.end(),
+                       [](const CtLocalChange& change) { return change.isOwnWrite(); });
+}
+
+}  // namespace
+
 template <class Kind>
 bool some(CtMetaDataDBHelper& store, int addressBookId) {
-    int since = 0;
     int current = 0;
     std::vector<CtLocalChange> changes;
-    if (Kind::getLatest(store, addressBookId, &since) != kOk ||
-        read<Kind>(addressBookId, since, &changes, &current) != kOk)
-        return false;
-    return std::any_of(changes.begin(), changes.end(),
-                       [](const CtLocalChange& change) { return !change.isOwnWrite(); });
+    return readNew<Kind>(store, addressBookId, &changes, &current) == kOk && !areOwn(changes);
+}
+
+template <class Kind>
+int passOwn(CtMetaDataDBHelper& store, int addressBookId) {
+    int current = 0;
+    std::vector<CtLocalChange> changes;
+    if (readNew<Kind>(store, addressBookId, &changes, &current) != kOk) return kFailed;
+    return changes.empty() || !areOwn(changes) ? kOk : Kind::updateLatest(store, addressBookId, current);
 }
 
 template <class Kind>
 int mark(CtMetaDataDBHelper& store, int addressBookId) {
-    int since = 0;
     int current = 0;
     std::vector<CtLocalChange> changes;
-    if (Kind::getLatest(store, addressBookId, &since) != kOk ||
-        read<Kind>(addressBookId, since, &changes, &current) != kOk)
-        return kFailed;
+    if (readNew<Kind>(store, addressBookId, &changes, &current) != kOk) return kFailed;
     if (changes.empty()) return kOk;
     std::erase_if(changes, [](const CtLocalChange& change) { return change.isOwnWrite(); });
     std::vector<typename Kind::Row> rows;
@@ -131,6 +159,8 @@ template int read<CtContactKind>(int, int, std::vector<CtLocalChange>*, int*);
 template int read<CtGroupKind>(int, int, std::vector<CtLocalChange>*, int*);
 template bool some<CtContactKind>(CtMetaDataDBHelper&, int);
 template bool some<CtGroupKind>(CtMetaDataDBHelper&, int);
+template int passOwn<CtContactKind>(CtMetaDataDBHelper&, int);
+template int passOwn<CtGroupKind>(CtMetaDataDBHelper&, int);
 template int mark<CtContactKind>(CtMetaDataDBHelper&, int);
 template int mark<CtGroupKind>(CtMetaDataDBHelper&, int);
 

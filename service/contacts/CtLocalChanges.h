@@ -32,4 +32,9 @@ template <class Kind>
 template <class Kind>
 [[nodiscard]] int mark(CtMetaDataDBHelper& store, int addressBookId);
 
+// After a run: moves past its own writes, so that no later look goes through them again. A user's change among them stops it: that one
+// is left for whoever is told of it.
+template <class Kind>
+[[nodiscard]] int passOwn(CtMetaDataDBHelper& store, int addressBookId);
+
 }  // namespace ct_changes

@@ -333,12 +333,18 @@ int CtMetaDataDBHelper::forgetGroup(int groupId) {
 }
 
 int CtMetaDataDBHelper::countPending(int accountId, int* dirty, int* deleted) {
+    struct Source {
+        const char* table;
+        const char* isDirty;
+    };
+    constexpr Source kSources[] = {{"contact_sync_table", "(A.dirty=1 OR A.image_dirty=1)"},
+                                   {"group_sync_table", "A.dirty=1"}};
     int sums[2] = {};
-    for (const char* table : {"contact_sync_table", "group_sync_table"}) {
+    for (const Source& source : kSources) {
         const int result = mDatabase.readRow(
-            std::string("SELECT count(CASE WHEN A.dirty=1 AND A.deleted<>1 THEN 1 END), count(CASE WHEN "
-                        "A.deleted=1 THEN 1 END) FROM ") +
-                table +
+            std::string("SELECT count(CASE WHEN ") + source.isDirty +
+                " AND A.deleted<>1 THEN 1 END), count(CASE WHEN A.deleted=1 THEN 1 END) FROM " +
+                source.table +
                 " as A INNER JOIN address_book B ON A.addressbook_id = B.addressbook_id where B.account_id "
                 "=?",
             {accountId}, [&sums](const Row& row) {

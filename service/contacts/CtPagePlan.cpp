@@ -111,7 +111,8 @@ CtSentRows<CtGroupKind> readSentGroups(const CtSnapshot<CtGroupKind>& snapshot) 
 }
 
 CtContactBatch planContacts(const CtContactPage& page, const CtSnapshot<CtContactKind>& snapshot,
-                            const ContactComposer& composer, CtSentRows<CtContactKind>* sent) {
+                            const CtGroupMap& groups, const ContactComposer& composer,
+                            CtSentRows<CtContactKind>* sent) {
     CtContactBatch batch;
     for (const std::shared_ptr<ContactInfo>& entry : page.entries) {
         const std::string says = sent->empty() ? std::string() : composer.composeFields(entry->object());
@@ -122,23 +123,28 @@ CtContactBatch planContacts(const CtContactPage& page, const CtSnapshot<CtContac
             batch.rows.push_back({finding.row, rowWrite});
             continue;
         }
-        const bool misses = !entry->photoEtag.empty() && entry->photoEtag != finding.row.photo_etag;
-        if (standing == Standing::kUnchanged && (!misses || snapshot.hasLocalChange(finding.row))) continue;
+        const bool missesPhoto = !entry->photoEtag.empty() && entry->photoEtag != finding.row.photo_etag &&
+                                 finding.row.image_dirty == 0;
+        const bool missesGroup = standing == Standing::kUnchanged &&
+                                 snapshot.missesGroup(finding.row, groups.idsOf(entry->groupUris));
+        if (standing == Standing::kUnchanged &&
+            ((!missesPhoto && !missesGroup) || snapshot.hasLocalChange(finding.row)))
+            continue;
         BulkItem item;
         item.entry = entry;
         item.row = finding.row;
         item.rowWrite = rowWrite;
         item.expectedVersion = finding.version;
-        item.isForPhoto = standing == Standing::kUnchanged;
+        item.isForPhoto = standing == Standing::kUnchanged && !missesGroup;
         if (standing == Standing::kLost) {
             item.lostId = std::exchange(item.row.contact_id, 0);
             item.row.photo_etag.clear();
             item.expectedVersion = kAnyVersion;
         } else if (standing == Standing::kSent) {
             // Its image, if there is one, has not been sent yet.
-            item.row.dirty = item.row.image_dirty;
-            item.keepsImage = true;
+            item.row.dirty = 0;
         }
+        item.keepsImage = standing == Standing::kSent;
         const bool isNew = item.row.contact_id == 0;
         (isNew ? batch.inserts : batch.updates).push_back(std::move(item));
     }

@@ -5,7 +5,8 @@
 //   listed          sent, no answer  says the same         update, and the row takes id and etag
 //   listed          none             own, untouched        update
 //   listed          none             own, user edited it   the row is taken over as dirty: the device's change wins
-//   etag equal      any              any                   nothing, but for a photo that is still missing; a lost record is made again
+//   etag equal      any              any                   nothing, but for a photo or a membership that is still missing; a lost
+//                                                          record is made again
 //   etag differs    clean            as the sync left it   update
 //   etag differs    dirty or deleted, or a change not examined   the row takes the etag: the device's change wins
 #pragma once
@@ -28,7 +29,7 @@ using CtSentRows = std::unordered_multimap<std::string, typename Kind::Row>;
 
 // Rows that are recognised are taken out of `sent`.
 [[nodiscard]] CtContactBatch planContacts(const CtContactPage& page,
-                                          const CtSnapshot<CtContactKind>& snapshot,
+                                          const CtSnapshot<CtContactKind>& snapshot, const CtGroupMap& groups,
                                           const ContactComposer& composer, CtSentRows<CtContactKind>* sent);
 [[nodiscard]] std::vector<CtGroupItem> planGroups(const CtGroupPage& page,
                                                   const CtSnapshot<CtGroupKind>& snapshot,

@@ -1,5 +1,7 @@
 #include "contacts/CtSnapshot.h"
 
+#include <algorithm>
+
 #include "common/JsonAccess.h"
 #include "common/JsonText.h"
 #include "common/SyncLog.h"
@@ -28,6 +30,26 @@ void readServerId(CtGroupKind /*kind*/, contacts_record_h record, std::string* u
     *uri = textOf(record, CONTACTS_GROUP_SYNC_DATA1);
 }
 
+std::vector<unsigned> stateProperties(CtContactKind /*kind*/) {
+    return {CONTACTS_CONTACT_ID, CONTACTS_CONTACT_VERSION, CONTACTS_CONTACT_SYNCED_VERSION,
+            CONTACTS_CONTACT_GROUP_RELATIONS};
+}
+std::vector<unsigned> stateProperties(CtGroupKind /*kind*/) {
+    return {CONTACTS_GROUP_ID, CONTACTS_GROUP_VERSION, CONTACTS_GROUP_SYNCED_VERSION};
+}
+
+std::vector<int> groupsOf(CtContactKind /*kind*/, contacts_record_h contact) {
+    std::vector<int> groups;
+    contacts_read::forEachChild(contact, CONTACTS_CONTACT_GROUP_RELATIONS,
+                                [&groups](contacts_record_h relation) {
+                                    groups.push_back(intOf(relation, CONTACTS_GROUP_RELATION_GROUP_ID));
+                                });
+    return groups;
+}
+std::vector<int> groupsOf(CtGroupKind /*kind*/, contacts_record_h /*group*/) {
+    return {};
+}
+
 }  // namespace
 
 template <class Kind>
@@ -44,13 +66,14 @@ int CtSnapshot<Kind>::load(CtMetaDataDBHelper& store, int addressBookId) {
 
 template <class Kind>
 int CtSnapshot<Kind>::readStates() {
-    constexpr unsigned kProperties[] = {Kind::kIdProperty, Kind::kVersionProperty, Kind::kSyncedProperty};
+    const std::vector<unsigned> properties = stateProperties(Kind());
     contacts_query_h rawQuery = nullptr;
     if (contacts_query_create(Kind::kView, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
     const ContactsQuery query(rawQuery);
     contacts_list_h rawList = nullptr;
     if (contacts_query_add_filter_int(rawQuery, Kind::kBookProperty, mAddressBookId) != PLATFORM_ERROR_NONE ||
-        contacts_query_set_projection(rawQuery, kProperties, std::size(kProperties)) != PLATFORM_ERROR_NONE ||
+        contacts_query_set_projection(rawQuery, properties.data(), properties.size()) !=
+            PLATFORM_ERROR_NONE ||
         contacts_db_get_records_with_query(rawQuery, 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("get_records_with_query fail");
         return kFailed;
@@ -58,7 +81,8 @@ int CtSnapshot<Kind>::readStates() {
     const ContactsList list(rawList);
     contacts_read::forEach(rawList, [this](contacts_record_h record) {
         mRecords[intOf(record, Kind::kIdProperty)] = {.version = intOf(record, Kind::kVersionProperty),
-                                                      .syncedVersion = intOf(record, Kind::kSyncedProperty)};
+                                                      .syncedVersion = intOf(record, Kind::kSyncedProperty),
+                                                      .groups = groupsOf(Kind(), record)};
     });
     return kOk;
 }
@@ -120,6 +144,14 @@ const CtOrphan* CtSnapshot<Kind>::orphan(const std::string& uri) const {
 template <class Kind>
 bool CtSnapshot<Kind>::isLost(const Row& row) const {
     return record(row.*Kind::kId) == nullptr && row.deleted == 0 && !mDeletedByUser.contains(row.*Kind::kId);
+}
+
+template <class Kind>
+bool CtSnapshot<Kind>::missesGroup(const Row& row, const std::vector<int>& groups) const {
+    const CtRecordState* state = record(row.*Kind::kId);
+    return state != nullptr && std::any_of(groups.begin(), groups.end(), [state](int group) {
+               return std::find(state->groups.begin(), state->groups.end(), group) == state->groups.end();
+           });
 }
 
 template <class Kind>

@@ -11,8 +11,9 @@
 #include "contacts/CtItemKind.h"
 
 struct CtRecordState {
-    int version = 0;        // of its last write
-    int syncedVersion = 0;  // of the sync's own last write, 0 when it never wrote it
+    int version = 0;               // of its last write
+    int syncedVersion = 0;         // of the sync's own last write, 0 when it never wrote it
+    std::vector<int> groups = {};  // of a contact, those that the device has
 
     [[nodiscard]] bool isEnginesOwnWrite() const { return syncedVersion != 0 && syncedVersion == version; }
 };
@@ -39,6 +40,8 @@ public:
 
     // Whether the row's record is gone although nobody deleted it: the next download makes it again.
     [[nodiscard]] bool isLost(const Row& row) const;
+    // Whether the device's contact is not in a group that the entry names and the device has: the group came later, or came again.
+    [[nodiscard]] bool missesGroup(const Row& row, const std::vector<int>& groups) const;
     // Whether the device's record holds a change that has not been sent: a mark, or a version that nobody but a user wrote.
     [[nodiscard]] bool hasLocalChange(const Row& row) const;
 

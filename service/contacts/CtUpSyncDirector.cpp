@@ -51,8 +51,5 @@ int CtUpSyncDirector::run() {
     mFailure = uploader.failure();
     if (uploader.sent() == 0) return result;
     SYNC_INFO("contacts: %d changes sent", uploader.sent());
-    // What the records learned is examined now, so that no later look goes through it again.
-    const bool isExamined =
-        manager.markContactChanged(addressBookId) == kOk && manager.markGroupChanged(addressBookId) == kOk;
-    return isExamined || result != kOk ? result : kFailed;
+    return manager.passOwnWrites(addressBookId) == kOk || result != kOk ? result : kFailed;
 }

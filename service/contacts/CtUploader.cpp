@@ -32,6 +32,13 @@ void forgetPhoto(CtContactSyncRow* row) {
 }
 void forgetPhoto(CtGroupSyncRow* /*row*/) {}
 
+void clearMarks(CtContactSyncRow* row) {
+    row->deleted = row->dirty = row->image_dirty = 0;
+}
+void clearMarks(CtGroupSyncRow* row) {
+    row->deleted = row->dirty = 0;
+}
+
 // Whether nobody but the server may delete the item. The record that said so is gone.
 bool isOfServer(const CtContactSyncRow& /*row*/) {
     return false;
@@ -44,11 +51,7 @@ bool isOfServer(const CtGroupSyncRow& row) {
 }  // namespace
 
 CtUploader::CtUploader(CtMetaDataDBHelper* store, int addressBookId, CtCurl* curl, IStopQuery* stopQuery)
-    : mpStore(store),
-      mAddressBookId(addressBookId),
-      mTask(curl),
-      mFeedBase(curl->feedBase()),
-      mpStopQuery(stopQuery) {}
+    : mpStore(store), mAddressBookId(addressBookId), mTask(curl), mpCurl(curl), mpStopQuery(stopQuery) {}
 
 int CtUploader::run() {
     std::vector<CtGroupSyncRow> groups;
@@ -61,16 +64,16 @@ int CtUploader::run() {
         if (!isOver() && row.dirty != 0 && row.deleted == 0) sendGroup(row);
     }
     // After the groups, so that memberships name those that were just made.
-    CtGroupMap map;
-    if (map.load(*mpStore, mAddressBookId) != kOk ||
+    if (mGroups.load(*mpStore, mAddressBookId) != kOk ||
         mpStore->getAllContacts(mAddressBookId, &contacts) != kOk ||
         markAsSent<CtContactKind>(&contacts) != kOk) {
         mFailure = kStoreFails;
         return kFailed;
     }
-    const ContactComposer composer = map.composer(mFeedBase);
+    mpComposer = std::make_unique<ContactComposer>(mGroups.composer(mpCurl->feedBase()));
     for (CtContactSyncRow& row : contacts) {
-        if (!isOver() && row.dirty != 0 && row.deleted == 0) sendContact(row, composer);
+        const bool waits = row.dirty != 0 || row.image_dirty != 0;
+        if (!isOver() && waits && row.deleted == 0) sendContact(row);
     }
     for (CtContactSyncRow& row : contacts) {
         if (!isOver() && row.deleted != 0) sendDeleted<CtContactKind>(CtItemType::kContact, row);
@@ -78,8 +81,8 @@ int CtUploader::run() {
     for (CtGroupSyncRow& row : groups) {
         if (!isOver() && row.deleted != 0) sendDeleted<CtGroupKind>(CtItemType::kGroup, row);
     }
-    if ((writeBack<CtGroupKind>(mSentGroups) != kOk || writeBack<CtContactKind>(mSentContacts) != kOk) &&
-        mResult == kOk) {
+    const bool groupsLearned = writeBack<CtGroupKind>(mSentGroups) == kOk;
+    if ((writeBack<CtContactKind>(mSentContacts) != kOk || !groupsLearned) && mResult == kOk) {
         mResult = kFailed;
         mFailure = kStoreFails;
     }
@@ -133,12 +136,23 @@ void CtUploader::renew(typename Kind::Row& row) {
     if (Kind::update(*mpStore, row) != kOk) mIsOver = true;
 }
 
+ContactsRecord CtUploader::readRecord(const char* view, int id) {
+    contacts_record_h raw = nullptr;
+    const int code = contacts_db_get_record(view, id, &raw);
+    // One that was just deleted is met as a deletion by the next look at the device's changes.
+    if (code == PLATFORM_ERROR_NONE || code == PLATFORM_ERROR_NOT_FOUND) return ContactsRecord(raw);
+    SYNC_ERR("get fail %d", code);
+    if (mResult == kOk) mResult = kFailed;
+    if (mFailure.empty()) mFailure = "the device's stores cannot be read";
+    return nullptr;
+}
+
 // --- groups
 
 void CtUploader::sendGroup(CtGroupSyncRow& row) {
-    contacts_record_h raw = nullptr;
-    if (contacts_db_get_record(_contacts_group, row.group_id, &raw) != PLATFORM_ERROR_NONE) return;
-    const ContactsRecord record(raw);
+    const ContactsRecord record = readRecord(_contacts_group, row.group_id);
+    contacts_record_h raw = record.get();
+    if (raw == nullptr) return;
     const int version = intOf(raw, CONTACTS_GROUP_VERSION);
     if (intOf(raw, CONTACTS_GROUP_IS_READ_ONLY) != 0) {
         SYNC_ERR("group(%s) belongs to the server, the device's change is not sent", row.uri.c_str());
@@ -179,26 +193,27 @@ void CtUploader::sendGroup(CtGroupSyncRow& row) {
 
 // --- contacts
 
-void CtUploader::sendContact(CtContactSyncRow& row, const ContactComposer& composer) {
-    contacts_record_h raw = nullptr;
-    if (contacts_db_get_record(_contacts_contact, row.contact_id, &raw) != PLATFORM_ERROR_NONE) return;
-    const ContactsRecord record(raw);
-    if (!sendFields(row, raw, composer) || mIsOver) return;
-    if (row.image_dirty != 0 && !sendPhoto(row, raw)) return;
-    row.dirty = row.image_dirty = 0;
+void CtUploader::sendContact(CtContactSyncRow& row) {
+    const ContactsRecord record = readRecord(_contacts_contact, row.contact_id);
+    if (record == nullptr) return;
+    if (row.dirty != 0 && (!sendFields(row, record.get()) || mIsOver)) return;
+    if (row.image_dirty != 0) {
+        if (!sendPhoto(row, record.get())) return;
+        row.image_dirty = 0;
+        store<CtContactKind>(row, {}, row.version);
+    }
     ++mSent;
-    store<CtContactKind>(row, {}, row.version);
 }
 
-bool CtUploader::sendFields(CtContactSyncRow& row, contacts_record_h record,
-                            const ContactComposer& composer) {
+bool CtUploader::sendFields(CtContactSyncRow& row, contacts_record_h record) {
     const int version = intOf(record, CONTACTS_CONTACT_VERSION);
     CtUpReply reply;
     if (!row.uri.empty()) {
-        reply = updateContact(row, record, composer);
+        reply = updateContact(row, record);
         if (reply.answer == CtAnswer::kGone) renew<CtContactKind>(row);
     }
-    if (row.uri.empty() && !mIsOver) reply = mTask.insert(CtItemType::kContact, composer.compose(record, {}));
+    if (row.uri.empty() && !mIsOver)
+        reply = mTask.insert(CtItemType::kContact, mpComposer->compose(record, {}));
     if (!reply.isAccepted()) {
         if (row.uri.empty() && reply.answer == CtAnswer::kRefused) {
             row.etag.clear();
@@ -207,15 +222,23 @@ bool CtUploader::sendFields(CtContactSyncRow& row, contacts_record_h record,
         fail("contact", row.contact_id, row.uri, reply);
         return false;
     }
-    // The marks stay until the photo is there too.
+    row.dirty = waitsForGroup(record) ? 1 : 0;
     store<CtContactKind>(row, reply, version);
     if (reply.meta.entry)
         mSentContacts.push_back({row.contact_id, version, json_text::textOf(reply.meta.entry.get())});
     return true;
 }
 
-CtUpReply CtUploader::updateContact(const CtContactSyncRow& row, contacts_record_h record,
-                                    const ContactComposer& composer) {
+bool CtUploader::waitsForGroup(contacts_record_h record) const {
+    bool waits = false;
+    forEachChild(record, CONTACTS_CONTACT_GROUP_RELATIONS, [&](contacts_record_h relation) {
+        const int id = intOf(relation, CONTACTS_GROUP_RELATION_GROUP_ID);
+        waits = waits || (id > 0 && mGroups.uriOf(id).empty());
+    });
+    return waits;
+}
+
+CtUpReply CtUploader::updateContact(const CtContactSyncRow& row, contacts_record_h record) {
     std::string etag = row.etag;
     std::string origin;
     CtUpReply reply;
@@ -227,12 +250,12 @@ CtUpReply CtUploader::updateContact(const CtContactSyncRow& row, contacts_record
             if (!reply.isAccepted()) return reply;
             etag = reply.meta.etag;
             origin = json_text::textOf(reply.meta.entry.get());
-            if (attempt > 0 && composer.composeFields(json_access::objectIn(reply.meta.entry.get())) !=
-                                   composer.composeFields(record)) {
+            if (attempt > 0 && mpComposer->composeFields(json_access::objectIn(reply.meta.entry.get())) !=
+                                   mpComposer->composeFields(record)) {
                 SYNC_ERR("contact(%s) was changed on both sides, the device's change wins", row.uri.c_str());
             }
         }
-        reply = mTask.update(CtItemType::kContact, row.uri, etag, composer.compose(record, etag, origin));
+        reply = mTask.update(CtItemType::kContact, row.uri, etag, mpComposer->compose(record, etag, origin));
         if (reply.answer != CtAnswer::kConflict) break;
     }
     return reply;
@@ -257,18 +280,27 @@ bool CtUploader::sendPhoto(CtContactSyncRow& row, contacts_record_h record) {
         fail("contact", row.contact_id, row.uri, reply);
         return false;
     }
-    if (!reply.meta.etag.empty()) {
-        row.photo_etag = reply.meta.photoEtag;
-        row.etag = reply.meta.etag;
-        const std::string text = json_text::textOf(reply.meta.entry.get());
-        if (!mSentContacts.empty() && mSentContacts.back().id == row.contact_id) {
-            mSentContacts.back().text = text;
-        } else {
-            mSentContacts.push_back({row.contact_id, row.version, text});
-        }
-    }
+    takePhotoReply(row, record, reply);
     if (path.empty()) row.photo_etag.clear();
     return true;
+}
+
+// The entry was read after the photo was taken. What somebody else changed meanwhile must come down: then the etag stays behind.
+void CtUploader::takePhotoReply(CtContactSyncRow& row, contacts_record_h record, const CtUpReply& reply) {
+    if (reply.meta.etag.empty()) return;
+    row.photo_etag = reply.meta.photoEtag;
+    JsonObject* entry = json_access::objectIn(reply.meta.entry.get());
+    if (mpComposer->composeFields(entry) != mpComposer->composeFields(record)) {
+        SYNC_INFO("contact(%s) is not what was sent, it is compared again", row.uri.c_str());
+        return;
+    }
+    row.etag = reply.meta.etag;
+    const std::string text = json_text::textOf(reply.meta.entry.get());
+    if (!mSentContacts.empty() && mSentContacts.back().id == row.contact_id) {
+        mSentContacts.back().text = text;
+    } else {
+        mSentContacts.push_back({row.contact_id, row.version, text});
+    }
 }
 
 // --- deletions
@@ -279,13 +311,16 @@ void CtUploader::sendDeleted(CtItemType type, typename Kind::Row& row) {
     if (row.uri.empty()) {
         if (row.etag == kCtUnconfirmedEtag)
             SYNC_ERR("%s(%d) was deleted before the server's answer to it was known", Kind::kName, id);
-        if (Kind::forget(*mpStore, id) != kOk) mIsOver = true;
+        if (Kind::forget(*mpStore, id) == kOk) return;
+        mIsOver = true;
+        mResult = kFailed;
+        if (mFailure.empty()) mFailure = kStoreFails;
         return;
     }
     if (isOfServer(row)) {
         SYNC_ERR("%s(%s) belongs to the server, the device's deletion is not sent", Kind::kName,
                  row.uri.c_str());
-        row.deleted = row.dirty = 0;
+        clearMarks(&row);
         return store<Kind>(row, {}, row.version);
     }
     CtUpReply reply;
@@ -301,7 +336,7 @@ void CtUploader::sendDeleted(CtItemType type, typename Kind::Row& row) {
     }
     if (!reply.isAccepted() && reply.answer != CtAnswer::kGone) return fail(Kind::kName, id, row.uri, reply);
     ++mSent;
-    row.deleted = row.dirty = 0;
+    clearMarks(&row);
     store<Kind>(row, {}, row.version);
 }
 
@@ -361,17 +396,18 @@ int CtUploader::writeBack(const std::vector<Sent>& sent) {
             const int code = contacts_read::readPart(Kind::kView, Kind::kIdProperty, item.id,
                                                      serverIdProperties(Kind()), &list, &record);
             if (code == PLATFORM_ERROR_NOT_FOUND) continue;
-            std::vector<size_t> skipped;
             const int expected[] = {item.version};
-            const record_write_options_s options{
-                .by_sync = true, .expected_versions = expected, .skipped = &skipped};
-            if (code != PLATFORM_ERROR_NONE || setServerId(Kind(), record, item.text) != kOk ||
-                contacts_db_update_record(record, options) != PLATFORM_ERROR_NONE) {
+            const record_write_options_s options{.by_sync = true, .expected_versions = expected};
+            if (code != PLATFORM_ERROR_NONE || setServerId(Kind(), record, item.text) != kOk) return kFailed;
+            const int written = contacts_db_update_record(record, options);
+            // What a user changed meanwhile is sent again and learns it then.
+            if (written == PLATFORM_ERROR_CONFLICT || written == PLATFORM_ERROR_NOT_FOUND) continue;
+            int version = 0;
+            if (written != PLATFORM_ERROR_NONE ||
+                contacts_db_get_last_change_version(&version) != PLATFORM_ERROR_NONE) {
                 return kFailed;
             }
-            int version = 0;
-            if (skipped.empty() && contacts_db_get_last_change_version(&version) == PLATFORM_ERROR_NONE)
-                versions.emplace_back(item.id, version);
+            versions.emplace_back(item.id, version);
         }
         if (!transaction.commit()) return kFailed;
     }

@@ -2,10 +2,11 @@
 // Owner: an upload run.   Threads: one worker.
 //
 // A mark is cleared when the server took the change, or no longer has what was to be deleted; whatever else happens it stays for the
-// next run. A new item is marked as sent before it goes out, in the store: should its answer be lost, the next run looks for it in
+// next run. A contact's fields and its photo have a mark each. A new item is marked as sent before it goes out, in the store: should its answer be lost, the next run looks for it in
 // the server's list before it is sent again.
 #pragma once
 
+#include <memory>
 #include <string>
 #include <utility>
 #include <vector>
@@ -50,20 +51,25 @@ private:
     template <class Kind>
     [[nodiscard]] int writeBack(const std::vector<Sent>& sent);
 
+    // NULL when the device has the record no more, or (then the run fails) it cannot be read.
+    [[nodiscard]] ContactsRecord readRecord(const char* view, int id);
     void sendGroup(CtGroupSyncRow& row);
-    void sendContact(CtContactSyncRow& row, const ContactComposer& composer);
+    void sendContact(CtContactSyncRow& row);
     // Takes the entry into `row`; false when the contact's fields were not taken.
-    [[nodiscard]] bool sendFields(CtContactSyncRow& row, contacts_record_h record,
-                                  const ContactComposer& composer);
-    [[nodiscard]] CtUpReply updateContact(const CtContactSyncRow& row, contacts_record_h record,
-                                          const ContactComposer& composer);
+    [[nodiscard]] bool sendFields(CtContactSyncRow& row, contacts_record_h record);
+    [[nodiscard]] CtUpReply updateContact(const CtContactSyncRow& row, contacts_record_h record);
     [[nodiscard]] bool sendPhoto(CtContactSyncRow& row, contacts_record_h record);
+    void takePhotoReply(CtContactSyncRow& row, contacts_record_h record, const CtUpReply& reply);
+    // Whether the contact is in a group that the server does not have yet.
+    [[nodiscard]] bool waitsForGroup(contacts_record_h record) const;
 
     CtMetaDataDBHelper* const mpStore;
     const int mAddressBookId;
     CtUpSyncTask mTask;
-    const std::string mFeedBase;
+    CtCurl* const mpCurl;
     IStopQuery* const mpStopQuery;
+    CtGroupMap mGroups;
+    std::unique_ptr<ContactComposer> mpComposer;  // once the groups are sent
 
     std::vector<Sent> mSentContacts;
     std::vector<Sent> mSentGroups;

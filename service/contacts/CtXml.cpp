@@ -89,21 +89,32 @@ bool readObject(JsonObject* object, CtXmlElement* out, int depth) {
 
 }  // namespace
 
-std::string ctXmlEscape(std::string_view text) {
+std::string ctXmlText(std::string_view text) {
     const GChars valid(g_utf8_make_valid(text.data(), static_cast<gssize>(text.size())));
     const std::string_view input = valid.get();
-    std::string escaped;
-    escaped.reserve(input.size());
+    std::string carried;
+    carried.reserve(input.size());
     for (size_t i = 0; i < input.size(); ++i) {
         const char c = input[i];
+        const bool isSpace = c == '\t' || c == '\n' || c == '\r';
+        if (static_cast<unsigned char>(c) < ' ' && !isSpace) continue;
+        if (input.substr(i, 2) == "\xEF\xBF" && (input[i + 2] == '\xBE' || input[i + 2] == '\xBF')) {
+            i += 2;  // U+FFFE and U+FFFF
+        } else {
+            carried += c;
+        }
+    }
+    return carried;
+}
+
+std::string ctXmlEscape(std::string_view text) {
+    std::string escaped;
+    escaped.reserve(text.size());
+    for (const char c : ctXmlText(text)) {
         const auto* const escape = std::find_if(std::begin(kEscapes), std::end(kEscapes),
                                                 [c](const Escape& row) { return row.character == c; });
         if (escape != std::end(kEscapes)) {
             escaped += escape->text;
-        } else if (static_cast<unsigned char>(c) < ' ') {
-            continue;
-        } else if (input.substr(i, 2) == "\xEF\xBF" && (input[i + 2] == '\xBE' || input[i + 2] == '\xBF')) {
-            i += 2;  // U+FFFE and U+FFFF
         } else {
             escaped += c;
         }

@@ -9,7 +9,9 @@
 #include <utility>
 #include <vector>
 
-// Text for XML 1.0: escaped, without what no escape can carry.
+// The part of a text that XML 1.0 can carry, as valid UTF-8.
+std::string ctXmlText(std::string_view text);
+// Such text, escaped.
 std::string ctXmlEscape(std::string_view text);
 
 struct CtXmlElement {

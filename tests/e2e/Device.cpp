@@ -40,9 +40,8 @@ void Device::setClient(const std::string& id, const std::string& secret) {
 
 CommandResult Device::addAccount(int id, const std::string& email, const std::string& server,
                                  const std::string& refreshToken, const std::vector<std::string>& more) {
-    std::vector<std::string> arguments = {
-        "account",  "add",  "--id",          std::to_string(id),     "--email", email,
-        "--server", server, "--no-contacts", "--refresh-token-file", "-"};
+    std::vector<std::string> arguments = {"account", "add",      "--id", std::to_string(id),     "--email",
+                                          email,     "--server", server, "--refresh-token-file", "-"};
     arguments.insert(arguments.end(), more.begin(), more.end());
     return tool(arguments, refreshToken);
 }

@@ -28,7 +28,9 @@ public:
     void setClient(const std::string& id, const std::string& secret);
     CommandResult addAccount(int id, const std::string& email, const std::string& server,
                              const std::string& refreshToken, const std::vector<std::string>& more = {});
-    CommandResult sync(int account) { return tool({"sync", std::to_string(account), "calendar", "--wait"}); }
+    CommandResult sync(int account, const std::string& kind = "calendar") {
+        return tool({"sync", std::to_string(account), kind, "--wait"});
+    }
 
     [[nodiscard]] pid_t daemonPid();
     // All log lines of the daemon so far.

@@ -40,3 +40,16 @@ json Provider::admin(const std::string& method, const std::string& path, const j
     }
     return json::parse(result->body, nullptr, /*allow_exceptions=*/false);
 }
+
+std::string Provider::bytes(const std::string& path) {
+    httplib::Client client(mUrl);
+    const httplib::Result result = client.Get(path);
+    EXPECT_TRUE(result && result->status == 200) << path;
+    return result ? result->body : std::string();
+}
+
+void Provider::putBytes(const std::string& path, const std::string& content, const std::string& type) {
+    httplib::Client client(mUrl);
+    const httplib::Result result = client.Put(path, content, type);
+    EXPECT_TRUE(result && result->status < 300) << path;
+}

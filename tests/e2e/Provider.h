@@ -25,6 +25,11 @@ public:
     nlohmann::json admin(const std::string& method, const std::string& path,
                          const nlohmann::json& body = nullptr);
 
+    // The body of a GET; a failure fails the test.
+    std::string bytes(const std::string& path);
+    // Writes bytes with their content type.
+    void putBytes(const std::string& path, const std::string& content, const std::string& type);
+
     Process& process() { return *mProcess; }
 
 private:

@@ -1,11 +1,7 @@
 // Random edits on both sides with syncs in between: after each, both sides hold the same items, once each.
-// VPS_RANDOM_SEED replays a run, VPS_RANDOM_STEPS makes it longer.
-#include <gtest/gtest.h>
-
 #include <fstream>
-#include <random>
 
-#include "e2e/SyncPair.h"
+#include "e2e/RandomEdits.h"
 
 namespace {
 
@@ -13,14 +9,14 @@ constexpr int kSteps = 300;
 constexpr int kStepsBetweenSyncs = 10;
 constexpr int kAccounts = 2;
 
-unsigned fromEnvironment(const char* name, unsigned otherwise) {
-    const char* text = std::getenv(name);
-    return text != nullptr ? static_cast<unsigned>(std::strtoul(text, nullptr, 10)) : otherwise;
-}
-
 std::string day(int number) {
     return "2026-03-" + std::string(number < 10 ? "0" : "") + std::to_string(number);
 }
+
+// Of the provider's seed file, which must be there before the provider.
+struct SeedFolder {
+    TestRoot mFolder;
+};
 
 // Two accounts with a calendar and a task list each, and one calendar that both have.
 std::vector<std::string> smallSeed(const std::string& path) {
@@ -33,26 +29,28 @@ std::vector<std::string> smallSeed(const std::string& path) {
     return {"--seed", path};
 }
 
-class RandomEdits {
+class RandomCalendarEdits : private SeedFolder, private RandomEdits {
 public:
-    explicit RandomEdits(unsigned seed)
-        : mRandom(seed), mPair(kAccounts, smallSeed(mSeedFile.path() / "seed.json")) {}
+    explicit RandomCalendarEdits(unsigned seed)
+        : RandomEdits(seed, kAccounts, smallSeed(mFolder.path() / "seed.json"), "calendar") {}
+
+    using RandomEdits::tellWhatHappened;
 
     void step(int number) {
         mName = "step " + std::to_string(number);
-        static constexpr void (RandomEdits::*kEdits[])() = {
-            &RandomEdits::addOnDevice,      &RandomEdits::editOnDevice,       &RandomEdits::editOnDevice,
-            &RandomEdits::deleteOnDevice,   &RandomEdits::instanceOnDevice,   &RandomEdits::taskOnDevice,
-            &RandomEdits::addOnProvider,    &RandomEdits::editOnProvider,     &RandomEdits::editOnProvider,
-            &RandomEdits::deleteOnProvider, &RandomEdits::instanceOnProvider, &RandomEdits::taskOnProvider};
+        static constexpr void (RandomCalendarEdits::*kEdits[])() = {
+            &RandomCalendarEdits::addOnDevice,        &RandomCalendarEdits::editOnDevice,
+            &RandomCalendarEdits::editOnDevice,       &RandomCalendarEdits::deleteOnDevice,
+            &RandomCalendarEdits::instanceOnDevice,   &RandomCalendarEdits::taskOnDevice,
+            &RandomCalendarEdits::addOnProvider,      &RandomCalendarEdits::editOnProvider,
+            &RandomCalendarEdits::editOnProvider,     &RandomCalendarEdits::deleteOnProvider,
+            &RandomCalendarEdits::instanceOnProvider, &RandomCalendarEdits::taskOnProvider};
         (this->*kEdits[below(std::size(kEdits))])();
     }
 
     // What one account sends to the shared calendar comes down with the next sync of the other.
     void syncAndCompare() {
-        for (const int account : {1, 2, 1, 2}) {
-            ASSERT_EQ(mPair.device.sync(account).status, 0) << mPair.device.daemonLog();
-        }
+        syncAll({1, 2, 1, 2});
         for (int account = 1; account <= kAccounts; ++account) mPair.expectSame(account);
     }
     void expectQuiet() {
@@ -60,20 +58,6 @@ public:
     }
 
 private:
-    size_t below(size_t limit) { return std::uniform_int_distribution<size_t>(0, limit - 1)(mRandom); }
-    bool chance() { return below(2) == 0; }
-    template <class List>
-    const typename List::value_type* pick(const List& list) {
-        return list.empty() ? nullptr : &list[below(list.size())];
-    }
-    void run(std::vector<std::string> arguments, const std::string& input = "") {
-        // An item may have gone since it was listed: the daemon works all the time.
-        const CommandResult result = mPair.device.tool(std::move(arguments), input);
-        EXPECT_TRUE(result.status == 0 || result.error.find("there is no") != std::string::npos ||
-                    result.error.find("is cancelled") != std::string::npos)
-            << result.error;
-    }
-
     // --- the device
     std::string pickBook(const char* kind) {
         std::vector<Json> books = mPair.device.json({"calendars", "list"});
@@ -204,25 +188,10 @@ private:
                                  {{"notes", mName}, {"status", chance() ? "completed" : "needsAction"}});
         }
     }
-
-    std::mt19937 mRandom;
-    TestRoot mSeedFile;
-    SyncPair mPair;
-    std::string mName;
 };
 
 }  // namespace
 
 TEST(RandomSync, BothSidesHoldTheSameAfterEverySync) {
-    const unsigned seed = fromEnvironment("VPS_RANDOM_SEED", 20261125);
-    const auto steps = static_cast<int>(fromEnvironment("VPS_RANDOM_STEPS", kSteps));
-    SCOPED_TRACE("VPS_RANDOM_SEED=" + std::to_string(seed));
-    RandomEdits edits(seed);
-    for (int step = 1; step <= steps && !testing::Test::HasFailure(); ++step) {
-        SCOPED_TRACE("step " + std::to_string(step));
-        edits.step(step);
-        if (step % kStepsBetweenSyncs == 0) edits.syncAndCompare();
-    }
-    edits.syncAndCompare();
-    edits.expectQuiet();
+    runRandomEdits<RandomCalendarEdits>(20261125, kSteps, kStepsBetweenSyncs);
 }

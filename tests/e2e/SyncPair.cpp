@@ -19,7 +19,8 @@ std::map<std::string, std::string> storeContents(const TestRoot& root) {
     std::map<std::string, std::string> contents;
     for (const char* file :
          {"/opt/usr/data/records/calendar.db", "/opt/usr/dbspace/.vantor_pim_sync_calendar.db",
-          "/opt/usr/dbspace/.vantor_pim_sync_todo.db"}) {
+          "/opt/usr/dbspace/.vantor_pim_sync_todo.db", "/opt/usr/data/records/contacts.db",
+          "/opt/usr/dbspace/.vantor_pim_sync_contacts.db"}) {
         std::ifstream stream(root.at(file), std::ios::binary);
         std::stringstream text;
         text << stream.rdbuf();
@@ -30,13 +31,14 @@ std::map<std::string, std::string> storeContents(const TestRoot& root) {
 
 }  // namespace
 
-SyncPair::SyncPair(int accounts, const std::vector<std::string>& providerArguments)
-    : provider(providerArguments) {
+SyncPair::SyncPair(int accounts, const std::vector<std::string>& providerArguments, const std::string& kind)
+    : provider(providerArguments), mKind(kind) {
+    const std::string without = kind == "calendar" ? "--no-contacts" : "--no-calendar";
     device.setClient(provider.clientId(), provider.clientSecret());
     for (int id = 1; id <= accounts; ++id) {
         const Provider::Account& account = provider.accounts().at(static_cast<size_t>(id - 1));
         const CommandResult added =
-            device.addAccount(id, account.email, provider.url(), account.refreshToken);
+            device.addAccount(id, account.email, provider.url(), account.refreshToken, {without});
         EXPECT_EQ(added.status, 0) << added.error;
     }
 }
@@ -137,7 +139,7 @@ void SyncPair::expectSameTasks(int account, const Json& books) {
 void SyncPair::expectQuiet(int account) {
     const auto before = storeContents(device.root());
     provider.admin("DELETE", "/requests");
-    EXPECT_EQ(device.sync(account).status, 0);
+    EXPECT_EQ(sync(account).status, 0);
     const auto after = storeContents(device.root());
     for (const auto& [file, content] : before)
         EXPECT_TRUE(after.at(file) == content) << file << " has changed";

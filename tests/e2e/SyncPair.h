@@ -12,12 +12,19 @@
 
 class SyncPair {
 public:
-    // Adds accounts 1..accounts of the provider, in its order.
+    // Adds accounts 1..accounts of the provider, in its order; only this kind of them is kept in step.
     explicit SyncPair(int accounts = 1,
-                      const std::vector<std::string>& providerArguments = {"--seed", "sample"});
+                      const std::vector<std::string>& providerArguments = {"--seed", "sample"},
+                      const std::string& kind = "calendar");
+
+    CommandResult sync(int account) { return device.sync(account, mKind); }
 
     // Fails the test unless the account's calendars, events, task lists and tasks are the same on both sides, once each.
     void expectSame(int account);
+    // Likewise its groups, contacts, memberships and photos. Groups are told apart by name.
+    void expectSameContacts(int account);
+    // Takes away the contact of the sample that gets fields from a profile, which the feed does not show.
+    void removeProfileLinks();
     // Fails the test unless another sync sends no write and changes no store.
     void expectQuiet(int account);
 
@@ -27,6 +34,10 @@ public:
     [[nodiscard]] std::vector<Json> wireTasks(int account, const std::string& listId);
     // "/accounts/EMAIL/tasklists/ID/tasks", for the admin services.
     [[nodiscard]] std::string tasksPath(int account, const std::string& listId);
+    [[nodiscard]] std::vector<Json> wireContacts(int account);
+    [[nodiscard]] std::vector<Json> wireGroups(int account);
+    // "/accounts/EMAIL/contacts" or ".../groups", for the admin services.
+    [[nodiscard]] std::string peoplePath(int account, const char* kind);
     // The device's calendar, or task list, with this name.
     [[nodiscard]] int localCalendar(int account, const std::string& name);
     [[nodiscard]] std::string firstCalendar(int account) { return wireCalendars(account).at(0)["id"]; }
@@ -44,6 +55,8 @@ public:
 private:
     void expectSameEvents(const Json& book, const Json& calendar);
     void expectSameTasks(int account, const Json& books);
+
+    const std::string mKind;
 };
 
 // A calendar's id inside an admin path.

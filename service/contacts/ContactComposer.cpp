@@ -71,13 +71,9 @@ std::vector<contacts_record_h> recordsOf(const CtSection& section, contacts_reco
     return records;
 }
 
-// Memberships whose group the device did not have when it took the contact: which ones they are, nobody knows any more.
-int countUnknownGroups(contacts_record_h contact) {
-    int count = 0;
-    forEachChild(contact, CONTACTS_CONTACT_GROUP_RELATIONS, [&count](contacts_record_h relation) {
-        count += intOf(relation, CONTACTS_GROUP_RELATION_GROUP_ID) == 0 ? 1 : 0;
-    });
-    return count;
+// A membership whose group the device did not have when it took the contact: which one it is, nobody knows any more.
+bool isOfUnknownGroup(const CtSection& section, contacts_record_h child) {
+    return &section == &ct_mappings::kMembership && intOf(child, CONTACTS_GROUP_RELATION_GROUP_ID) == 0;
 }
 
 bool isSectionMember(const std::string& name) {
@@ -202,6 +198,7 @@ std::vector<CtXmlElement> ContactComposer::composeSection(const CtSection& secti
                                                           JsonObject* origin) const {
     std::vector<Original> originals = readOriginals(section, origin);
     std::vector<CtXmlElement> elements;
+    int unknownGroups = 0;
     for (const contacts_record_h child : recordsOf(section, contact)) {
         Composed composed = composeElement(section, child);
         const auto same = std::find_if(originals.begin(), originals.end(), [&](const Original& original) {
@@ -212,14 +209,13 @@ std::vector<CtXmlElement> ContactComposer::composeSection(const CtSection& secti
             elements.push_back(std::move(same->verbatim));
         } else if (composed.hasContent) {
             elements.push_back(std::move(composed.element));
+        } else if (isOfUnknownGroup(section, child)) {
+            ++unknownGroups;  // the group came later: it is one of those that no record stands for
         }
     }
-    const bool areMemberships = &section == &ct_mappings::kMembership;
-    int unknownGroups = areMemberships ? countUnknownGroups(contact) : 0;
     for (Original& original : originals) {
-        const bool isUnknownGroup = areMemberships && original.isShown && !original.isUsed &&
-                                    (!original.composed.hasContent || unknownGroups-- > 0);
-        if (!original.isShown || isUnknownGroup) elements.push_back(std::move(original.verbatim));
+        const bool isKept = !original.isShown || (!original.isUsed && unknownGroups-- > 0);
+        if (isKept) elements.push_back(std::move(original.verbatim));
     }
     return elements;
 }
@@ -231,7 +227,9 @@ std::string ContactComposer::compose(contacts_record_h contact, const std::strin
     CtXmlElement entry = makeAtomEntry(ct_wire::kContactTerm, etag, /*withContactNamespace=*/true);
     const std::string id = json_access::textOr(json_access::object(origin, "id"), "$t", "");
     for (const CtSection* section : ct_mappings::kWriteOrder) {
-        for (CtXmlElement& element : composeSection(*section, contact, origin))
+        // A new entry is in the groups that the device knows: of others nobody can say that they are still there.
+        const bool isFresh = etag.empty() && section == &ct_mappings::kMembership;
+        for (CtXmlElement& element : composeSection(*section, contact, isFresh ? nullptr : origin))
             entry.children.push_back(std::move(element));
         if (section == &ct_mappings::kUserDefined) carryOverExtensions(origin, &entry);
     }

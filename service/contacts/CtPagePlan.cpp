@@ -123,19 +123,19 @@ CtContactBatch planContacts(const CtContactPage& page, const CtSnapshot<CtContac
             batch.rows.push_back({finding.row, rowWrite});
             continue;
         }
-        const bool missesPhoto = !entry->photoEtag.empty() && entry->photoEtag != finding.row.photo_etag &&
-                                 finding.row.image_dirty == 0;
+        // Also one that was taken away while the device's own change was sent.
+        const bool isOtherPhoto = entry->photoEtag != finding.row.photo_etag && finding.row.image_dirty == 0;
         const bool missesGroup = standing == Standing::kUnchanged &&
                                  snapshot.missesGroup(finding.row, groups.idsOf(entry->groupUris));
         if (standing == Standing::kUnchanged &&
-            ((!missesPhoto && !missesGroup) || snapshot.hasLocalChange(finding.row)))
+            ((!isOtherPhoto && !missesGroup) || snapshot.hasLocalChange(finding.row)))
             continue;
         BulkItem item;
         item.entry = entry;
         item.row = finding.row;
         item.rowWrite = rowWrite;
         item.expectedVersion = finding.version;
-        item.isForPhoto = standing == Standing::kUnchanged && !missesGroup;
+        item.isForPhoto = standing == Standing::kUnchanged && !missesGroup && !entry->photoEtag.empty();
         if (standing == Standing::kLost) {
             item.lostId = std::exchange(item.row.contact_id, 0);
             item.row.photo_etag.clear();

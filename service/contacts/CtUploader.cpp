@@ -196,6 +196,8 @@ void CtUploader::sendGroup(CtGroupSyncRow& row) {
 void CtUploader::sendContact(CtContactSyncRow& row) {
     const ContactsRecord record = readRecord(_contacts_contact, row.contact_id);
     if (record == nullptr) return;
+    // The record may be younger than its mark: what is sent now, no later look will find.
+    if (intOf(record.get(), CONTACTS_CONTACT_IMAGE_VERSION) > row.version) row.image_dirty = 1;
     if (row.dirty != 0 && (!sendFields(row, record.get()) || mIsOver)) return;
     if (row.image_dirty != 0) {
         if (!sendPhoto(row, record.get())) return;

@@ -25,6 +25,9 @@ public:
     nlohmann::json admin(const std::string& method, const std::string& path,
                          const nlohmann::json& body = nullptr);
 
+    // The same for what may have gone meanwhile: `mayFail` says whether this answer is none of the test's business.
+    nlohmann::json attempt(const std::string& method, const std::string& path, const nlohmann::json& body,
+                           bool (*mayFail)(int status, const std::string& answer));
     // The body of a GET; a failure fails the test.
     std::string bytes(const std::string& path);
     // Writes bytes with their content type.

@@ -147,7 +147,7 @@ private:
                         {"gd$email", {{{"rel", std::string(kKind) + "home"}, {"address", "p@example.com"}}}},
                         {"gContact$groupMembershipInfo", someMemberships(account)}};
         if (chance()) contact["gContact$occupation"] = {{"$t", mName}};
-        mPair.provider.admin("POST", mPair.peoplePath(account, "contacts"), contact);
+        onProvider("POST", mPair.peoplePath(account, "contacts"), contact);
     }
     void editOnProvider() {
         const Target target = aContact();
@@ -162,22 +162,22 @@ private:
         const Target target = aContact();
         if (target.path.empty()) return;
         if (chance()) {
+            note("provider", "photo of " + target.path);
             mPair.provider.putBytes("/admin" + target.path + "/photo", "\x89PNG\r\n\x1a\n server " + mName,
                                     "image/png");
-        } else if (mPair.provider.admin("GET", target.path).value("photo", "") != "") {
-            mPair.provider.admin("DELETE", target.path + "/photo");
+        } else {
+            onProvider("DELETE", target.path + "/photo");
         }
     }
     void memberOnProvider() {
         const Target target = aContact();
         if (!target.path.empty())
-            mPair.provider.admin("PATCH", target.path,
-                                 {{"gContact$groupMembershipInfo", someMemberships(target.account)}});
+            onProvider("PATCH", target.path,
+                       {{"gContact$groupMembershipInfo", someMemberships(target.account)}});
     }
     void deleteOnProvider() {
         const Target target = aContact();
-        if (!target.path.empty())
-            mPair.provider.admin("DELETE", target.path + (chance() ? "?deleted=listed" : ""));
+        if (!target.path.empty()) onProvider("DELETE", target.path + (chance() ? "?deleted=listed" : ""));
     }
     void groupOnProvider() {
         const int account = anAccount();
@@ -186,12 +186,11 @@ private:
         std::erase_if(groups, [](const Json& group) { return group.contains("gContact$systemGroup"); });
         const Json* group = pick(groups);
         if (group == nullptr || below(3) == 0) {
-            mPair.provider.admin("POST", path, {{"title", {{"$t", mName}}}});
+            onProvider("POST", path, {{"title", {{"$t", mName}}}});
         } else if (chance()) {
-            mPair.provider.admin("DELETE", path + "/" + (*group)["id"].get<std::string>());
+            onProvider("DELETE", path + "/" + (*group)["id"].get<std::string>());
         } else {
-            mPair.provider.admin("PATCH", path + "/" + (*group)["id"].get<std::string>(),
-                                 {{"title", {{"$t", mName}}}});
+            onProvider("PATCH", path + "/" + (*group)["id"].get<std::string>(), {{"title", {{"$t", mName}}}});
         }
     }
 

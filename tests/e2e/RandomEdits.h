@@ -5,6 +5,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <ctime>
 #include <random>
 
 #include "e2e/SyncPair.h"
@@ -15,7 +16,7 @@ public:
                 const std::string& kind)
         : mRandom(seed), mPair(accounts, providerArguments, kind) {}
 
-    void tellWhatHappened() { ADD_FAILURE() << mPair.device.daemonLog(); }
+    void tellWhatHappened() { ADD_FAILURE() << mHistory << mPair.device.daemonLog(); }
 
 protected:
     size_t below(size_t limit) { return std::uniform_int_distribution<size_t>(0, limit - 1)(mRandom); }
@@ -26,10 +27,23 @@ protected:
     }
     void run(std::vector<std::string> arguments, const std::string& input = "") {
         // An item may have gone since it was listed: the daemon works all the time.
+        note("device", Json(arguments).dump() + " " + input);
         const CommandResult result = mPair.device.tool(std::move(arguments), input);
         EXPECT_TRUE(result.status == 0 || result.error.find("there is no") != std::string::npos ||
                     result.error.find("is cancelled") != std::string::npos)
             << result.error;
+    }
+    Json onProvider(const std::string& method, const std::string& path, const Json& body = nullptr) {
+        note("provider", method + " " + path + " " + body.dump());
+        // Likewise an item of the provider, or a group that it names.
+        return mPair.provider.attempt(method, path, body, [](int status, const std::string& answer) {
+            return status == 404 || status == 410 ||
+                   (status == 400 && answer.find("group") != std::string::npos);
+        });
+    }
+    // What was done, for people who look at a failure.
+    void note(const char* side, const std::string& what) {
+        mHistory += std::to_string(time(nullptr) % 3600) + " " + mName + ", " + side + ": " + what + "\n";
     }
     void syncAll(std::initializer_list<int> accounts) {
         for (const int account : accounts)
@@ -39,6 +53,7 @@ protected:
     std::mt19937 mRandom;
     SyncPair mPair;
     std::string mName;
+    std::string mHistory;
 };
 
 inline unsigned fromEnvironment(const char* name, unsigned otherwise) {

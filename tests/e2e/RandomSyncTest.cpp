@@ -135,7 +135,7 @@ private:
                       {"start", {{"dateTime", date + "T09:00:00Z"}}},
                       {"end", {{"dateTime", date + "T09:45:00Z"}}}};
         if (chance()) event["recurrence"] = {"RRULE:FREQ=DAILY;COUNT=9"};
-        mPair.provider.admin("POST", eventsPath(), event);
+        onProvider("POST", eventsPath(), event);
     }
     // A random event of the calendar, never a cancelled instance; empty when there is none.
     std::string pickEvent(const std::string& path, bool isSeries) {
@@ -150,19 +150,19 @@ private:
         const std::string path = eventsPath();
         const std::string id = pickEvent(path, false);
         if (id.empty()) return;
-        mPair.provider.admin("PATCH", path + "/" + id,
-                             chance() ? Json({{"summary", mName}}) : Json({{"location", mName}}));
+        onProvider("PATCH", path + "/" + id,
+                   chance() ? Json({{"summary", mName}}) : Json({{"location", mName}}));
     }
     void deleteOnProvider() {
         const std::string path = eventsPath();
-        if (const std::string id = pickEvent(path, false); !id.empty())
-            mPair.provider.admin("DELETE", path + "/" + id);
+        if (const std::string id = pickEvent(path, false); !id.empty()) onProvider("DELETE", path + "/" + id);
     }
     void instanceOnProvider() {
         const std::string path = eventsPath();
         const std::string id = pickEvent(path, true);
         if (id.empty()) return;
-        const Json series = mPair.provider.admin("GET", path + "/" + id);
+        const Json series = onProvider("GET", path + "/" + id);
+        if (series.is_null()) return;
         const int first = std::stoi(series["start"]["dateTime"].get<std::string>().substr(8, 2));
         std::string instance = day(first + static_cast<int>(below(9)));
         std::erase(instance, '-');
@@ -171,8 +171,7 @@ private:
         for (const Json& event : events) {
             if (event["id"] == id + "_" + instance + "T090000Z" && event["status"] == "cancelled") return;
         }
-        chance() ? mPair.provider.admin("DELETE", target)
-                 : mPair.provider.admin("PATCH", target, {{"summary", mName}});
+        chance() ? onProvider("DELETE", target) : onProvider("PATCH", target, {{"summary", mName}});
     }
     void taskOnProvider() {
         const int account = static_cast<int>(below(kAccounts)) + 1;
@@ -180,12 +179,12 @@ private:
         const std::vector<Json> tasks = mPair.provider.admin("GET", path)["items"];
         const Json* task = pick(tasks);
         if (task == nullptr || below(3) == 0) {
-            mPair.provider.admin("POST", path, {{"title", mName}, {"due", "2026-05-01T00:00:00Z"}});
+            onProvider("POST", path, {{"title", mName}, {"due", "2026-05-01T00:00:00Z"}});
         } else if (chance()) {
-            mPair.provider.admin("DELETE", path + "/" + (*task)["id"].get<std::string>());
+            onProvider("DELETE", path + "/" + (*task)["id"].get<std::string>());
         } else {
-            mPair.provider.admin("PATCH", path + "/" + (*task)["id"].get<std::string>(),
-                                 {{"notes", mName}, {"status", chance() ? "completed" : "needsAction"}});
+            onProvider("PATCH", path + "/" + (*task)["id"].get<std::string>(),
+                       {{"notes", mName}, {"status", chance() ? "completed" : "needsAction"}});
         }
     }
 };

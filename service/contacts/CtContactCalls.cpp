@@ -133,7 +133,8 @@ int CtDataManager::getContactData(const std::string& uri, const std::string& fee
 int CtDataManager::updateContactEtag(const std::string& uri, const std::string& etag) {
     CtContactSyncRow row;
     if (!isDBPrepared()) return kFailed;
-    if (mpMetaData->getContact(uri, &row) != kOk || mpMetaData->getContact(row.contact_id, &row) != kOk) {
+    if (mpMetaData->getContact(uri, &row) != kOk ||
+        mpMetaData->getStoredContact(row.contact_id, &row) != kOk) {
         SYNC_ERR("get fail");
         return kFailed;
     }

@@ -248,7 +248,7 @@ int CtDataManager::updateGroupEtag(int groupId, const std::string& etag) {
 int CtDataManager::updateGroupUri(int groupId, const std::string& uri, const std::string& etag) {
     if (!isDBPrepared()) return kFailed;
     CtGroupSyncRow row;
-    if (mpMetaData->getGroup(groupId, &row) != kOk) {
+    if (mpMetaData->getStoredGroup(groupId, &row) != kOk) {
         SYNC_ERR("get fail");
         return kFailed;
     }

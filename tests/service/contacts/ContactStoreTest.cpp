@@ -218,6 +218,25 @@ TEST_F(ContactStore, AChangeThatCannotBeMarkedIsSeenAgain) {
     EXPECT_EQ(row("c1").dirty + row("c2").dirty + row("c3").deleted, 3);
 }
 
+TEST_F(ContactStore, ANewEtagLeavesTheRestOfTheRow) {
+    const char* const time = "2026-03-01T10:00:00.000Z";
+    std::vector<BulkItem> page = items({contact("c1", "e1", "Ada")});
+    page[0].row.photo_etag = "p";
+    ASSERT_EQ(mManager.insertContacts(kAccount, &page), kOk);
+    ASSERT_EQ(mManager.insertGroup(kAccount, "Friends", "e1", time, "g1", "{}", "", false), kOk);
+    int group = 0;
+    ASSERT_EQ(mManager.getGroupId("g1", mBook, &group), kOk);
+    ASSERT_EQ(mManager.updateContactEtag("c1", "e2"), kOk);
+    ASSERT_EQ(mManager.updateGroupEtag(group, "e2"), kOk);
+    std::vector<CtContactSyncRow> contacts;
+    std::vector<CtGroupSyncRow> groups;
+    ASSERT_EQ(mManager.metaData()->getAllContacts(mBook, &contacts), kOk);
+    ASSERT_EQ(mManager.metaData()->getAllGroups(mBook, &groups), kOk);
+    EXPECT_EQ(contacts.at(0).etag + contacts.at(0).photo_etag + contacts.at(0).updated,
+              std::string("e2p") + time);
+    EXPECT_EQ(groups.at(0).etag + groups.at(0).uri + groups.at(0).updated, std::string("e2g1") + time);
+}
+
 TEST_F(ContactStore, AContactChangedMeanwhileIsNotOverwritten) {
     std::vector<BulkItem> page = items({contact("c1", "e1", "Ada"), contact("c2", "e1", "Bob")});
     ASSERT_EQ(mManager.insertContacts(kAccount, &page), kOk);

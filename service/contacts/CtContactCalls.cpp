@@ -160,7 +160,7 @@ int CtDataManager::updateContactUriEtag(int contactId, const std::string& uri, c
 }
 
 int CtDataManager::getContactUri(int contactId, std::string* uri) {
-    return forward("get fail", &CtMetaDataDBHelper::getContactUri, contactId, uri);
+    return forwardById(&CtMetaDataDBHelper::getContactUri, contactId, uri);
 }
 
 int CtDataManager::getContactId(const std::string& uri, int* contactId) {

@@ -90,7 +90,7 @@ static void take(const Row& row, CtContactSyncRow* contact) {
     }
 }
 
-CtMetaDataDBHelper::CtMetaDataDBHelper() : mDatabase(kPath, kSchema, "Database is not opened") {}
+CtMetaDataDBHelper::CtMetaDataDBHelper() : mDatabase(kPath, kSchema, "Database is not opened", "contact") {}
 
 // --- groups
 

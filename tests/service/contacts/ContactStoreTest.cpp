@@ -11,6 +11,8 @@
 #include "contacts/CtSnapshot.h"
 #include "platform/contacts_read.h"
 #include "service/contacts/AtomReader.h"
+#include "support/FullDisk.h"
+#include "support/LogCapture.h"
 #include "support/TestRoot.h"
 
 using contacts_read::intOf;
@@ -317,4 +319,30 @@ TEST_F(ContactStore, WhatFeedsAndRepliesSay) {
     EXPECT_EQ(meta.id + meta.etag + meta.photoEtag + meta.editId, "c4epc4");
     for (const Json& bad : {withoutEtag, withoutId, contact("c", "e", "x", {{"link", {{{"href", "h"}}}}})})
         EXPECT_EQ(CtEntryMetaDataParser::getMetaData(Json{{"entry", bad}}.dump(), &meta), kFailed) << bad;
+}
+
+TEST_F(ContactStore, TheLogNamesWhatIsMissing) {
+    const LogCapture log;
+    std::string text;
+    int id = 0;
+    int version = 0;
+    EXPECT_EQ(mManager.getContactUri(91, &text), kFailed);
+    EXPECT_EQ(mManager.getGroupUri(92, &text), kFailed);
+    EXPECT_EQ(mManager.getGroupStarredInMerrow(93, &id), kFailed);
+    EXPECT_EQ(mManager.getGroupData(94, &text, &text, &version), kFailed);
+    for (const char* line : {"get fail 91", "get fail 92", "get fail 93", "get fail 94"})
+        EXPECT_EQ(log.count(line), 1) << line;
+    EXPECT_EQ(mManager.getContactId("nobody", &id), kFailed);
+    EXPECT_EQ(log.count("get fail\033"), 1);
+    ContactsRecord record;
+    EXPECT_EQ(mManager.parseJson2Record("[]", mBook, &record), kFailed);
+    EXPECT_EQ(log.count("* parsing error"), 1);
+}
+
+TEST(CtMetaDataDBHelper, AFileThatCannotBeMadeIsNamedInTheLog) {
+    const TestRoot root;
+    const LogCapture log;
+    const FullDisk disk;
+    EXPECT_NE(CtMetaDataDBHelper().openDb(), kOk);
+    EXPECT_EQ(log.count("remake contact DB file is Failed : "), 1);
 }

@@ -251,7 +251,7 @@ void CtDataManager::requestUploads(bool (CtDataManager::*isChanged)(int), bool u
         if (usesPending && mPending[addressBookId]) continue;
         if (!(this->*isChanged)(addressBookId)) continue;
         const bool isTaken =
-            SyncService::getInstance().startUpSync(accountId, VANTOR_PIM_SYNC_TYPE_CONTACTS) == kOk;
+            SyncService::getInstance().requestUpSync(accountId, VANTOR_PIM_SYNC_TYPE_CONTACTS);
         if (usesPending && isTaken) mPending[addressBookId] = true;
     }
 }

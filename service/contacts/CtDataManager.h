@@ -117,6 +117,8 @@ public:
     static void changedGroupCallback(const char* view, void* userData);
 
 private:
+    friend struct CtDataManagerProbe;  // lets a test see what is pending
+
     // Forwards to the store; a failure is logged as `failureText`.
     template <class... Params, class... Args>
     int forward(const char* failureText, int (CtMetaDataDBHelper::*call)(Params...), Args&&... args);
@@ -132,7 +134,7 @@ private:
     std::unique_ptr<CtMetaDataDBHelper> mpMetaData;
     std::mutex mPendingMutex;
     std::map<int, bool>
-        mPending;  // by address book: an upload was asked for and has not begun; guarded by mPendingMutex
+        mPending;  // by address book: an upload was begun or queued and has not looked yet; guarded by mPendingMutex
 };
 
 template <class... Params, class... Args>

@@ -22,7 +22,7 @@ void CtSyncAgent::countPending(int* dirty, int* deleted) {
         *dirty = *deleted = 0;
 }
 
-// An upload that was queued goes with the stop; the next change asks for another.
-void CtSyncAgent::onStopped() {
+// The next change asks for another upload.
+void CtSyncAgent::onRequestsDropped() {
     CtDataManager::getInstance().forgetPending(mpAccount->getAccountId());
 }

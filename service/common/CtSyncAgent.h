@@ -10,5 +10,5 @@ public:
 protected:
     [[nodiscard]] bool hasSomethingToSend() override;
     void countPending(int* dirty, int* deleted) override;
-    void onStopped() override;
+    void onRequestsDropped() override;
 };

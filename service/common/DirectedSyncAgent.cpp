@@ -3,6 +3,7 @@
 #include "common/SyncResult.h"
 
 using sync_result::kOk;
+using sync_result::kTokenFailed;
 
 DirectedSyncAgent::DirectedSyncAgent(Account* account, vantor_pim_sync_type_e type)
     : SyncAgent(account, type), mType(type), mpWorker(std::make_unique<SyncWorker>()) {}
@@ -17,7 +18,9 @@ void DirectedSyncAgent::setDirectors(std::unique_ptr<SyncDirector> down, std::un
 }
 
 int DirectedSyncAgent::doUpSync() {
-    return mpWorker->start(mpUpDirector.get(), this);
+    const int result = mpWorker->start(mpUpDirector.get(), this);
+    if (result != kOk) onRequestsDropped();
+    return result;
 }
 
 int DirectedSyncAgent::doDownSync() {
@@ -30,6 +33,7 @@ int DirectedSyncAgent::doStop() {
 
 void DirectedSyncAgent::onSyncCompleted(SyncDirector* director, int result) {
     noteHalf(isDown(director), result, director->lastFailure());
+    if (result == kTokenFailed) onRequestsDropped();
     // Reserved before the run is ended, so that both halves are one visible sync.
     if (isDown(director) && result == kOk && hasSomethingToSend()) (void)startUpSync();
     continueSync(result);
@@ -37,6 +41,6 @@ void DirectedSyncAgent::onSyncCompleted(SyncDirector* director, int result) {
 
 void DirectedSyncAgent::onSyncStopped(SyncDirector* director, int result) {
     noteHalf(isDown(director), result, director->lastFailure());
-    onStopped();
+    onRequestsDropped();
     continueSync(result);
 }

@@ -22,8 +22,8 @@ protected:
     // The derived constructor gives the directors, which ask the worker whether they are stopped.
     void setDirectors(std::unique_ptr<SyncDirector> down, std::unique_ptr<SyncDirector> up);
     [[nodiscard]] SyncWorker* worker() { return mpWorker.get(); }
-    // A run ended because it was told to stop.
-    virtual void onStopped() {}
+    // A run did not begin, was told to stop or lost its authorisation: an up sync that was asked for meanwhile may not come.
+    virtual void onRequestsDropped() {}
 
 private:
     void onSyncCompleted(SyncDirector* director, int result) override;

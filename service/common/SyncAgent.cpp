@@ -102,6 +102,11 @@ int SyncAgent::startUpSync() {
     return startUpSyncWithoutLock();
 }
 
+bool SyncAgent::requestUpSync() {
+    const AgentLock lock(&mMutex);
+    return startUpSyncWithoutLock() == kOk || mIsUpSyncReserved;
+}
+
 int SyncAgent::startUpSyncWithoutLock() {
     mIsUpSyncReserved = false;
     switch (mOperation) {

@@ -60,6 +60,8 @@ public:
     // All: 0, or -1 for refusal.
     [[nodiscard]] int startSync();
     [[nodiscard]] int startUpSync();
+    // The same for whoever need not ask twice: whether an up sync has begun or is queued behind what runs.
+    [[nodiscard]] bool requestUpSync();
     [[nodiscard]] int stopSync();
     [[nodiscard]] int stopSyncForRemoval();
     // State 3 becomes 1; what waits on the device is then sent.

@@ -85,8 +85,9 @@ bool SyncDatabase::Row::isNull(int column) const {
     return sqlite3_column_type(mpStatement, column) == SQLITE_NULL;
 }
 
-SyncDatabase::SyncDatabase(std::string path, std::span<const char* const> schema, const char* notOpenedText)
-    : mPath(std::move(path)), mSchema(schema), mNotOpenedText(notOpenedText) {}
+SyncDatabase::SyncDatabase(std::string path, std::span<const char* const> schema, const char* notOpenedText,
+                           const char* name)
+    : mPath(std::move(path)), mSchema(schema), mNotOpenedText(notOpenedText), mName(name) {}
 
 SyncDatabase::~SyncDatabase() {
     mStatements.clear();
@@ -128,7 +129,7 @@ int SyncDatabase::makeDb() {
     for (const char* text : mSchema) schema.append(text).append(";");
     schema += "COMMIT;";
     if (sqlite3_exec(database.get(), schema.c_str(), nullptr, nullptr, nullptr) != SQLITE_OK) {
-        SYNC_ERR("remake calendar DB file is Failed : %s", sqlite3_errmsg(database.get()));
+        SYNC_ERR("remake %s DB file is Failed : %s", mName, sqlite3_errmsg(database.get()));
         return kFailed;  // closing undoes what was begun
     }
     if (const int result = createWithMode(path); result != kOk) return result;

@@ -48,9 +48,9 @@ public:
     };
 
     // `path` is absolute, the root is applied here. The schema texts are executed one by one when the file is made.
-    // `notOpenedText` is what a read logs when the store cannot be opened.
+    // `notOpenedText` is what a read logs when the store cannot be opened; by `name` the log calls a file that cannot be made.
     SyncDatabase(std::string path, std::span<const char* const> schema,
-                 const char* notOpenedText = "Database is not opended");
+                 const char* notOpenedText = "Database is not opended", const char* name = "calendar");
     ~SyncDatabase();
     SyncDatabase(const SyncDatabase&) = delete;
     SyncDatabase& operator=(const SyncDatabase&) = delete;
@@ -90,9 +90,10 @@ private:
     [[nodiscard]] int read(std::string_view sql, Params params, bool firstOnly,
                            const std::function<void(const Row&)>& use);
 
-    const std::string mPath;  // constant after construction, as the next two
+    const std::string mPath;  // constant after construction, as the next three
     const std::span<const char* const> mSchema;
     const char* const mNotOpenedText;
+    const char* const mName;
 
     std::recursive_mutex mMutex;
     sqlite3* mpHandle = nullptr;  // guarded by mMutex, as all below

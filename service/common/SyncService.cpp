@@ -389,3 +389,8 @@ int SyncService::startUpSync(int accountId, int type) {
     SyncAgent* agent = nullptr;
     return checkedAgent(accountId, type, &agent) == kOk ? agent->startUpSync() : kFailed;
 }
+
+bool SyncService::requestUpSync(int accountId, int type) {
+    SyncAgent* agent = nullptr;
+    return checkedAgent(accountId, type, &agent) == kOk && agent->requestUpSync();
+}

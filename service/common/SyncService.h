@@ -35,6 +35,8 @@ public:
     int startSync(int accountId, int type);
     int stopSync(int accountId, int type);
     int startUpSync(int accountId, int type);
+    // Whether the account's agent has begun an up sync or queued it.
+    bool requestUpSync(int accountId, int type);
 
     // For the end of the daemon: running syncs are told to stop and waited for; no agent is left.
     void quiesce();

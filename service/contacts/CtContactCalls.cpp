@@ -133,7 +133,8 @@ int CtDataManager::getContactData(const std::string& uri, const std::string& fee
 int CtDataManager::updateContactEtag(const std::string& uri, const std::string& etag) {
     CtContactSyncRow row;
     if (!isDBPrepared()) return kFailed;
-    if (mpMetaData->getContact(uri, &row) != kOk || mpMetaData->getContact(row.contact_id, &row) != kOk) {
+    if (mpMetaData->getContact(uri, &row) != kOk ||
+        mpMetaData->getStoredContact(row.contact_id, &row) != kOk) {
         SYNC_ERR("get fail");
         return kFailed;
     }
@@ -159,7 +160,7 @@ int CtDataManager::updateContactUriEtag(int contactId, const std::string& uri, c
 }
 
 int CtDataManager::getContactUri(int contactId, std::string* uri) {
-    return forward("get fail", &CtMetaDataDBHelper::getContactUri, contactId, uri);
+    return forwardById(&CtMetaDataDBHelper::getContactUri, contactId, uri);
 }
 
 int CtDataManager::getContactId(const std::string& uri, int* contactId) {
@@ -257,7 +258,7 @@ void CtDataManager::requestUploads(bool (CtDataManager::*isChanged)(int), bool u
         if (usesPending && mPending[addressBookId]) continue;
         if (!(this->*isChanged)(addressBookId)) continue;
         const bool isTaken =
-            SyncService::getInstance().startUpSync(accountId, VANTOR_PIM_SYNC_TYPE_CONTACTS) == kOk;
+            SyncService::getInstance().requestUpSync(accountId, VANTOR_PIM_SYNC_TYPE_CONTACTS);
         if (usesPending && isTaken) mPending[addressBookId] = true;
     }
 }

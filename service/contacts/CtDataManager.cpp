@@ -248,7 +248,7 @@ int CtDataManager::updateGroupEtag(int groupId, const std::string& etag) {
 int CtDataManager::updateGroupUri(int groupId, const std::string& uri, const std::string& etag) {
     if (!isDBPrepared()) return kFailed;
     CtGroupSyncRow row;
-    if (mpMetaData->getGroup(groupId, &row) != kOk) {
+    if (mpMetaData->getStoredGroup(groupId, &row) != kOk) {
         SYNC_ERR("get fail");
         return kFailed;
     }
@@ -263,8 +263,11 @@ int CtDataManager::getGroupData(int groupId, std::string* entry, std::string* et
     CtGroupSyncRow row;
     contacts_record_h raw = nullptr;
     if (!isDBPrepared()) return kFailed;
-    if (mpMetaData->getGroup(groupId, &row) != kOk ||
-        contacts_db_get_record(_contacts_group, groupId, &raw) != PLATFORM_ERROR_NONE) {
+    if (mpMetaData->getGroup(groupId, &row) != kOk) {
+        SYNC_ERR("get fail %d", groupId);
+        return kFailed;
+    }
+    if (contacts_db_get_record(_contacts_group, groupId, &raw) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("db_get_record fail");
         return kFailed;
     }
@@ -280,7 +283,7 @@ int CtDataManager::getGroupData(int groupId, std::string* entry, std::string* et
 }
 
 int CtDataManager::getGroupUri(int groupId, std::string* uri) {
-    return forward("get fail", &CtMetaDataDBHelper::getGroupUri, groupId, uri);
+    return forwardById(&CtMetaDataDBHelper::getGroupUri, groupId, uri);
 }
 
 int CtDataManager::getGroupId(const std::string& uri, int addressBookId, int* groupId) {
@@ -288,7 +291,7 @@ int CtDataManager::getGroupId(const std::string& uri, int addressBookId, int* gr
 }
 
 int CtDataManager::getGroupStarredInMerrow(int addressBookId, int* groupId) {
-    return forward("get fail", &CtMetaDataDBHelper::getGroupStarredInMerrow, addressBookId, groupId);
+    return forwardById(&CtMetaDataDBHelper::getGroupStarredInMerrow, addressBookId, groupId);
 }
 
 int CtDataManager::getAllDirtyGroupIds(int accountId, std::vector<int>* groupIds) {

@@ -119,22 +119,24 @@ public:
     static void changedGroupCallback(const char* view, void* userData);
 
 private:
+    friend struct CtDataManagerProbe;  // lets a test see what is pending
+
     // Forwards to the store; a failure is logged as `failureText`.
     template <class... Params, class... Args>
     int forward(const char* failureText, int (CtMetaDataDBHelper::*call)(Params...), Args&&... args);
+    // The same for a read by an id, which the log names.
+    template <class Out>
+    int forwardById(int (CtMetaDataDBHelper::*call)(int, Out*), int id, Out* out);
     [[nodiscard]] int prepareStore();
     [[nodiscard]] int createAddressBook(int accountId, const std::string& name, int* addressBookId);
-    [[nodiscard]] int writeContactData(int contactId, const std::string& uri, const std::string& feedBase,
-                                       CtContactData* out);
     void requestUploads(bool (CtDataManager::*isChanged)(int), bool usesPending);
-    [[nodiscard]] bool takePending(int addressBookId);
 
     std::mutex mPrepareMutex;
     bool mIsPrepared = false;  // set once, before there is a worker
     std::unique_ptr<CtMetaDataDBHelper> mpMetaData;
     std::mutex mPendingMutex;
     std::map<int, bool>
-        mPending;  // by address book: an upload was asked for and has not begun; guarded by mPendingMutex
+        mPending;  // by address book: an upload was begun or queued and has not looked yet; guarded by mPendingMutex
 };
 
 template <class... Params, class... Args>
@@ -143,5 +145,13 @@ int CtDataManager::forward(const char* failureText, int (CtMetaDataDBHelper::*ca
     if (!isDBPrepared()) return sync_result::kFailed;
     const int result = (*mpMetaData.*call)(std::forward<Args>(args)...);
     if (result != sync_result::kOk && failureText != nullptr) SYNC_ERR("%s", failureText);
+    return result;
+}
+
+template <class Out>
+int CtDataManager::forwardById(int (CtMetaDataDBHelper::*call)(int, Out*), int id, Out* out) {
+    if (!isDBPrepared()) return sync_result::kFailed;
+    const int result = (*mpMetaData.*call)(id, out);
+    if (result != sync_result::kOk) SYNC_ERR("get fail %d", id);
     return result;
 }

@@ -5,7 +5,6 @@
 #include "common/PageReader.h"
 #include "common/SyncLog.h"
 #include "contacts/CtDataManager.h"
-#include "contacts/CtFeedParsers.h"
 #include "contacts/CtJsonOrbitPeopleConverter.h"
 #include "contacts/CtListing.h"
 #include "contacts/CtPagePlan.h"
@@ -107,10 +106,7 @@ int CtDownSyncDirector::syncGroups(Feed feed) {
 // --- contacts
 
 int CtDownSyncDirector::fetchContacts(Feed feed, const std::string& token, CtContactPage* page) {
-    if (feed == Feed::kPages) return mContactTask.getContactPage(token, page);
-    std::string text;
-    const int result = mContactTask.getEntireFeed(CtItemType::kContact, &text);
-    return result == kOk ? CtContactListJsonParser::parse(text, page) : result;
+    return feed == Feed::kWhole ? mContactTask.getContacts(page) : mContactTask.getContactPage(token, page);
 }
 
 int CtDownSyncDirector::syncContacts(Feed feed) {

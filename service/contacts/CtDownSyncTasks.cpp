@@ -18,6 +18,17 @@ void logSuspicious(const std::string& text) {
     for (size_t at = 0; at < text.size(); at += kLogSlice) SYNC_DBG("%s", text.substr(at, kLogSlice).c_str());
 }
 
+int readContacts(int result, const std::string& text, CtContactPage* page) {
+    if (result != kOk) {
+        SYNC_ERR("Getting contacts from remote failed! %d", result);
+        return result;
+    }
+    if (CtContactListJsonParser::parse(text, page) == kOk) return kOk;
+    SYNC_ERR("JSON parsing Failed");
+    logSuspicious(text);
+    return kFailed;
+}
+
 int readGroups(int result, const std::string& text, CtGroupPage* page) {
     if (result != kOk) {
         SYNC_ERR("Curl Get Operation Failed! %d", result);
@@ -39,18 +50,17 @@ int CtDownSyncTask::getEntireFeed(CtItemType type, std::string* text) {
 
 int CtDownSyncTask::getContactPage(const std::string& url, CtContactPage* page) {
     std::string text;
-    const int result = mpCurl->get(url.empty() ? mpCurl->feedBase() + kContactPages : url, &text);
-    if (result != kOk) {
-        SYNC_ERR("Getting contacts from remote failed! %d", result);
-        return result;
-    }
-    if (CtContactListJsonParser::parse(text, page) != kOk) {
-        SYNC_ERR("JSON parsing Failed");
-        logSuspicious(text);
-        return kFailed;
-    }
-    if (!page->nextPageToken.empty()) SYNC_INFO("Go next page :%s", page->nextPageToken.c_str());
-    return kOk;
+    const int fetched = mpCurl->get(url.empty() ? mpCurl->feedBase() + kContactPages : url, &text);
+    const int result = readContacts(fetched, text, page);
+    if (result == kOk && !page->nextPageToken.empty())
+        SYNC_INFO("Go next page :%s", page->nextPageToken.c_str());
+    return result;
+}
+
+int CtDownSyncTask::getContacts(CtContactPage* page) {
+    std::string text;
+    const int result = getEntireFeed(CtItemType::kContact, &text);
+    return readContacts(result, text, page);
 }
 
 int CtDownSyncGroupListTask::getListPageByPage(const std::string& url, CtGroupPage* page) {

@@ -16,6 +16,8 @@ public:
     [[nodiscard]] int getEntireFeed(CtItemType type, std::string* text);
     // An empty URL asks for the first page.
     [[nodiscard]] int getContactPage(const std::string& url, CtContactPage* page);
+    // All in one page.
+    [[nodiscard]] int getContacts(CtContactPage* page);
 
 protected:
     CtCurl* const mpCurl;

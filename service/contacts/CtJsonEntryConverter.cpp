@@ -126,6 +126,10 @@ int CtJsonEntryConverter::convert(const std::string& entryText, ContactsRecord* 
         SYNC_ERR("load json fail! %s", "the entry is no JSON");
         throw JsonException("load json fail!");
     }
+    if (!JSON_NODE_HOLDS_OBJECT(root.get())) {
+        SYNC_ERR("parsing error");
+        throw JsonException("parsing error");
+    }
     JsonObject* entry = json_access::objectIn(root.get());
     if (entry == nullptr) {
         SYNC_ERR("json_node_get_object is failed");

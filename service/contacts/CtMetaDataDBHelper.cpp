@@ -47,14 +47,13 @@ constexpr const char* kGroupColumns =
 constexpr const char* kContactColumns =
     "SELECT contact_id, addressbook_id, version, dirty, image_dirty, deleted, uri, etag, "
     "photo_etag, " CT_READ_TIME " FROM contact_sync_table where ";
-constexpr const char* kAllGroups =
+// Rows as they are stored, the time text included, for whoever writes them back.
+constexpr const char* kStoredGroups =
     "SELECT group_id, addressbook_id, starred, version, dirty, deleted, uri, etag, updated, source FROM "
-    "group_sync_table "
-    "where addressbook_id =?";
-constexpr const char* kAllContacts =
+    "group_sync_table where ";
+constexpr const char* kStoredContacts =
     "SELECT contact_id, addressbook_id, version, dirty, image_dirty, deleted, uri, etag, photo_etag, updated "
-    "FROM "
-    "contact_sync_table where addressbook_id =?";
+    "FROM contact_sync_table where ";
 
 // The ids of an account's rows.
 std::string ofAccount(const std::string& column, const std::string& table, const std::string& condition) {
@@ -91,7 +90,7 @@ static void take(const Row& row, CtContactSyncRow* contact) {
     }
 }
 
-CtMetaDataDBHelper::CtMetaDataDBHelper() : mDatabase(kPath, kSchema, "Database is not opened") {}
+CtMetaDataDBHelper::CtMetaDataDBHelper() : mDatabase(kPath, kSchema, "Database is not opened", "contact") {}
 
 // --- groups
 
@@ -310,18 +309,27 @@ int CtMetaDataDBHelper::deleteAddressBook(int addressBookId) {
 // --- bound to an address book
 
 int CtMetaDataDBHelper::getAllContacts(int addressBookId, std::vector<CtContactSyncRow>* rows) {
-    return readList(mDatabase, kAllContacts, {addressBookId}, rows);
+    return readList(mDatabase, std::string(kStoredContacts) + "addressbook_id =?", {addressBookId}, rows);
 }
 
 int CtMetaDataDBHelper::getAllGroups(int addressBookId, std::vector<CtGroupSyncRow>* rows) {
     std::vector<CtGroupSyncRow> found;
-    const int result = mDatabase.readAll(kAllGroups, {addressBookId}, [&found](const Row& row) {
-        constexpr int kSource = 9;
-        take(row, &found.emplace_back());
-        found.back().source = row.text(kSource);
-    });
+    const int result = mDatabase.readAll(std::string(kStoredGroups) + "addressbook_id =?", {addressBookId},
+                                         [&found](const Row& row) {
+                                             constexpr int kSource = 9;
+                                             take(row, &found.emplace_back());
+                                             found.back().source = row.text(kSource);
+                                         });
     if (result == kOk) rows->insert(rows->end(), found.begin(), found.end());
     return result;
+}
+
+int CtMetaDataDBHelper::getStoredContact(int contactId, CtContactSyncRow* row) {
+    return readOne(mDatabase, std::string(kStoredContacts) + "contact_id =?", {contactId}, row);
+}
+
+int CtMetaDataDBHelper::getStoredGroup(int groupId, CtGroupSyncRow* row) {
+    return readOne(mDatabase, std::string(kStoredGroups) + "group_id =?", {groupId}, row);
 }
 
 int CtMetaDataDBHelper::forgetContact(int contactId) {

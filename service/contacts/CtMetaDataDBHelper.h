@@ -27,7 +27,7 @@ public:
     [[nodiscard]] int getGroupUri(int groupId, std::string* uri);
     [[nodiscard]] int getGroupEtag(const std::string& uri, std::string* etag);
     [[nodiscard]] int getGroupVersion(int groupId, int* version);
-    // Without the source.
+    // Without the source and, as of a contact, without the time: these forms read it as seconds, which is not how it is stored.
     [[nodiscard]] int getGroup(int groupId, CtGroupSyncRow* row);
     [[nodiscard]] int getGroup(const std::string& uri, CtGroupSyncRow* row);
     [[nodiscard]] int getAllDirtyGroupIds(int accountId, std::vector<int>* groupIds);
@@ -78,6 +78,9 @@ public:
     // All rows, read once for a comparison, a change walk or an upload; the time text as it is stored.
     [[nodiscard]] int getAllContacts(int addressBookId, std::vector<CtContactSyncRow>* rows);
     [[nodiscard]] int getAllGroups(int addressBookId, std::vector<CtGroupSyncRow>* rows);
+    // One row with its time text as it is stored, to be written back; the group without its source.
+    [[nodiscard]] int getStoredContact(int contactId, CtContactSyncRow* row);
+    [[nodiscard]] int getStoredGroup(int groupId, CtGroupSyncRow* row);
     // A row by the id of its record.
     [[nodiscard]] int forgetContact(int contactId);
     [[nodiscard]] int forgetGroup(int groupId);

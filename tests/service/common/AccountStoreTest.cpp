@@ -5,6 +5,7 @@
 #include <fstream>
 
 #include "common/AccountDBHelper.h"
+#include "support/FullDisk.h"
 #include "support/TestRoot.h"
 
 namespace {
@@ -20,19 +21,6 @@ void writeToken(const TestRoot& root, int id, const std::string& text) {
                   (std::to_string(id) + "_file"))
         << text;
 }
-
-// A disk that is full for whoever opens a store while the object lives.
-class FullDisk {
-public:
-    FullDisk() { EXPECT_EQ(sqlite3_auto_extension(mExtension), SQLITE_OK); }
-    ~FullDisk() { sqlite3_cancel_auto_extension(mExtension); }
-
-private:
-    static int allowTwoPages(sqlite3* database, const char**, const struct sqlite3_api_routines*) {
-        return sqlite3_exec(database, "PRAGMA max_page_count = 2", nullptr, nullptr, nullptr);
-    }
-    void (*const mExtension)() = reinterpret_cast<void (*)()>(&allowTwoPages);
-};
 
 }  // namespace
 

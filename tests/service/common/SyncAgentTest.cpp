@@ -257,6 +257,7 @@ TEST_F(SyncAgentStates, ARunIsPublishedWithItsResultsAndEndsLast) {
     ASSERT_EQ(agent.startSync(), 0);
     EXPECT_EQ(number("run"), 1);
     EXPECT_EQ(agent.startUpSync(), -1);  // reserved behind the download
+    EXPECT_TRUE(agent.requestUpSync());
     EXPECT_EQ(agent.continueSync(0), 0);
     EXPECT_NE(number("ended"), 1) << "the up half still runs";
     EXPECT_EQ(agent.continueSync(-1), 0);

@@ -9,9 +9,17 @@
 #include "common/SyncService.h"
 #include "common/SyncUtil.h"
 #include "common/vantor_pim_sync.h"
+#include "contacts/CtDataManager.h"
 #include "platform/account.h"
+#include "platform/contacts.h"
 #include "platform/database.h"
 #include "support/TestRoot.h"
+
+struct CtDataManagerProbe {
+    static bool isPending(CtDataManager& manager, int addressBookId) {
+        return manager.mPending[addressBookId];
+    }
+};
 
 namespace {
 
@@ -125,4 +133,29 @@ TEST(SyncService, RemovalTakesWhatWasDownloadedBeforeSyncWasSwitchedOffAndOfItsO
     EXPECT_EQ(vantor_pim_sync_remove_account(9), 0);
     EXPECT_EQ(booksOf(9), 0U);
     EXPECT_EQ(booksOf(99), 1U);
+}
+
+TEST(SyncService, AContactUploadThatIsQueuedIsAskedForOnce) {
+    device();
+    constexpr int kId = 10;
+    vantor_pim_sync_account_s account = record(kId, /*calendarSync=*/false);
+    account.ctsync = true;
+    ASSERT_EQ(vantor_pim_sync_add_account(&account), 0);
+    CtDataManager& manager = CtDataManager::getInstance();
+    int book = 0;
+    ASSERT_EQ(manager.getAddressBookId(kId, &book), 0);
+    // The main loop does not run: the download has begun and does not end.
+    ASSERT_EQ(vantor_pim_sync_start(kId, VANTOR_PIM_SYNC_TYPE_CONTACTS), 0);
+    CtDataManager::changedContactCallback(_contacts_contact, &manager);
+    EXPECT_FALSE(CtDataManagerProbe::isPending(manager, book)) << "nothing was changed";
+    contacts_record_h raw = nullptr;
+    ASSERT_EQ(contacts_record_create(_contacts_contact, &raw), 0);
+    const ContactsRecord contact(raw);
+    ASSERT_EQ(contacts_record_set_int(raw, CONTACTS_CONTACT_ADDRESS_BOOK_ID, book), 0);
+    ASSERT_EQ(contacts_db_insert_record(raw, nullptr), 0);
+    CtDataManager::changedContactCallback(_contacts_contact, &manager);
+    EXPECT_TRUE(CtDataManagerProbe::isPending(manager, book));
+    ASSERT_EQ(manager.setAccountChanged(kId), 0);
+    EXPECT_FALSE(CtDataManagerProbe::isPending(manager, book)) << "the run has looked";
+    EXPECT_FALSE(SyncService::getInstance().requestUpSync(99, VANTOR_PIM_SYNC_TYPE_CONTACTS));
 }

@@ -11,6 +11,8 @@
 #include "contacts/CtSnapshot.h"
 #include "platform/contacts_read.h"
 #include "service/contacts/AtomReader.h"
+#include "support/FullDisk.h"
+#include "support/LogCapture.h"
 #include "support/TestRoot.h"
 
 using contacts_read::intOf;
@@ -218,6 +220,25 @@ TEST_F(ContactStore, AChangeThatCannotBeMarkedIsSeenAgain) {
     EXPECT_EQ(row("c1").dirty + row("c2").dirty + row("c3").deleted, 3);
 }
 
+TEST_F(ContactStore, ANewEtagLeavesTheRestOfTheRow) {
+    const char* const time = "2026-03-01T10:00:00.000Z";
+    std::vector<BulkItem> page = items({contact("c1", "e1", "Ada")});
+    page[0].row.photo_etag = "p";
+    ASSERT_EQ(mManager.insertContacts(kAccount, &page), kOk);
+    ASSERT_EQ(mManager.insertGroup(kAccount, "Friends", "e1", time, "g1", "{}", "", false), kOk);
+    int group = 0;
+    ASSERT_EQ(mManager.getGroupId("g1", mBook, &group), kOk);
+    ASSERT_EQ(mManager.updateContactEtag("c1", "e2"), kOk);
+    ASSERT_EQ(mManager.updateGroupEtag(group, "e2"), kOk);
+    std::vector<CtContactSyncRow> contacts;
+    std::vector<CtGroupSyncRow> groups;
+    ASSERT_EQ(mManager.metaData()->getAllContacts(mBook, &contacts), kOk);
+    ASSERT_EQ(mManager.metaData()->getAllGroups(mBook, &groups), kOk);
+    EXPECT_EQ(contacts.at(0).etag + contacts.at(0).photo_etag + contacts.at(0).updated,
+              std::string("e2p") + time);
+    EXPECT_EQ(groups.at(0).etag + groups.at(0).uri + groups.at(0).updated, std::string("e2g1") + time);
+}
+
 TEST_F(ContactStore, AContactChangedMeanwhileIsNotOverwritten) {
     std::vector<BulkItem> page = items({contact("c1", "e1", "Ada"), contact("c2", "e1", "Bob")});
     ASSERT_EQ(mManager.insertContacts(kAccount, &page), kOk);
@@ -298,4 +319,30 @@ TEST_F(ContactStore, WhatFeedsAndRepliesSay) {
     EXPECT_EQ(meta.id + meta.etag + meta.photoEtag + meta.editId, "c4epc4");
     for (const Json& bad : {withoutEtag, withoutId, contact("c", "e", "x", {{"link", {{{"href", "h"}}}}})})
         EXPECT_EQ(CtEntryMetaDataParser::getMetaData(Json{{"entry", bad}}.dump(), &meta), kFailed) << bad;
+}
+
+TEST_F(ContactStore, TheLogNamesWhatIsMissing) {
+    const LogCapture log;
+    std::string text;
+    int id = 0;
+    int version = 0;
+    EXPECT_EQ(mManager.getContactUri(91, &text), kFailed);
+    EXPECT_EQ(mManager.getGroupUri(92, &text), kFailed);
+    EXPECT_EQ(mManager.getGroupStarredInMerrow(93, &id), kFailed);
+    EXPECT_EQ(mManager.getGroupData(94, &text, &text, &version), kFailed);
+    for (const char* line : {"get fail 91", "get fail 92", "get fail 93", "get fail 94"})
+        EXPECT_EQ(log.count(line), 1) << line;
+    EXPECT_EQ(mManager.getContactId("nobody", &id), kFailed);
+    EXPECT_EQ(log.count("get fail\033"), 1);
+    ContactsRecord record;
+    EXPECT_EQ(mManager.parseJson2Record("[]", mBook, &record), kFailed);
+    EXPECT_EQ(log.count("* parsing error"), 1);
+}
+
+TEST(CtMetaDataDBHelper, AFileThatCannotBeMadeIsNamedInTheLog) {
+    const TestRoot root;
+    const LogCapture log;
+    const FullDisk disk;
+    EXPECT_NE(CtMetaDataDBHelper().openDb(), kOk);
+    EXPECT_EQ(log.count("remake contact DB file is Failed : "), 1);
 }

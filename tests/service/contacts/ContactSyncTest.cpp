@@ -499,6 +499,25 @@ TEST_F(ContactSync, TheWholeFeedAtOnceSaysTheSame) {
     expectQuiet();
 }
 
+TEST_F(ContactSync, AListThatCannotBeReadIsTold) {
+    struct Case {
+        int status;
+        const char* text;
+        const char* line;
+    };
+    for (const Case& row : {Case{503, "busy", "Getting contacts from remote failed! -1"},
+                            Case{200, "<html>busy</html>", "JSON parsing Failed"},
+                            Case{200, "{}", "Server's response is suspicious. check full string"}}) {
+        const LogCapture log;
+        mServer.listStatus = row.status;
+        mServer.listText = row.text;
+        EXPECT_EQ(mDown.processContactsPageByPage(), kFailed);
+        EXPECT_EQ(log.count(row.line), 1) << row.line;
+        EXPECT_EQ(mDown.processContacts(), kFailed);
+        EXPECT_EQ(log.count(row.line), 2) << row.line << ", the whole feed";
+    }
+}
+
 TEST_F(ContactSync, RowsThatWereCutOffAreTakenOver) {
     for (const char* id : {"a", "b", "c"}) mServer.put("contacts", id, named(id));
     mServer.put("groups", "g1", {{"title", {{"$t", "Friends"}}}});

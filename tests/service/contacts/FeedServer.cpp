@@ -107,6 +107,11 @@ void FeedServer::serveFeeds(const std::string& feed) {
             response.status = 503;
             return;
         }
+        if (feed == "contacts" && !listText.empty()) {
+            response.status = listStatus;
+            response.set_content(listText, "application/json");
+            return;
+        }
         const bool isEmpty = feed == "contacts" && start == 0 && emptyLists > 0;
         if (isEmpty) --emptyLists;
         if (feed == "groups" && start == 0) mHidesGroup = hiddenLists-- > 0;

@@ -33,6 +33,8 @@ public:
     std::string hiddenGroup;  // left out of so many lists:
     int hiddenLists = 0;
     bool endsEarly = false;  // the second page is an error
+    int listStatus = 200;
+    std::string listText;  // in place of the contacts, when it is not empty
     int photoStatus = 200;
     int profileStatus = 200;
     int profileImageStatus = 200;

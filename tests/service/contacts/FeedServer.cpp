@@ -131,6 +131,10 @@ void FeedServer::serveFeeds(const std::string& feed) {
     });
     mServer.Post(list, [this, feed](const httplib::Request& request, httplib::Response& response) {
         const std::lock_guard lock(mMutex);
+        if (feed == "groups" && groupWriteStatus != 0) {
+            response.status = groupWriteStatus;
+            return;
+        }
         const std::string id = "n" + std::to_string(++mRevision);
         mEntries[feed][id] = fieldsOf(readAtom(request.body));
         mEntries[feed][id]["gd$etag"] = nextEtag();
@@ -195,6 +199,10 @@ void FeedServer::servePhotos() {
         const std::lock_guard lock(mMutex);
         const std::string id = request.matches[1];
         const std::string match = request.get_header_value("If-Match");
+        if (photoWriteStatus != 0) {
+            response.status = photoWriteStatus;
+            return;
+        }
         if (mPhotos.contains(id) && mPhotos[id].first != match) {
             response.status = 409;
             return;
@@ -205,6 +213,7 @@ void FeedServer::servePhotos() {
             mPhotos[id] = {nextEtag(), request.body};
         }
         mEntries["contacts"][id]["gd$etag"] = nextEtag();
+        if (const auto hook = onPhotoWritten) hook(mEntries["contacts"]);
         writeDone(response, nullptr, 200);
     };
     mServer.Put(one, change);

@@ -4,6 +4,7 @@
 
 #include <httplib.h>
 
+#include <functional>
 #include <map>
 #include <mutex>
 #include <string>
@@ -36,6 +37,10 @@ public:
     int listStatus = 200;
     std::string listText;  // in place of the contacts, when it is not empty
     int photoStatus = 200;
+    int groupWriteStatus = 0;  // refuses with this, nothing is carried out
+    int photoWriteStatus = 0;  // likewise
+    // Runs once a photo is written, with the contacts at hand; their etags stay as they are afterwards.
+    std::function<void(std::map<std::string, Json>& contacts)> onPhotoWritten;
     int profileStatus = 200;
     int profileImageStatus = 200;
 

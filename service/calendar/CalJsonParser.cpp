@@ -2,6 +2,7 @@
 
 #include <cstdlib>
 
+#include "common/HeaderText.h"
 #include "common/JsonAccess.h"
 #include "common/JsonText.h"
 #include "common/SyncLog.h"
@@ -108,7 +109,7 @@ int CalJsonParser::checkData() const {
 
 int CalJsonParser::getAccessToken(std::string* token) const {
     const std::string found = json_access::textOr(json_access::objectIn(mpRoot.get()), "access_token", "");
-    if (found.empty()) {
+    if (found.empty() || !header_text::isValid(found)) {
         SYNC_ERR("don't have token");
         return kFailed;
     }

@@ -79,6 +79,8 @@ TEST(CalCurl, GivesUpInItsOwnTime) {
     for (const Row& row :
          {Row{"a token that is refused again and again", R"({"access_token":"bad"})", kOk, 5},
           Row{"no token in the reply", R"({"error":"invalid_grant"})", kTokenFailed, 1},
+          Row{"a token that would begin a header of its own", R"({"access_token":"good\r\nX-Other: 1"})",
+              kTokenFailed, 1},
           Row{"a reply that cannot be read", "{oops", kOk, 5}}) {
         SCOPED_TRACE(row.name);
         Client client;

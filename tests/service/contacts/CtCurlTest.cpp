@@ -68,6 +68,8 @@ TEST(CtCurl, RenewsTheTokenOnceAndSendsTheServicesHeaders) {
     EXPECT_EQ(client.server.requests, before) << "without an etag nothing goes out";
 }
 
+    EXPECT_EQ(client.curl.update(edit, "\"e\"\r\nX-Other: 1", "<x/>", &client.reply), kFailed);
+    EXPECT_EQ(client.server.requests, before) << "nor with one that would begin a header of its own";
 TEST(CtCurl, WhatAnAnswerMeans) {
     struct Case {
         int status;

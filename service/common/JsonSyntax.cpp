@@ -10,7 +10,7 @@ namespace {
 
 class Checker {
 public:
-    explicit Checker(std::string_view text) : mRest(text) {}
+    Checker(std::string_view text, std::vector<size_t>* lone) : mText(text), mRest(text), mpLone(lone) {}
 
     bool document() {
         skipSpace();
@@ -98,8 +98,33 @@ private:
         if (mRest.size() < kHexDigits) return false;
         const std::string_view digits = mRest.substr(0, kHexDigits);
         mRest.remove_prefix(kHexDigits);
-        return digits.find_first_not_of("0123456789abcdefABCDEF") == std::string_view::npos;
+        return true;
     }
+
+    // With `digits`, of an escape that is one, still at the front of the rest.
+    void noteSurrogate(std::string_view digits) {
+        constexpr size_t kEscapeLength = sizeof("\\uD83D") - 1;
+        const auto isHalf = [](std::string_view half, std::string_view thirds) {
+            return (half[0] == 'd' || half[0] == 'D') && thirds.find(half[1]) != std::string_view::npos;
+        };
+        constexpr std::string_view kHigh = "89abAB";
+        constexpr std::string_view kLow = "cdefCDEF";
+        const auto at = static_cast<size_t>(digits.data() - mText.data()) - 2;
+        if (isHalf(digits, kLow)) {
+            if (mHighEnd != at) mpLone->push_back(at);
+        } else if (isHalf(digits, kHigh)) {
+            const std::string_view next = mText.substr(at + kEscapeLength, kEscapeLength);
+            const bool isPair =
+                next.size() == kEscapeLength && next.starts_with("\\u") && isHalf(next.substr(2), kLow);
+            if (isPair) {
+                mHighEnd = at + kEscapeLength;
+            } else {
+                mpLone->push_back(at);
+            }
+        }
+    }
+        if (digits.find_first_not_of("0123456789abcdefABCDEF") != std::string_view::npos) return false;
+        noteSurrogate(digits);
 
     bool digits() {
         const size_t length = std::min(mRest.find_first_not_of("0123456789"), mRest.size());
@@ -123,10 +148,13 @@ private:
 
 }  // namespace
 
-bool isValid(std::string_view text) {
+bool isValid(std::string_view text, std::vector<size_t>* lone) {
     // A zero byte inside is no valid UTF-8 here either.
     return g_utf8_validate(text.data(), static_cast<gssize>(text.size()), nullptr) != FALSE &&
-           Checker(text).document();
+           Checker(text, lone).document();
 }
 
 }  // namespace json_syntax
+    const std::string_view mText;
+    std::vector<size_t>* const mpLone;
+    size_t mHighEnd = 0;  // where the second half of a pair has to begin

@@ -1,11 +1,28 @@
 #include "common/JsonText.h"
 
+#include <vector>
+
 #include "common/JsonSyntax.h"
 
 namespace json_text {
 
+namespace {
+
+// The text with the character for what cannot be shown in place of each escape that `lone` tells.
+std::string repaired(std::string_view text, const std::vector<size_t>& lone) {
+    constexpr std::string_view kReplacement = "\\uFFFD";
+    std::string copy(text);
+    for (const size_t at : lone) copy.replace(at, kReplacement.size(), kReplacement);
+    return copy;
+}
+
+}  // namespace
+
 JsonNodePtr parse(std::string_view text) {
-    if (!json_syntax::isValid(text)) return nullptr;
+    std::vector<size_t> lone;
+    if (!json_syntax::isValid(text, &lone)) return nullptr;
+    // The parser makes broken UTF-8 of half a pair, drops what follows, or refuses the document for it.
+    if (!lone.empty()) return parse(repaired(text, lone));
     const JsonParserPtr parser(json_parser_new_immutable());
     if (!parser || json_parser_load_from_data(parser.get(), text.data(), static_cast<gssize>(text.size()),
                                               nullptr) == FALSE) {

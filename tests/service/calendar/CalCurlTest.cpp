@@ -121,7 +121,10 @@ TEST(CalCurl, RepliesInflatedOrNot) {
         {"empty", "", kOk, ""},
         {"cut short", zipped.substr(0, zipped.size() / 2), kFailed, ""},
         {"without its check sum", zipped.substr(0, zipped.size() - 4), kFailed, ""},
-        {"text after a zero byte", gzip(std::string("ab\0cd", 5)), kOk, "ab"},
+        {"zero bytes at the end", gzip(std::string("ab\0\0", 4)), kOk, "ab"},
+        {"nothing but a zero byte", gzip(std::string(1, '\0')), kOk, ""},
+        {"an empty list and junk after a zero byte", gzip(std::string("{\"items\":[]}\0junk", 17)), kFailed,
+         ""},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);

@@ -22,7 +22,6 @@ namespace {
 constexpr long kTimeoutSeconds = 60;
 constexpr int kMaxAttempts = 5;
 constexpr long kUnauthorized = 401;
-constexpr size_t kMaxInflatedBytes = 256UL * 1024 * 1024;
 constexpr const char* kCalendars = "/calendar/v3/calendars/";
 constexpr const char* kLists = "/tasks/v1/lists/";
 // The service takes updates of tasks under another prefix than everything else.
@@ -161,7 +160,7 @@ int CalCurl::performCurlCompress(const std::string& path, const char* method, co
     }
     if (response == nullptr) return result;
     std::string inflated;
-    if (inflateGzip(reply, &inflated, kMaxInflatedBytes) != kOk) {
+    if (inflateGzip(reply, &inflated, HttpTransfer::kMaxReplyBytes) != kOk) {
         SYNC_ERR("fail");
         return kFailed;
     }

@@ -96,8 +96,8 @@ int CalJsonParser::checkData() const {
     if (error == nullptr) return 0;
     SYNC_ERR("Has error return");
     int code = 0;
-    if (const std::optional<int64_t> number = json_access::integer(error, "code")) {
-        code = static_cast<int>(*number);
+    if (const std::optional<int> number = json_access::number(error, "code")) {
+        code = *number;
     } else {
         constexpr int kDecimal = 10;
         code =

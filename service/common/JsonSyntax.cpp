@@ -3,6 +3,9 @@
 #include <glib.h>
 
 #include <algorithm>
+#include <charconv>
+#include <cmath>
+#include <string>
 
 namespace json_syntax {
 
@@ -97,6 +100,8 @@ private:
         constexpr size_t kHexDigits = 4;
         if (mRest.size() < kHexDigits) return false;
         const std::string_view digits = mRest.substr(0, kHexDigits);
+        if (digits.find_first_not_of("0123456789abcdefABCDEF") != std::string_view::npos) return false;
+        noteSurrogate(digits);
         mRest.remove_prefix(kHexDigits);
         return true;
     }
@@ -123,8 +128,6 @@ private:
             }
         }
     }
-        if (digits.find_first_not_of("0123456789abcdefABCDEF") != std::string_view::npos) return false;
-        noteSurrogate(digits);
 
     bool digits() {
         const size_t length = std::min(mRest.find_first_not_of("0123456789"), mRest.size());
@@ -133,17 +136,34 @@ private:
     }
 
     bool number() {
+        const std::string_view from = mRest;
+        bool isInteger = true;
         take('-');
         if (!take('0') && !digits()) return false;
-        if (take('.') && !digits()) return false;
-        if (take('e') || take('E')) {
-            if (!take('+')) take('-');
-            return digits();
+        if (take('.')) {
+            isInteger = false;
+            if (!digits()) return false;
         }
-        return true;
+        if (take('e') || take('E')) {
+            isInteger = false;
+            if (!take('+')) take('-');
+            if (!digits()) return false;
+        }
+        return isHeld(from.substr(0, from.size() - mRest.size()), isInteger);
     }
 
+    // The parser makes another number, or none, of what its types cannot hold.
+    static bool isHeld(std::string_view number, bool isInteger) {
+        int64_t value = 0;
+        if (isInteger)
+            return std::from_chars(number.data(), number.data() + number.size(), value).ec == std::errc();
+        return std::isfinite(g_ascii_strtod(std::string(number).c_str(), nullptr));
+    }
+
+    const std::string_view mText;
     std::string_view mRest;
+    std::vector<size_t>* const mpLone;
+    size_t mHighEnd = 0;  // where the second half of a pair has to begin
 };
 
 }  // namespace
@@ -155,6 +175,3 @@ bool isValid(std::string_view text, std::vector<size_t>* lone) {
 }
 
 }  // namespace json_syntax
-    const std::string_view mText;
-    std::vector<size_t>* const mpLone;
-    size_t mHighEnd = 0;  // where the second half of a pair has to begin

@@ -154,8 +154,10 @@ TEST(CalHostileReply, NumbersOutOfRangeAreNotTaken) {
         ASSERT_EQ(parser.setString(R"({"error":{"code":)" + std::string(number) + "}}"), kOk);
         EXPECT_EQ(parser.checkData(), kFailed) << number;
     }
-    for (const char* time : {"10000-01-01T00:00:00Z", "2026-00-01T00:00:00Z", "2026-01-01T99:00:00Z",
-                             "2026-01-01T00:00:-1Z", "-001-01-01T00:00:00Z"}) {
+    for (const char* time :
+         {"10000-01-01T00:00:00Z", "2026-00-01T00:00:00Z", "2026-01-01T99:00:00Z", "2026-01-01T00:00:-1Z",
+          "2026-02-29T00:00:00Z", "2026-04-31T00:00:00Z", "-001-01-01T00:00:00Z", "9999-12-31T23:00:00-02:00",
+          "0001-01-01T00:00:00+01:00"}) {
         CalendarRecord record;
         const CalListInfoPtr event = listed(R"({"id":"e","etag":"1","start":{"dateTime":")" +
                                             std::string(time) + R"("},"end":{"date":"2026-03-01"}})");

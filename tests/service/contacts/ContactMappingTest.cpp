@@ -269,6 +269,8 @@ TEST_F(ContactMapping, UnreadableEntries) {
         {R"({"link":[{"rel":"x/rel#photo","href":"h/a.com/p"}]})", true, 0, CONTACTS_CONTACT_IMAGES},
         {R"({"link":[{"rel":"x/rel#photo","href":"h/a.com/p","gd$etag":"e"}]})", true, 1,
          CONTACTS_CONTACT_IMAGES},
+        {R"({"link":[{"rel":"x/rel#photo","href":"h/a.com/../etc/passwd","gd$etag":"e"}]})", true, 0,
+         CONTACTS_CONTACT_IMAGES},
         {"[]", false, 0},
         {"{", false, 0},
         {"{} trailing", false, 0},

@@ -5,6 +5,7 @@
 #include <string_view>
 
 #include "common/Handles.h"
+#include "common/HeaderText.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 #include "platform/error.h"
@@ -172,6 +173,10 @@ int HttpTransfer::perform() {
     }
     CurlList list;
     for (const std::string& header : headers) {
+        if (!header_text::isValid(header)) {
+            SYNC_ERR("a header of the request would not stay on its line, nothing is sent");
+            return kFailed;
+        }
         curl_slist* longer = curl_slist_append(list.get(), header.c_str());
         if (longer == nullptr) return kFailed;
         (void)list.release();

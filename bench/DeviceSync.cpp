@@ -1,5 +1,6 @@
 #include "DeviceSync.h"
 
+#include <fcntl.h>
 #include <spawn.h>
 #include <unistd.h>
 
@@ -28,6 +29,23 @@ void requireOk(int account, const std::string& kind, const char* half) {
                                  std::to_string(result));
 }
 
+// What a program is started with that outlives its starter: none of its pipes.
+class Detached {
+public:
+    Detached() {
+        posix_spawn_file_actions_init(&mActions);
+        for (const int fd : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO})
+            posix_spawn_file_actions_addopen(&mActions, fd, "/dev/null", O_RDWR, 0);
+    }
+    ~Detached() { posix_spawn_file_actions_destroy(&mActions); }
+    Detached(const Detached&) = delete;
+    Detached& operator=(const Detached&) = delete;
+    [[nodiscard]] const posix_spawn_file_actions_t* actions() const { return &mActions; }
+
+private:
+    posix_spawn_file_actions_t mActions{};
+};
+
 }  // namespace
 
 Cost syncOnce(int account, const std::string& kind) {
@@ -47,8 +65,9 @@ double firstAnswerMs(int account, const std::string& daemon) {
     std::string program = daemon;
     char* arguments[] = {program.data(), nullptr};
     pid_t child = 0;
+    const Detached detached;
     const Stopwatch clock;
-    if (posix_spawn(&child, program.c_str(), nullptr, nullptr, arguments, environ) != 0)
+    if (posix_spawn(&child, program.c_str(), detached.actions(), nullptr, arguments, environ) != 0)
         throw std::runtime_error("cannot start " + daemon);
     for (int tries = 0; tries < kMostTries; ++tries) {
         int state = 0;

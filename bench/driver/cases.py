@@ -27,7 +27,7 @@ class Case:
         return "contact" if self.contacts else "task" if self.tasks else "event"
 
     @property
-    def listed(self):
+    def table(self):
         return "contacts" if self.contacts else "todos" if self.tasks else "events"
 
     @property
@@ -104,7 +104,7 @@ class Bench:
                 server.reset()
                 results[work] = device.measure("sync", case.kind)
                 self._note(results[work], device, server)
-            held = device.count(case.listed)
+            held = device.count(case.kind, case.table)
             if held != case.items:
                 raise RuntimeError(f"{case.name}: the device holds {held} items")
             return results

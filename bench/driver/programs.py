@@ -1,13 +1,15 @@
 """The programs that are measured and what they are asked to do. Everything that is started here is ended here."""
+import contextlib
 import json
 import os
 import re
 import shutil
 import signal
+import sqlite3
+import ssl
 import subprocess
 import time
 import urllib.request
-import ssl
 
 BIN = os.path.abspath(os.path.join(os.path.dirname(__file__), "..", "..", "build", "release", "bin"))
 EMAIL = "bench@provider.example"
@@ -84,8 +86,11 @@ class Device:
         with open(f"/proc/{self.pid()}/status") as file:
             return int(re.search(rf"^{name}:\s+(\d+)", file.read(), re.M).group(1))
 
-    def count(self, kind):
-        return len(json.loads(self.tool(kind, "list", "--json")))
+    def count(self, store, table):
+        """Records of the device's store."""
+        path = f"{self.folder}/opt/usr/data/records/{store}.db"
+        with contextlib.closing(sqlite3.connect(f"file:{path}?mode=ro", uri=True)) as database:
+            return database.execute(f"SELECT count(*) FROM {table}").fetchone()[0]
 
     def stop(self):
         self.tool("daemon", "stop")

@@ -51,7 +51,7 @@ def machine():
 
 
 def costs(cases, product, floor, flushes):
-    lines = ["| size | work | wall ms | floor ms | ratio | CPU ms | floor CPU ms | peak MB | requests | connections "
+    lines = ["| size | work | wall ms | floor ms | ratio | CPU ms | floor CPU ms | peak MB | requests | new connections "
              "| fsyncs | floor's |",
              "|---|---|---|---|---|---|---|---|---|---|---|---|"]
     for case in cases:

@@ -1,10 +1,12 @@
 """The tables, in Markdown."""
+import os
 import platform
 import re
 import statistics
 import subprocess
 
 KB_PER_MB = 1024
+_load = ", ".join(f"{value:.1f}" for value in os.getloadavg())
 
 
 def spread(values, digits=0):
@@ -45,15 +47,16 @@ def machine():
     return "\n".join([
         f"- machine: {model.group(1) if model else platform.machine()}, {text.count('processor	:')} processors, {memory} MB, "
         f"Linux {platform.release()}",
+        "- load before the first run (others on the machine): " + _load,
         f"- compiler: {_first_line('g++', '--version')}, preset release (-O2)",
         "- libraries: " + ", ".join(_package(name) for name in packages),
         f"- commit: {commit}"])
 
 
 def costs(cases, product, floor, flushes):
-    lines = ["| size | work | wall ms | floor ms | ratio | CPU ms | floor CPU ms | peak MB | requests | new connections "
+    lines = ["| size | work | wall ms | floor ms | ratio | CPU ms | floor CPU ms | CPU ratio | peak MB | requests | new connections "
              "| fsyncs | floor's |",
-             "|---|---|---|---|---|---|---|---|---|---|---|---|"]
+             "|---|---|---|---|---|---|---|---|---|---|---|---|---|"]
     for case in cases:
         for work in case.works:
             ours, least = product[case], floor[case]
@@ -62,6 +65,7 @@ def costs(cases, product, floor, flushes):
             lines.append(" | ".join([
                 f"| {case.name}", work, spread(values(ours, work, "wallMs")), spread(values(least, work, "wallMs")),
                 f"{ratio:.2f}", f"{median(ours, work, 'cpuMs'):.0f}", f"{median(least, work, 'cpuMs'):.0f}",
+                f"{median(ours, work, 'cpuMs') / median(least, work, 'cpuMs'):.2f}",
                 f"{max(values(ours, work, 'peakKb')) / KB_PER_MB:.1f}", f"{median(ours, work, 'requests'):.0f}",
                 f"{median(ours, work, 'connections'):.0f}", str(both[0][work]) if both else "–",
                 f"{both[1][work]} |" if both else "– |"]))

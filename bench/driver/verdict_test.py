@@ -7,8 +7,8 @@ from main import quick_verdict
 SMALL, LARGE = events(1000), events(5000)
 
 
-def rounds(wall_ms, peak_kb):
-    return [{work: {"wallMs": wall_ms * noise, "peakKb": peak_kb} for work in SMALL.works} for noise in (1, 1.3, 2)]
+def rounds(cpu_ms, peak_kb):
+    return [{work: {"cpuMs": cpu_ms * noise, "peakKb": peak_kb} for work in SMALL.works} for noise in (1, 1.3, 2)]
 
 
 class VerdictTest(unittest.TestCase):

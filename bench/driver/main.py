@@ -75,8 +75,13 @@ def growth(product, small, large, work, what, pick):
 
 
 def limit_rows(product, floor, peers, idle_result):
-    def ratio(case, work, over):
-        return report.median(product[case], work, "wallMs") / report.median(over[case], work, "wallMs")
+    def ratio(case, work, over, what="wallMs"):
+        return report.median(product[case], work, what) / report.median(over[case], work, what)
+
+    def against_floor(case, work, limit):
+        name = case.name if case.uploads else f"{work}, {case.name}"
+        return [(f"{name}, against the floor", ratio(case, work, floor), limit, " times", False),
+                (f"{name}, against the floor, processor time", ratio(case, work, floor, "cpuMs"), limit, " times", False)]
 
     five, two = events(5000), contacts(2000)
     small, large = events(1000), events(20000)
@@ -85,11 +90,11 @@ def limit_rows(product, floor, peers, idle_result):
     for case, work, limit, faster in ((five, "first sync", 2, 1.5), (five, "no changes", 1.3, 4), (two, "first sync", 2.5, 1.5)):
         if case not in product:
             continue
-        rows.append((f"{work}, {case.name}, against the floor", ratio(case, work, floor), limit, " times", False))
+        rows += against_floor(case, work, limit)
         if case in peers:
             rows.append((f"{work}, {case.name}, against the peer", 1 / ratio(case, work, peers), faster, " times as fast", True))
     if upload:
-        rows.append(("1,000 uploads, against the floor", ratio(upload, "uploads", floor), 1.5, " times", False))
+        rows += against_floor(upload, "uploads", 1.5)
     if small in product and large in product:
         for work in ("first sync", "no changes"):
             for what, name in (("wallMs", "time"), ("cpuMs", "processor time")):

@@ -23,7 +23,8 @@ struct Form {
     std::string (*text)(std::size_t);
 };
 
-std::string padded(std::string text, const char* name, std::size_t seed, std::size_t bytes, const char* end) {
+std::string padded(const std::string& text, const char* name, std::size_t seed, std::size_t bytes,
+                   const char* end) {
     const std::size_t used = text.size() + std::string_view(end).size() + std::string_view(name).size() + 3;
     return text + name + ":" + filler(seed, used < bytes ? bytes - used : 0) + "\r\n" + end;
 }

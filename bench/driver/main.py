@@ -138,7 +138,9 @@ def measure_all(bench, chosen, cases):
     print(report.costs(cases, product, floor, flushes))
     if peers:
         print(f"\n{report.peers(list(peers), product, peers, peer.start_ms())}")
-    print(f"\n{report.limits(limit_rows(product, floor, peers, idle_result))}")
+    rows = limit_rows(product, floor, peers, idle_result)
+    if rows:
+        print(f"\n{report.limits(rows)}")
     if idle_result:
         print(f"\nStart to first answer: {report.spread(idle_result['firstAnswerMs'], 1)} ms; get_state: "
               f"{report.spread(idle_result['stateUs'], 1)} µs, the 99th of a hundred {report.spread(idle_result['stateP99Us'], 1)} µs.")

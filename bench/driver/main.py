@@ -22,7 +22,7 @@ def options():
     parser = argparse.ArgumentParser(
         prog="bench/run", formatter_class=argparse.RawDescriptionHelpFormatter,
         description="Measures the daemon beside the least that the same work can cost, and prints Markdown tables.",
-        epilog="examples:\n  bench/run                 all sizes, five runs (about a quarter of an hour)\n"
+        epilog="examples:\n  bench/run                 all sizes, five runs (about seven minutes)\n"
                "  bench/run --peer          also vdirsyncer with as many items\n"
                "  bench/run --quick         1,000 and 5,000 events, 2,000 contacts; exit 1 when the cost of an item grows")
     parser.add_argument("--runs", type=int, help="runs of each (default 5; with --quick 3)")

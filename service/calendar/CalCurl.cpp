@@ -69,6 +69,10 @@ CalCurl::CalCurl(Account* account, IProgressObserver* observer, std::shared_ptr<
     mpTransport->setTimeout(kTimeoutSeconds);
 }
 
+bool CalCurl::isAskedToWait() const {
+    return mpAccount->retryGate(VANTOR_PIM_SYNC_TYPE_CALENDAR).isAskedToWait();
+}
+
 int CalCurl::checked(const char* operation, int result) {
     if (result != kOk) SYNC_ERR_AS(operation, "performCurl fail(%d)", result);
     return result;

@@ -47,7 +47,8 @@ bool CalUploader::hasUnsentDates(const Row& series, calendar_record_h record) {
 }
 
 void CalUploader::sendInstances(Row& series, calendar_record_h record) {
-    if (series.dirty != 0 && hasUnsentDates(series, record) && sendDates(series, record)) {
+    if (series.dirty != 0 && !isParked(series) && hasUnsentDates(series, record) &&
+        sendDates(series, record)) {
         series.dirty = 0;
         if (mpStore->updateItem(series) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
     }
@@ -71,7 +72,7 @@ void CalUploader::sendInstances(Row& series, calendar_record_h record) {
             if (mpStore->updateItem(*row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
             continue;
         }
-        sendInstance(series, intOf(record, mKind.version), *row, child->second);
+        if (!isParked(*row)) sendInstance(series, intOf(record, mKind.version), *row, child->second);
     }
 }
 
@@ -81,6 +82,7 @@ void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, c
     const std::string body = cal_json::convertException2Json(child, series.uri);
     if (body.empty()) {
         UpReply unreadable;
+        unreadable.isForGood = true;
         unreadable.reason = "the instance cannot be written as JSON";
         return fail(row, unreadable);
     }

@@ -21,10 +21,12 @@ constexpr const char* kStoreFails = "the device's stores cannot be written";
 
 }  // namespace
 
-CalUploader::CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* stopQuery, CalBookMetaData book)
+CalUploader::CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* stopQuery, ParkedItems* parked,
+                         CalBookMetaData book)
     : mSide(*side),
       mTask(*task),
       mpStopQuery(stopQuery),
+      mParked(*parked),
       mBook(std::move(book)),
       mKind(side->manager().kind()) {}
 
@@ -43,7 +45,7 @@ int CalUploader::run() {
     }
     for (Row& row : mRows) {
         if (mEnd == End::kAll || isStopped()) break;
-        if (row.deleted != 0) sendDeleted(row);
+        if (row.deleted != 0 && !isParked(row)) sendDeleted(row);
     }
     if (writeBack() != kOk && mResult == kOk) mResult = kFailed;
     return isStopped() ? kStopped : mResult;
@@ -78,6 +80,12 @@ int CalUploader::dropMarks() {
 void CalUploader::fail(const Row& row, const UpReply& reply) {
     SYNC_ERR("%s(%d, %s) could not be sent: %s", mKind.itemName, row.event_id, row.uri.c_str(),
              reply.reason.c_str());
+    if (reply.isForGood) {
+        mParked.park(mKind.itemName, row.event_id, versionToPark(row), reply.reason);
+    } else {
+        mIsInTrouble = true;
+    }
+    if (mTask.isAskedToWait()) mEnd = End::kAll;
     if (mResult != kOk) return;
     mResult = reply.result != kOk ? reply.result : kFailed;
     mFailure = reply.result == kTokenFailed
@@ -115,7 +123,7 @@ int CalUploader::findSentItems() {
         [this] { return isStopped(); });
     if (fetched == kOk) return readRows();
     // Without the list nobody knows, so those items wait; the others go on.
-    mSkipUnconfirmed = true;
+    mSkipUnconfirmed = mIsInTrouble = true;
     mResult = fetched;
     mFailure = std::string(mKind.bookName) + " " + mBook.uri + ": " + mSide.failure();
     if (fetched == kTokenFailed || mSide.unreachable()) mEnd = End::kAll;
@@ -127,7 +135,7 @@ int CalUploader::markAsSent() {
     if (!transaction.begun()) return kFailed;
     for (Row& row : mRows) {
         if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || row.original_event_id != 0) continue;
-        if (row.etag == kUnconfirmedEtag) continue;
+        if (row.etag == kUnconfirmedEtag || isParked(row)) continue;
         Row marked = row;
         marked.etag = kUnconfirmedEtag;
         if (mpStore->updateItem(marked) != kOk) return kFailed;
@@ -169,10 +177,11 @@ void CalUploader::sendItem(Row& row) {
                   mKind.itemName, row.event_id);
         return;
     }
-    if (row.dirty != 0) {
+    if (row.dirty != 0 && !isParked(row)) {
         const std::string body = mKind.build(raw);
         if (body.empty()) {
             UpReply unreadable;
+            unreadable.isForGood = true;
             unreadable.reason = "the record cannot be written as JSON";
             return fail(row, unreadable);
         }
@@ -264,6 +273,7 @@ void CalUploader::sendDeleted(Row& row) {
     const UpReply reply = mTask.remove(mBook.uri, row.uri);
     if (!reply.isRemoved()) return endWith(row, reply, End::kNone);
     ++mSent;
+    mParked.forget(mKind.itemName, row.event_id);
     row.deleted = row.dirty = 0;
     if (mpStore->updateItem(row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
 }
@@ -271,8 +281,10 @@ void CalUploader::sendDeleted(Row& row) {
 void CalUploader::store(Row& row, int version, int expectedVersion, JsonNodePtr item) {
     row.version = version;
     ++mSent;
+    mParked.forget(mKind.itemName, row.event_id);
     if (mpStore->updateItem(row) != kOk) {
         SYNC_ERR("%s", mKind.texts.updateRow);
+        mIsInTrouble = true;
         if (mResult == kOk) mFailure = kStoreFails;
         mResult = kFailed;
         mEnd = End::kAll;

@@ -6,6 +6,7 @@
 
 #include "common/Handles.h"
 #include "common/HeaderText.h"
+#include "common/HttpStatus.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 #include "platform/error.h"
@@ -199,6 +200,10 @@ int HttpTransfer::perform() {
         return resultOf(code);
     }
     curl_easy_getinfo(curl.get(), CURLINFO_RESPONSE_CODE, &status);
+    curl_off_t wait = 0;
+    const bool isBusy = status == http_status::kTooManyRequests || status == http_status::kUnavailable;
+    if (isBusy && curl_easy_getinfo(curl.get(), CURLINFO_RETRY_AFTER, &wait) == CURLE_OK)
+        retryAfter = static_cast<long>(wait);
     const char* type = nullptr;
     if (curl_easy_getinfo(curl.get(), CURLINFO_CONTENT_TYPE, &type) == CURLE_OK && type != nullptr)
         contentType = type;

@@ -57,15 +57,8 @@ void CalUploader::sendInstances(Row& series, calendar_record_h record) {
     if (rows == mInstances.end()) return;
     for (Row* row : rows->second) {
         if (mEnd != End::kNone || isStopped()) return;
-        if (row->event_id <= 0) continue;
+        if (row->dirty == 0 || row->event_id <= 0) continue;
         const auto child = children.find(row->event_id);
-        if (row->dirty == 0) {
-            // An edit of the series came before its record could learn what the server calls the instance.
-            if (child != children.end() && row->uri != series.uri && textOf(child->second, mKind.uid).empty())
-                mSentItems.push_back(
-                    {{row->event_id, intOf(record, mKind.version), row->uri, row->etag}, nullptr});
-            continue;
-        }
         if (child == children.end()) {
             // Taken away again on the device; the server's copy comes back with the next download.
             row->dirty = 0;

@@ -1,4 +1,5 @@
-// The daemon is no nuisance: pauses that a server asks for are kept, what it refuses for good is not sent again and again.
+// The daemon is no nuisance: pauses that a server asks for are kept, what it refuses for good is not sent again and again, and no edit
+// is lost to a page that is on its way.
 #include <gtest/gtest.h>
 
 #include <chrono>
@@ -17,6 +18,10 @@ struct Kind {
     std::function<int(SyncPair&, const std::string& text)> add;
     const char* noun;
     const char* field;
+    const char* list;  // the requests that read items
+    // The items' path for the admin services, and the member that holds the text.
+    std::function<std::string(SyncPair&)> adminPath;
+    std::function<Json(const std::string& text)> body;
 };
 
 void PrintTo(const Kind& kind, std::ostream* out) {
@@ -40,8 +45,17 @@ int addContact(SyncPair& pair, const std::string& text) {
         pair.device.tool({"contact", "add", "--account", "1", "-"}, Json({{"nickname", text}}).dump()));
 }
 
-const Kind kKinds[] = {{"calendar", "/events", addEvent, "event", "summary="},
-                       {"contacts", "contacts/.*/full", addContact, "contact", "nickname="}};
+const Kind kKinds[] = {
+    {"calendar", "/events", addEvent, "event", "summary=", "/events\\?",
+     [](SyncPair& pair) { return "/calendars/" + pathText(pair.firstCalendar(1)) + "/events"; },
+     [](const std::string& text) {
+         return Json({{"summary", text}});
+     }},
+    {"contacts", "contacts/.*/full", addContact, "contact", "nickname=", "contacts/.*/full\\?",
+     [](SyncPair& pair) { return pair.peoplePath(1, "contacts"); },
+     [](const std::string& text) {
+         return Json({{"gContact$nickname", {{"$t", text}}}});
+     }}};
 
 class Polite : public testing::TestWithParam<Kind> {
 protected:
@@ -102,6 +116,40 @@ TEST_P(Polite, APauseThatTheServerAsksForIsKept) {
     EXPECT_EQ(mPair.sync(1).status, 0) << mPair.device.daemonLog();
     EXPECT_EQ(pending(), 0);
     mPair.expectFaultsUsed();
+}
+
+// An edit on the device between the fetch of a page and its write.
+TEST_P(Polite, AnEditWhileAPageIsOnItsWaySurvives) {
+    const std::string path = GetParam().adminPath(mPair);
+    const auto idsOf = [&](const std::string& text) {
+        std::vector<std::string> ids;
+        const Json items = mPair.provider.admin("GET", path)["items"];
+        for (const Json& item : items) {
+            const Json wanted = GetParam().body(text);
+            if (item.value(wanted.begin().key(), Json()) == wanted.begin().value()) ids.push_back(item["id"]);
+        }
+        return ids;
+    };
+    const int id = add("mine");
+    ASSERT_TRUE(eventually([&] { return idsOf("mine").size() == 1; }));
+    for (const char* edited : {"edited once", "edited twice"}) {
+        const std::vector<std::string> ids =
+            idsOf(edited == std::string("edited once") ? "mine" : "edited once");
+        ASSERT_EQ(ids.size(), 1U);
+        mPair.provider.admin("PATCH", path + "/" + ids.front(), GetParam().body("the server's"));
+        mPair.installFault({{"method", "GET"},
+                            {"path", GetParam().list},
+                            {"kind", "delay"},
+                            {"delayMs", 1000},
+                            {"afterHandling", true}});
+        EXPECT_EQ(mPair.device.tool({"sync", "1", GetParam().name}).status, 0);
+        ASSERT_TRUE(eventually([&] { return mPair.provider.admin("GET", "/faults")["faults"].empty(); }));
+        edit(id, edited);
+        EXPECT_TRUE(eventually([&] { return idsOf(edited).size() == 1; })) << mPair.device.daemonLog();
+        EXPECT_TRUE(idsOf("the server's").empty());
+    }
+    EXPECT_EQ(mPair.sync(1).status, 0);
+    mPair.expectQuiet(1);
 }
 
 TEST_P(Polite, AServerInTroubleIsNotAskedAgainAtOnce) {

@@ -1,0 +1,97 @@
+"""A trial at one step: the daemon is disturbed there, comes back, syncs, and is judged."""
+from collections import Counter
+from dataclasses import dataclass, field
+
+from faultlab import checker
+
+SYNCS = 3  # so many may fail before both sides are together: what a run before did not reach comes with the next
+DISTURBED_SYNC_S = 20
+FAILING_SYNC_S = 3  # a tool that waits for a report which the daemon cannot write waits in vain
+THREADS = {"main": "main", "worker": "sync-worker"}
+
+
+@dataclass(frozen=True)
+class Point:
+    scenario: str
+    thread: str
+    at: int
+    action: str = "kill"
+    length: int = 0  # of failing calls; 0 is until healed
+
+    def options(self):
+        return ["--thread", THREADS[self.thread], "--at", str(self.at), "--action", self.action, "--length", str(self.length)]
+
+    def replay(self):
+        text = f"lab/run --scenario {self.scenario} --thread {self.thread} --at {self.at}"
+        if self.action != "kill":
+            text += f" --action {self.action} --length {self.length}"
+        return text + " --keep"
+
+
+@dataclass
+class Outcome:
+    point: Point
+    hit: str = ""  # the call, empty when the run ended before the step
+    problems: list = field(default_factory=list)
+    notes: list = field(default_factory=list)
+
+
+def sync_until_well(device, kind, outcome):
+    """Whether a sync ended well within the tries."""
+    for attempt in range(SYNCS):
+        if not device.is_running():
+            device.start()
+        status, output = device.sync(1, kind)
+        if status == 0:
+            if attempt:
+                outcome.notes.append(f"{attempt} syncs after it failed")
+            return True
+        outcome.notes.append(output.strip())
+    outcome.problems.append(f"no sync ended well: {outcome.notes[-1]}")
+    return False
+
+
+def _disturbed_run(trial, kind, point, outcome):
+    device = trial.device
+    device.start(point.options())
+    if point.action == "kill":
+        device.sync(1, kind, DISTURBED_SYNC_S)
+        if not device.stop():
+            outcome.problems.append("the daemon did not end when it was told to")
+    else:
+        device.sync(1, kind, FAILING_SYNC_S)
+        device.heal()
+    report = device.report()
+    outcome.hit = next((line[4:] for line in report if line.startswith("hit ")), "")
+    signals = [line for line in report if line.startswith("ended signal")]
+    if signals and point.action != "kill":
+        outcome.problems.append(f"the daemon crashed: {signals[0]}")
+    elif point.action != "kill" and not device.is_running():
+        outcome.notes.append("the daemon gave up")
+
+
+def run(trial, scenario, point):
+    outcome = Outcome(point)
+    with trial:
+        _disturbed_run(trial, scenario.kind, point, outcome)
+        if sync_until_well(trial.device, scenario.kind, outcome):
+            outcome.problems += checker.judge(trial.provider, trial.device, {1: trial.history}, [scenario.kind])
+        if outcome.problems:
+            outcome.notes += trial.device.log().splitlines()[-40:]
+    return outcome
+
+
+def count(trial, scenario):
+    """The steps of a run that nobody disturbs: how many each thread has, and which of them can fail."""
+    with trial:
+        trial.device.start([])
+        status, output = trial.device.sync(1, scenario.kind)
+        trial.device.stop()
+        if status != 0:
+            raise RuntimeError(f"{scenario.name} fails undisturbed: {output}")
+        steps = [line.split(" ", 4)[1:] for line in trial.device.report() if line.startswith("step ")]
+    counts = Counter(name for name, *_ in steps)
+    fallible = {thread: [int(number) for name, number, call, what in steps
+                         if name == THREADS[thread] and what.startswith("/") and call not in ("unlink", "chmod", "fchmod")]
+                for thread in THREADS}
+    return {thread: counts[THREADS[thread]] for thread in THREADS}, fallible

@@ -4,7 +4,8 @@
 //   faultpoint --root DIR --report FILE [--thread NAME --at N --action kill|ENOSPC|EIO [--length M]] -- PROGRAM [ARGUMENT...]
 //
 // kill ends the program before the step is carried out. ENOSPC and EIO make M steps that write a file fail, of all threads, beginning
-// with this one; without M all of them until SIGUSR1. FILE tells the program's pid, each step, and the disturbance, a line each.
+// with this one; without M all of them until SIGUSR1. FILE has a line for the program's pid, for each step
+// ("step", thread, number, call, whether it can fail, file), for the disturbance and for the end.
 #include <fcntl.h>
 #include <linux/audit.h>
 #include <linux/filter.h>
@@ -205,14 +206,21 @@ private:
         if (what.empty()) return;
         const std::string name = threadName(thread);
         const long number = ++mCounts[name];
-        std::fprintf(mReport, "step %s %ld %s %s\n", name.c_str(), number, call->name, what.c_str());
+        const bool isFallible = canFail(*call, what);
+        std::fprintf(mReport, "step %s %ld %s %d %s\n", name.c_str(), number, call->name, isFallible ? 1 : 0,
+                     what.c_str());
         if (name == mOptions.thread && number == mOptions.at) begin(*call, what);
-        const bool isFile = what.starts_with('/');
-        if (!mIsFailing || gIsHealed != 0 || !call->canFail || !isFile) return;
+        if (!mIsFailing || gIsHealed != 0 || !isFallible) return;
         registers.orig_rax = static_cast<unsigned long long>(-1);
         registers.rax = static_cast<unsigned long long>(-(mOptions.action == "EIO" ? EIO : ENOSPC));
         ptrace(PTRACE_SETREGS, thread, 0, &registers);
         if (++mFailed == mOptions.length) mIsFailing = false;
+    }
+
+    // A file that is there is opened without a write to the disk.
+    static bool canFail(const Call& call, const std::string& what) {
+        if (!call.canFail || !what.starts_with('/')) return false;
+        return (call.number != SYS_openat && call.number != SYS_open) || !exists(what);
     }
 
     void begin(const Call& call, const std::string& what) {

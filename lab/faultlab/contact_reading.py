@@ -92,6 +92,6 @@ def wire_contact(entry, group_names, photo):
 
 def device_contact(listed, group_names, photo):
     contact = {member: value for member, value in listed.items() if member not in ("id", "account")}
-    contact["groups"] = [group_names[group] for group in listed["groups"]]
+    contact["groups"] = [group_names.get(group, f"no group {group}") for group in listed["groups"]]
     contact["photo"] = _digest(photo)
     return _canonical(contact)

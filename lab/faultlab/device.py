@@ -1,4 +1,5 @@
 """A device of its own below a root folder: the tool, and the daemon, alone or under the tracer."""
+import contextlib
 import json
 import os
 import pathlib
@@ -93,16 +94,20 @@ class Device:
         """Ends the disturbance of a daemon that is traced."""
         self._daemon.send_signal(signal.SIGUSR1)
 
+    def _signal(self, number):
+        with contextlib.suppress(ProcessLookupError):  # ended a moment ago
+            os.kill(self.pid(), number)
+
     def kill(self):
         if self.is_running():
-            os.kill(self.pid(), signal.SIGKILL)
-        self.wait_for_end()
+            self._signal(signal.SIGKILL)
+            self.wait_for_end()
 
     def stop(self, timeout=20):
         """Ends it as a service manager would; false when it had to be killed."""
         if not self.is_running():
             return True
-        os.kill(self.pid(), signal.SIGTERM)
+        self._signal(signal.SIGTERM)
         return self.wait_for_end(timeout)
 
     def wait_for_end(self, timeout=20):
@@ -110,7 +115,7 @@ class Device:
             self._daemon.wait(timeout)
             return True
         except subprocess.TimeoutExpired:
-            os.kill(self.pid(), signal.SIGKILL)
+            self._signal(signal.SIGKILL)
             self._daemon.wait()
             return False
 

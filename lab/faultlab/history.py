@@ -21,8 +21,9 @@ class History:
         """Another write of the laboratory went over it, or was on its way to."""
         self._writes.pop(text, None)
 
-    def __len__(self):
-        return len(self._writes)
+    def texts(self, ending):
+        """Of what must be there, the texts that end so."""
+        return [text for text, (state, _) in self._writes.items() if state == "there" and text.endswith(ending)]
 
     def problems(self, side, items, log):
         problems = []
@@ -31,7 +32,7 @@ class History:
             expected = 1 if state == "there" else 0
             if count == expected or self._is_explained(uid, log):
                 continue
-            problems.append(f"history: {text!r} should be {state}, and is {count} times on the {side}")
+            problems.append(f"history: {text!r} of {uid or 'an item'} should be {state}, and is {count} times on the {side}")
         return problems
 
     @staticmethod

@@ -21,6 +21,9 @@ class Point:
     def options(self):
         return ["--thread", THREADS[self.thread], "--at", str(self.at), "--action", self.action, "--length", str(self.length)]
 
+    def folder(self):
+        return f"kept-{self.scenario}-{self.thread}-{self.at}-{self.action}-{self.length}"
+
     def replay(self):
         text = f"lab/run --scenario {self.scenario} --thread {self.thread} --at {self.at}"
         if self.action != "kill":
@@ -44,7 +47,7 @@ def sync_until_well(device, kind, outcome):
         status, output = device.sync(1, kind)
         if status == 0:
             if attempt:
-                outcome.notes.append(f"{attempt} syncs after it failed")
+                outcome.notes.append(f"{attempt} syncs failed after it")
             return True
         outcome.notes.append(output.strip())
     outcome.problems.append(f"no sync ended well: {outcome.notes[-1]}")
@@ -75,7 +78,7 @@ def run(trial, scenario, point):
     with trial:
         _disturbed_run(trial, scenario.kind, point, outcome)
         if sync_until_well(trial.device, scenario.kind, outcome):
-            outcome.problems += checker.judge(trial.provider, trial.device, {1: trial.history}, [scenario.kind])
+            outcome.problems += checker.judge(trial.provider, trial.device, {1: trial.history}, [scenario.kind], outcome.notes)
         if outcome.problems:
             outcome.notes += trial.device.log().splitlines()[-40:]
     return outcome
@@ -89,9 +92,8 @@ def count(trial, scenario):
         trial.device.stop()
         if status != 0:
             raise RuntimeError(f"{scenario.name} fails undisturbed: {output}")
-        steps = [line.split(" ", 4)[1:] for line in trial.device.report() if line.startswith("step ")]
+        steps = [line.split(" ", 5)[1:] for line in trial.device.report() if line.startswith("step ")]
     counts = Counter(name for name, *_ in steps)
-    fallible = {thread: [int(number) for name, number, call, what in steps
-                         if name == THREADS[thread] and what.startswith("/") and call not in ("unlink", "chmod", "fchmod")]
-                for thread in THREADS}
+    fallible = {thread: [int(number) for name, number, _, can_fail, _ in steps
+                         if name == THREADS[thread] and can_fail == "1"] for thread in THREADS}
     return {thread: counts[THREADS[thread]] for thread in THREADS}, fallible

@@ -1,5 +1,6 @@
 """Trials side by side: each worker has a folder in memory, a port of its own, and its own copy of the prepared states."""
 import concurrent.futures
+import functools
 import os
 import pathlib
 import shutil
@@ -7,6 +8,7 @@ import tempfile
 import traceback
 
 from faultlab import paths, points
+from faultlab.device import Device
 from faultlab.provider import free_port
 from faultlab.scenarios import SCENARIOS, Trial
 
@@ -25,6 +27,11 @@ class _Worker:
             scenario.prepare(prepared, self.port)
         return Trial(prepared, self.folder / "trial", self.port)
 
+    def fresh_device(self):
+        shutil.rmtree(self.folder / "trial", ignore_errors=True)
+        (self.folder / "trial").mkdir(parents=True)
+        return Device(self.folder / "trial")
+
 
 def _begin(folder, keep):
     global _worker
@@ -35,14 +42,22 @@ def _count(name):
     return points.count(_worker.trial(SCENARIOS[name]), SCENARIOS[name])
 
 
-def _run(point):
+def _trial_at_step(worker, point):
     scenario = SCENARIOS[point.scenario]
+    return points.run(worker.trial(scenario), scenario, point)
+
+
+def _run(function, job):
+    return function(_worker, job)
+
+
+def _run_trial(function, job):
     try:
-        outcome = points.run(_worker.trial(scenario), scenario, point)
-    except Exception:  # a trial that broke is a trial that did not survive
-        outcome = points.Outcome(point, "", [traceback.format_exc()])
+        outcome = function(_worker, job)
+    except Exception as failure:  # a trial that broke is a trial that did not survive
+        outcome = points.Outcome(job, "", [f"the trial broke: {failure!r}"], [traceback.format_exc()])
     if outcome.problems and _worker.keep:
-        kept = _worker.folder.parent / f"kept-{point.scenario}-{point.thread}-{point.at}-{point.action}-{point.length}"
+        kept = _worker.folder.parent / job.folder()
         paths.replace_folder(_worker.folder / "trial", kept)
         outcome.notes.append(f"kept in {kept}")
     return outcome
@@ -68,7 +83,12 @@ class Pool:
         return self._executor.submit(_count, name).result()
 
     def run(self, all_points):
-        yield from self._executor.map(_run, all_points)
+        return self.trials(_trial_at_step, all_points)
 
-    def call(self, function, *arguments):
-        return self._executor.submit(function, *arguments)
+    def trials(self, function, jobs):
+        """The outcomes of `function(worker, job)`, in the jobs' order."""
+        yield from self._executor.map(functools.partial(_run_trial, function), jobs)
+
+    def each(self, function, jobs):
+        """The results of `function(worker, job)`."""
+        yield from self._executor.map(functools.partial(_run, function), jobs)

@@ -12,7 +12,7 @@ from faultlab import paths
 def free_port():
     """Below the range that the kernel gives to outgoing connections, so that it stays free between two providers."""
     while True:
-        port = random.randrange(15000, 32000)
+        port = random.SystemRandom().randrange(15000, 32000)  # workers share their seed
         with socket.socket() as probe:
             try:
                 probe.bind(("127.0.0.1", port))

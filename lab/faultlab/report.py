@@ -12,6 +12,12 @@ def _shape(problem):
     return re.sub(r"'[^']*'|\d+|/\S+", "…", problem)[:90]
 
 
+def _disturbance(action, length):
+    if length:
+        return f"{action}, {length} calls"
+    return f"{action} until healed" if action in ("ENOSPC", "EIO") else action
+
+
 class _Row:
     def __init__(self):
         self.tried = self.hit = self.survived = 0
@@ -29,7 +35,7 @@ class Table:
         row.tried += 1
         row.hit += bool(outcome.hit)
         row.survived += not outcome.problems
-        row.again += any("syncs after it failed" in note for note in outcome.notes)
+        row.again += any("after one more sync" in note or "syncs failed after it" in note for note in outcome.notes)
         row.last_hits[outcome.point] = bool(outcome.hit)
         if outcome.problems:
             self._failed.append(outcome)
@@ -51,9 +57,7 @@ class Table:
         print("|---|---|---|---|---|---|---|")
         total = _Row()
         for (name, thread, action, length), row in self._rows.items():
-            what = action if action in ("kill", "") or length else f"{action} until healed"
-            what = f"{action}, {length} calls" if length else what
-            print(f"| {name} | {thread} | {what} | {row.tried} | {row.hit} | {row.survived} | {row.again} |")
+            print(f"| {name} | {thread} | {_disturbance(action, length)} | {row.tried} | {row.hit} | {row.survived} | {row.again} |")
             total.tried += row.tried
             total.hit += row.hit
             total.survived += row.survived

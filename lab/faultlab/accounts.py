@@ -139,7 +139,7 @@ def trial_of(worker, case):
                 histories = _end_token((provider, device, histories), outcome)
             else:
                 _settle(device, list(histories), outcome)
-            outcome.problems += checker.judge(provider, device, histories, ["calendar", "contacts"], outcome.notes)
+            outcome.problems += checker.judge(provider, device, histories, ["calendar", "contacts"])
         finally:
             device.kill()
     return outcome

@@ -113,7 +113,8 @@ def quiet_problems(provider, device, numbers, kinds):
     return problems
 
 
-def differences(provider, device, histories, kinds):
+def judge(provider, device, histories, kinds):
+    """All breaches of the claim; empty when it holds. `histories` has one for each account's number."""
     problems = []
     log = device.log()
     for number, history in histories.items():
@@ -122,18 +123,4 @@ def differences(provider, device, histories, kinds):
         found += history.problems("server", sides.wire_text, log)
         found += history.problems("device", sides.device_text, log)
         problems += [f"account {number}: {problem}" for problem in found]
-    return problems
-
-
-def judge(provider, device, histories, kinds, notes):
-    """All breaches of the claim; empty when it holds. `histories` has one for each account's number.
-
-    What one sync sends may come back changed with the next (a group's deletion moves its contacts), so a difference counts when
-    it is still there after one more sync; that this was needed goes into `notes`."""
-    problems = differences(provider, device, histories, kinds)
-    if problems:
-        notes.append(f"after one more sync: {problems}")
-        for number in histories:
-            device.sync(number)
-        problems = differences(provider, device, histories, kinds)
     return problems + quiet_problems(provider, device, list(histories), kinds)

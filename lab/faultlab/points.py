@@ -4,7 +4,7 @@ from dataclasses import dataclass, field
 
 from faultlab import checker
 
-SYNCS = 3  # so many may fail before both sides are together: what a run before did not reach comes with the next
+SYNCS = 4  # after the disturbance, for quiet: a failed one, one that sends, one that sees what became of it, and one more
 DISTURBED_SYNC_S = 20
 FAILING_SYNC_S = 3  # a tool that waits for a report which the daemon cannot write waits in vain
 THREADS = {"main": "main", "worker": "sync-worker"}
@@ -37,20 +37,23 @@ class Outcome:
     hit: str = ""  # the call, empty when the run ended before the step
     problems: list = field(default_factory=list)
     notes: list = field(default_factory=list)
+    failed_syncs: int = 0  # after the disturbance was over
 
 
-def sync_until_well(device, kind, outcome):
-    """Whether a sync ended well within the tries."""
-    for attempt in range(SYNCS):
+def sync_until_quiet(trial, kind, outcome):
+    """Whether a sync ended well and sent nothing, within the tries."""
+    device, provider = trial.device, trial.provider
+    for _ in range(SYNCS):
         if not device.is_running():
             device.start()
+        provider.forget_requests()
         status, output = device.sync(1, kind)
-        if status == 0:
-            if attempt:
-                outcome.notes.append(f"{attempt} syncs failed after it")
+        if status == 0 and not provider.writes():
             return True
-        outcome.notes.append(output.strip())
-    outcome.problems.append(f"no sync ended well: {outcome.notes[-1]}")
+        if status != 0:
+            outcome.failed_syncs += 1
+            outcome.notes.append(output.strip())
+    outcome.problems.append(f"{SYNCS} syncs did not come to rest: {'; '.join(outcome.notes)}")
     return False
 
 
@@ -77,8 +80,8 @@ def run(trial, scenario, point):
     outcome = Outcome(point)
     with trial:
         _disturbed_run(trial, scenario.kind, point, outcome)
-        if sync_until_well(trial.device, scenario.kind, outcome):
-            outcome.problems += checker.judge(trial.provider, trial.device, {1: trial.history}, [scenario.kind], outcome.notes)
+        if sync_until_quiet(trial, scenario.kind, outcome):
+            outcome.problems += checker.judge(trial.provider, trial.device, {1: trial.history}, [scenario.kind])
         if outcome.problems:
             outcome.notes += trial.device.log().splitlines()[-40:]
     return outcome

@@ -5,6 +5,7 @@ import random
 import threading
 import time
 from dataclasses import dataclass
+from typing import NamedTuple
 
 from faultlab import account, checker, points
 from faultlab.device import ToolFailed
@@ -158,6 +159,11 @@ class ServerEditor(Editor):
             raise
 
 
+class Both(NamedTuple):
+    device: object
+    provider: object
+
+
 def _kill_at_random(device, chance, kills):
     for _ in range(kills):
         if not device.is_running():
@@ -192,9 +198,8 @@ def trial_of(worker, run):
                 editor.join()
                 if editor.failure:
                     outcome.problems.append(f"an edit failed: {editor.failure!r}")
-            for _ in range(2):  # what one sync sends may come back with the next
-                points.sync_until_well(device, "all", outcome)
-            outcome.problems += checker.judge(provider, device, {1: history}, ["calendar", "contacts"], outcome.notes)
+            points.sync_until_quiet(Both(device, provider), "all", outcome)
+            outcome.problems += checker.judge(provider, device, {1: history}, ["calendar", "contacts"])
         finally:
             device.kill()
     return outcome

@@ -72,8 +72,8 @@ def trial_of(worker, request):
         if trial.provider.admin("GET", "/faults")["faults"]:
             outcome.hit = ""
         trial.provider.admin("DELETE", "/faults")
-        if points.sync_until_well(trial.device, scenario.kind, outcome):
-            outcome.problems += checker.judge(trial.provider, trial.device, {1: trial.history}, [scenario.kind], outcome.notes)
+        if points.sync_until_quiet(trial, scenario.kind, outcome):
+            outcome.problems += checker.judge(trial.provider, trial.device, {1: trial.history}, [scenario.kind])
     return outcome
 
 

@@ -21,7 +21,7 @@ def _disturbance(action, length):
 class _Row:
     def __init__(self):
         self.tried = self.hit = self.survived = 0
-        self.again = 0  # needed more than one sync
+        self.again = 0  # a sync failed although the disturbance was over
         self.last_hits = {}
 
 
@@ -35,7 +35,7 @@ class Table:
         row.tried += 1
         row.hit += bool(outcome.hit)
         row.survived += not outcome.problems
-        row.again += any("after one more sync" in note or "syncs failed after it" in note for note in outcome.notes)
+        row.again += outcome.failed_syncs > 0
         row.last_hits[outcome.point] = bool(outcome.hit)
         if outcome.problems:
             self._failed.append(outcome)
@@ -53,7 +53,7 @@ class Table:
         return bool(self._failed) or not self._rows
 
     def show(self, seconds):
-        print("| scenario | thread | disturbance | tried | met | survived | needed a further sync |")
+        print("| scenario | thread | disturbance | tried | met | survived | a sync failed after it |")
         print("|---|---|---|---|---|---|---|")
         total = _Row()
         for (name, thread, action, length), row in self._rows.items():

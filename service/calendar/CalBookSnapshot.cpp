@@ -168,6 +168,12 @@ bool CalBookSnapshot::hasChangedInstance(int seriesEventId) const {
     return false;
 }
 
+bool CalBookSnapshot::isBehindRow(const CalEventMetaData& row) const {
+    const CalRecordState* state = record(row.event_id);
+    return state != nullptr && (state->etag != row.etag || state->uid != row.uri) && !hasLocalChange(row) &&
+           !hasUnseenChange(row);
+}
+
 bool CalBookSnapshot::hasUnseenChange(const CalEventMetaData& row) const {
     const CalRecordState* state = record(row.event_id);
     return state != nullptr && state->version > std::max(row.version, state->syncedVersion);

@@ -88,7 +88,7 @@ private:
             planned.row = newRow(entry);
             planned.rowWrite = RowWrite::kReplaceLost;
             if (!convertJson2Record(entry, "json parse fail", &planned.record)) return;
-        } else if (row.etag == entry.etag) {
+        } else if (row.etag == entry.etag && !mSnapshot.isBehindRow(row)) {
             return;
         } else if (mSnapshot.hasLocalChange(row)) {
             SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName,
@@ -215,7 +215,8 @@ private:
     bool planKnownInstance(const CalListInfo& entry, const ExceptionInfo& info, const CalEventMetaData& known,
                            PlannedInstance* planned) const {
         const bool lost = known.event_id > 0 && mSnapshot.isLost(known);
-        if (!lost && known.etag == entry.etag && known.uri == entry.id) return false;
+        if (!lost && known.etag == entry.etag && known.uri == entry.id && !mSnapshot.isBehindRow(known))
+            return false;
         planned->rowWrite = RowWrite::kUpdate;
         if (mSnapshot.hasLocalChange(known)) {
             SYNC_ERR("event(%s) was changed on both sides, the device's change wins", entry.id.c_str());
@@ -262,7 +263,8 @@ private:
 
 bool needsContent(const CalListInfo& entry, const CalBookSnapshot& snapshot) {
     if (const CalEventMetaData* row = snapshot.rowByUri(entry.id)) {
-        return snapshot.isLost(*row) || (row->etag != entry.etag && !snapshot.hasLocalChange(*row));
+        return snapshot.isLost(*row) || snapshot.isBehindRow(*row) ||
+               (row->etag != entry.etag && !snapshot.hasLocalChange(*row));
     }
     const int orphan = snapshot.orphan(entry.id);
     const CalRecordState* state = orphan != 0 ? snapshot.record(orphan) : nullptr;

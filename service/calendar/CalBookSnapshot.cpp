@@ -97,6 +97,7 @@ void CalBookSnapshot::readUnconfirmed() {
         const CalendarRecord record(raw);
         // The version comes with the content: an edit after this look is still to be found.
         mRecords[row.event_id].version = intOf(raw, mKind.version);
+        mRecords[row.event_id].hasDates = mKind.hasSeries() && !textOf(raw, CALENDAR_EVENT_EXDATE).empty();
         mUnconfirmed.emplace(mKind.comparable(raw), i);
     }
 }

@@ -21,6 +21,7 @@ struct CalRecordState {
     std::string uid;
     std::string etag;  // as stored with the sync's own last write
     std::string recurrenceId;
+    bool hasDates = false;  // cancelled instances; known of an item that may have reached the server
 
     [[nodiscard]] bool isEnginesOwnWrite() const { return syncedVersion != 0 && syncedVersion == version; }
 };

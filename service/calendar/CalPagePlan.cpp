@@ -119,7 +119,8 @@ private:
         planned.row = sent;
         planned.row.uri = entry->id;
         planned.row.etag = entry->etag;
-        planned.row.dirty = 0;
+        // Cancelled instances go up after their series, and were not part of what was sent.
+        planned.row.dirty = mSnapshot.record(sent.event_id)->hasDates ? 1 : 0;
         planned.row.version = mSnapshot.record(sent.event_id)->version;
         planned.rowWrite = RowWrite::kUpdate;
         planned.ownWrite = false;

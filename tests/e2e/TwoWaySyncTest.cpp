@@ -220,6 +220,20 @@ TEST_F(TwoWay, AKilledDaemonSendsNothingTwice) {
     EXPECT_EQ(eventsNamed("Meeting").size(), 1U);
 }
 
+TEST_F(TwoWay, ASeriesWhoseAnswerWasLostStillSendsItsCancelledDays) {
+    run({"daemon", "stop"});
+    const std::string series = std::to_string(add("event", mBook, kDaily));
+    run({"event", "delete", series, "--instance", "20260604T080000Z"});
+    run({"event", "set", series, "--instance", "20260605T080000Z", "summary=Late"});
+    mPair.installFault({{"method", "POST"}, {"path", "events$"}, {"kind", "reset"}, {"afterHandling", true}});
+    run({"daemon", "start"});
+    EXPECT_TRUE(eventually([&] { return mPair.provider.admin("GET", "/faults")["faults"].empty(); }));
+    EXPECT_TRUE(eventually([&] { return mPair.device.sync(1).status == 0; })) << mPair.device.daemonLog();
+    expectSameAndQuiet();
+    EXPECT_EQ(eventsNamed("Daily").size(), 1U);
+    EXPECT_EQ(eventsNamed("Late").size(), 1U);
+}
+
 TEST_F(TwoWay, AnEditDuringARevokedAuthorisationGoesUpAfterIt) {
     const std::string email = mPair.provider.accounts().at(0).email;
     mPair.provider.admin("POST", "/tokens/revoke", {{"email", email}});

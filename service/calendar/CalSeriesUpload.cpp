@@ -85,6 +85,9 @@ void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, c
         return removeGone(row, version);
     }
     if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
+    if (hasOwnUri && !row.etag.empty() && before.etag != row.etag) {
+        SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName, uri.c_str());
+    }
     std::string etag = before.etag;
     JsonNodePtr item;
     if (!update(row, uri, body, &etag, &item)) return;

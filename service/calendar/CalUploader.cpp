@@ -202,6 +202,10 @@ void CalUploader::updateItem(Row& row, calendar_record_h record, const std::stri
     const UpReply before = mTask.getEtag(mBook.uri, row.uri);
     if (before.answer == UpAnswer::kGone) return removeGone(row, version);
     if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
+    if (!row.etag.empty() && before.etag != row.etag) {
+        SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName,
+                 row.uri.c_str());
+    }
     JsonNodePtr item;
     if (!update(row, row.uri, body, &row.etag, &item)) return;
     row.dirty = hasUnsentDates(row, record) ? 1 : 0;

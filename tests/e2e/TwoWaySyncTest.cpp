@@ -234,6 +234,29 @@ TEST_F(TwoWay, ASeriesWhoseAnswerWasLostStillSendsItsCancelledDays) {
     EXPECT_EQ(eventsNamed("Late").size(), 1U);
 }
 
+TEST_F(TwoWay, AnEditThatGoesOverAnUnseenOneIsNamedInTheLog) {
+    const std::string series = std::to_string(add("event", mBook, kDaily));
+    run({"event", "set", series, "--instance", "20260605T080000Z", "summary=Late"});
+    expectSoon("the instance", [&] { return eventsNamed("Late").size() == 1; });
+    expectSameAndQuiet();
+    run({"daemon", "stop"});
+    const std::string path = "/calendars/" + pathText(mCalendar) + "/events/";
+    for (const char* summary : {"Daily", "Late"}) {
+        const std::string id = eventsNamed(summary).at(0)["id"];
+        mPair.provider.admin("PATCH", path + id, {{"location", "the server's"}});
+    }
+    run({"event", "set", series, "location=the device's"});
+    run({"event", "set", series, "--instance", "20260605T080000Z", "location=the device's"});
+    run({"daemon", "start"});
+    expectSameAndQuiet();
+    for (const char* summary : {"Daily", "Late"}) {
+        const Json event = eventsNamed(summary).at(0);
+        EXPECT_EQ(event["location"], "the device's");
+        EXPECT_THAT(mPair.device.daemonLog(), testing::HasSubstr("event(" + event["id"].get<std::string>() +
+                                                                 ") was changed on both sides"));
+    }
+}
+
 TEST_F(TwoWay, AnEditDuringARevokedAuthorisationGoesUpAfterIt) {
     const std::string email = mPair.provider.accounts().at(0).email;
     mPair.provider.admin("POST", "/tokens/revoke", {{"email", email}});

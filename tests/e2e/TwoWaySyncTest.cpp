@@ -234,6 +234,24 @@ TEST_F(TwoWay, ASeriesWhoseAnswerWasLostStillSendsItsCancelledDays) {
     EXPECT_EQ(eventsNamed("Late").size(), 1U);
 }
 
+TEST_F(TwoWay, AnInstanceEditedWhileItsSeriesWaitsForItsUploadIsSentToo) {
+    const std::string before = std::to_string(add("event", mBook, kMeeting));
+    const std::string series = std::to_string(add("event", mBook, kDaily));
+    expectSoon("the series", [&] { return eventsNamed("Daily").size() == 1; });
+    expectSameAndQuiet();
+    mPair.provider.admin("POST", "/hold", {{"method", "PATCH"}, {"path", "events/"}});
+    run({"daemon", "stop"});
+    run({"event", "set", before, "location=Room 2"});
+    run({"event", "set", series, "location=Room 2"});
+    run({"daemon", "start"});
+    mPair.provider.admin("GET", "/hold?atLeast=1&timeoutMs=5000");
+    // The changes have been looked for, the series has not been read yet.
+    run({"event", "set", series, "--instance", "20260605T080000Z", "summary=Late"});
+    mPair.provider.admin("POST", "/release");
+    expectSoon("the instance", [&] { return eventsNamed("Late").size() == 1; });
+    expectSameAndQuiet();
+}
+
 TEST_F(TwoWay, AnEditThatGoesOverAnUnseenOneIsNamedInTheLog) {
     const std::string series = std::to_string(add("event", mBook, kDaily));
     run({"event", "set", series, "--instance", "20260605T080000Z", "summary=Late"});

@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <cctype>
+#include <charconv>
+#include <cstdint>
 #include <pugixml.hpp>
 
 #include "FeedNames.h"
@@ -95,6 +97,12 @@ Json elementJson(pugi::xml_node node, int depth) {
     return out;
 }
 
+// Whether XML has a character of this code.
+bool isCharacter(std::uint32_t code) {
+    return code == '\t' || code == '\n' || code == '\r' || (code >= 0x20 && code <= 0xD7FF) ||
+           (code >= 0xE000 && code <= 0xFFFD) || (code >= 0x10000 && code <= 0x10FFFF);
+}
+
 // Whether an ampersand begins a reference that every reader knows.
 bool isReference(std::string_view rest) {
     const std::string_view name = rest.substr(0, std::min(rest.find(';'), rest.size()));
@@ -105,9 +113,10 @@ bool isReference(std::string_view rest) {
     if (name.size() < 2 || name[0] != '#') return false;
     const bool isHex = name[1] == 'x';
     const std::string_view digits = name.substr(isHex ? 2 : 1);
-    return !digits.empty() && std::all_of(digits.begin(), digits.end(), [isHex](unsigned char c) {
-        return isHex ? std::isxdigit(c) != 0 : std::isdigit(c) != 0;
-    });
+    std::uint32_t code = 0;
+    const auto [end, error] =
+        std::from_chars(digits.data(), digits.data() + digits.size(), code, isHex ? 16 : 10);
+    return error == std::errc() && end == digits.data() + digits.size() && isCharacter(code);
 }
 
 // What the parser lets pass although it is not well formed.

@@ -1,6 +1,7 @@
 // The calling side: blocking, with a deadline.
 #include <poll.h>
 #include <sys/socket.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -84,6 +85,10 @@ int pims_ipc_create(const char* path, pims_ipc_h* ipc) {
     if (path == nullptr || ipc == nullptr) return PLATFORM_ERROR_INVALID_PARAMETER;
     sockaddr_un address{};
     if (!platform::ipc::addressOf(path, &address)) return PLATFORM_ERROR_INVALID_PARAMETER;
+    // What is called here is given secrets: a link that somebody put in the socket's place is not followed.
+    struct stat info {};
+    if (lstat(address.sun_path, &info) == 0 && !S_ISSOCK(info.st_mode))
+        return PLATFORM_ERROR_PERMISSION_DENIED;
     const int fd = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
     if (fd == -1) return PLATFORM_ERROR_IO;
     if (connect(fd, reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0) {

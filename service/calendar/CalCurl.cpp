@@ -22,7 +22,6 @@ namespace {
 constexpr long kTimeoutSeconds = 60;
 constexpr int kMaxAttempts = 5;
 constexpr long kUnauthorized = 401;
-constexpr size_t kMaxInflatedBytes = 256UL * 1024 * 1024;
 constexpr const char* kCalendars = "/calendar/v3/calendars/";
 constexpr const char* kLists = "/tasks/v1/lists/";
 // The service takes updates of tasks under another prefix than everything else.
@@ -68,6 +67,10 @@ bool isGzip(const std::string& body) {
 CalCurl::CalCurl(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share)
     : mpAccount(account), mpTransport(std::make_unique<SyncCurl>(account, observer, std::move(share))) {
     mpTransport->setTimeout(kTimeoutSeconds);
+}
+
+bool CalCurl::isAskedToWait() const {
+    return mpAccount->retryGate(VANTOR_PIM_SYNC_TYPE_CALENDAR).isAskedToWait();
 }
 
 int CalCurl::checked(const char* operation, int result) {
@@ -161,7 +164,7 @@ int CalCurl::performCurlCompress(const std::string& path, const char* method, co
     }
     if (response == nullptr) return result;
     std::string inflated;
-    if (inflateGzip(reply, &inflated, kMaxInflatedBytes) != kOk) {
+    if (inflateGzip(reply, &inflated, HttpTransfer::kMaxReplyBytes) != kOk) {
         SYNC_ERR("fail");
         return kFailed;
     }
@@ -228,8 +231,13 @@ int inflateGzip(const std::string& body, std::string* out, size_t maxBytes) {
     const size_t length = stream.total_out;
     if (inflateEnd(&stream) != Z_OK || code != Z_STREAM_END) return kFailed;
     text.resize(length);
-    // What follows a zero byte is no text.
-    text.resize(std::min(length, text.find('\0') == std::string::npos ? length : text.find('\0')));
+    // A text ends at its first zero byte. More than zeros behind it is a broken reply; cut there, a list could prove a deletion.
+    const size_t end = std::min(length, text.find('\0'));
+    if (text.find_first_not_of('\0', end) != std::string::npos) {
+        SYNC_ERR("the server's answer goes on after a zero byte, it is not taken");
+        return kFailed;
+    }
+    text.resize(end);
     *out = std::move(text);
     return kOk;
 }

@@ -35,6 +35,8 @@ public:
 
     // HTTP status of the last attempt, 0 when there was no reply.
     [[nodiscard]] long lastHttpStatus() const { return mHttpStatus; }
+    // Whether the server has asked for a pause: whatever is sent before its end is refused.
+    [[nodiscard]] bool isAskedToWait() const;
 
 private:
     enum class Decision { kStop, kRetry };

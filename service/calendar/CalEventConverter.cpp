@@ -119,14 +119,14 @@ int parseAttendees(JsonArray* attendees, calendar_record_h record, bool* selfDec
 int parseReminders(JsonArray* overrides, calendar_record_h record) {
     for (guint i = 0; i < json_array_get_length(overrides); ++i) {
         JsonObject* reminder = json_access::objectIn(json_array_get_element(overrides, i));
-        const std::optional<int64_t> minutes = json_access::integer(reminder, "minutes");
-        if (!minutes || *minutes < 0 || *minutes > INT32_MAX) {
+        const std::optional<int> minutes = json_access::number(reminder, "minutes");
+        if (!minutes || *minutes < 0) {
             SYNC_ERR("get minutes fail");
             continue;
         }
         const bool added =
             addChild(_calendar_alarm, CALENDAR_EVENT_ALARMS, record, [&](calendar_record_h child) {
-                return setInt(child, CALENDAR_ALARM_TICK, static_cast<int>(*minutes)) &&
+                return setInt(child, CALENDAR_ALARM_TICK, *minutes) &&
                        setInt(child, CALENDAR_ALARM_TICK_UNIT, cal_mapping::kTickUnitMinutes);
             });
         if (!added) {
@@ -216,7 +216,7 @@ int CalJsonParser::checkException(JsonObject* event, ExceptionInfo* out) {
     info.kind = json_access::textOr(event, "status", "") == "cancelled" ? ExceptionKind::kCancelled
                                                                         : ExceptionKind::kModified;
     info.seriesUri = json_access::textOr(event, "recurringEventId", "");
-    info.sequence = static_cast<int>(json_access::integer(event, "sequence").value_or(0));
+    info.sequence = json_access::number(event, "sequence").value_or(0);
     *out = std::move(info);
     return kOk;
 }

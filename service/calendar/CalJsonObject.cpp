@@ -2,6 +2,7 @@
 
 #include <memory>
 
+#include "common/JsonText.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 
@@ -83,5 +84,5 @@ bool CalJsonObject::hasMember(const char* name) const {
 }
 
 std::string CalJsonObject::getJsonString() const {
-    return Text(json_to_string(mpNode.get(), FALSE)).get();
+    return json_text::textOf(mpNode.get());
 }

@@ -2,6 +2,7 @@
 
 #include <cstdlib>
 
+#include "common/HeaderText.h"
 #include "common/JsonAccess.h"
 #include "common/JsonText.h"
 #include "common/SyncLog.h"
@@ -95,8 +96,8 @@ int CalJsonParser::checkData() const {
     if (error == nullptr) return 0;
     SYNC_ERR("Has error return");
     int code = 0;
-    if (const std::optional<int64_t> number = json_access::integer(error, "code")) {
-        code = static_cast<int>(*number);
+    if (const std::optional<int> number = json_access::number(error, "code")) {
+        code = *number;
     } else {
         constexpr int kDecimal = 10;
         code =
@@ -108,7 +109,7 @@ int CalJsonParser::checkData() const {
 
 int CalJsonParser::getAccessToken(std::string* token) const {
     const std::string found = json_access::textOr(json_access::objectIn(mpRoot.get()), "access_token", "");
-    if (found.empty()) {
+    if (found.empty() || !header_text::isValid(found)) {
         SYNC_ERR("don't have token");
         return kFailed;
     }

@@ -1,7 +1,7 @@
 #include "calendar/CalRecurrence.h"
 
+#include <charconv>
 #include <cstdio>
-#include <cstdlib>
 #include <string>
 
 #include "calendar/CalMappings.h"
@@ -24,18 +24,27 @@ bool setInt(calendar_record_h record, unsigned property, int value) {
     return calendar_record_set_int(record, property, value) == PLATFORM_ERROR_NONE;
 }
 
+// Nothing when the value begins with no number, or with one that an int cannot hold.
+std::optional<int> numberIn(const std::string& value) {
+    int number = 0;
+    const bool isRead = std::from_chars(value.data(), value.data() + value.size(), number).ec == std::errc();
+    return isRead ? std::optional(number) : std::nullopt;
+}
+
 bool setFrequency(calendar_record_h record, const std::string& value) {
     return setInt(record, CALENDAR_EVENT_FREQ,
                   cal_mapping::valueOf(cal_mapping::kFrequency, value).value_or(0));
 }
 
 bool setCount(calendar_record_h record, const std::string& value) {
-    return setInt(record, CALENDAR_EVENT_RANGE_TYPE, cal_mapping::kRangeCount) &&
-           setInt(record, CALENDAR_EVENT_COUNT, std::atoi(value.c_str()));
+    const std::optional<int> count = numberIn(value);
+    return count && setInt(record, CALENDAR_EVENT_RANGE_TYPE, cal_mapping::kRangeCount) &&
+           setInt(record, CALENDAR_EVENT_COUNT, *count);
 }
 
 bool setInterval(calendar_record_h record, const std::string& value) {
-    return setInt(record, CALENDAR_EVENT_INTERVAL, std::atoi(value.c_str()));
+    const std::optional<int> interval = numberIn(value);
+    return interval && setInt(record, CALENDAR_EVENT_INTERVAL, *interval);
 }
 
 bool setWeekStart(calendar_record_h record, const std::string& value) {

@@ -63,7 +63,8 @@ int CalUploader::seenVersion(const Row& row, calendar_record_h record) {
 }
 
 void CalUploader::sendInstances(Row& series, calendar_record_h record) {
-    if (series.dirty != 0 && hasUnsentDates(series, record) && sendDates(series, record)) {
+    if (series.dirty != 0 && !isParked(series) && hasUnsentDates(series, record) &&
+        sendDates(series, record)) {
         series.dirty = 0;
         if (mpStore->updateItem(series) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
     }
@@ -80,7 +81,7 @@ void CalUploader::sendInstances(Row& series, calendar_record_h record) {
             if (mpStore->updateItem(*row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
             continue;
         }
-        sendInstance(series, seenVersion(series, record), *row, child->second);
+        if (!isParked(*row)) sendInstance(series, seenVersion(series, record), *row, child->second);
     }
 }
 
@@ -90,6 +91,7 @@ void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, c
     const std::string body = cal_json::convertException2Json(child, series.uri);
     if (body.empty()) {
         UpReply unreadable;
+        unreadable.isForGood = true;
         unreadable.reason = "the instance cannot be written as JSON";
         return fail(row, unreadable);
     }

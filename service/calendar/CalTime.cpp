@@ -1,5 +1,6 @@
 #include "calendar/CalTime.h"
 
+#include <chrono>
 #include <cstdio>
 #include <cstdlib>
 #include <unordered_map>
@@ -17,6 +18,9 @@ namespace cal_time {
 namespace {
 
 constexpr double kMsPerSecond = 1000.0;
+// The years 1 to 9999: texts have four digits for one.
+constexpr int64_t kFirstSecond = -62'135'596'800;
+constexpr int64_t kLastSecond = 253'402'300'799;
 constexpr const char* kUnknownZone = "Etc/Unknown";
 
 // An ICU calendar for `zone`, opened once per thread. Opening one is far dearer than a conversion.
@@ -61,8 +65,11 @@ std::optional<calendar_time_s> instant(const WallTime& time, const std::string& 
 
 bool isPlausible(const WallTime& time) {
     const auto within = [](int value, int low, int high) { return value >= low && value <= high; };
-    return within(time.year, 0, 9999) && within(time.month, 1, 12) && within(time.day, 1, 31) &&
-           within(time.hour, 0, 24) && within(time.minute, 0, 59) && within(time.second, 0, 60);
+    if (!within(time.year, 0, 9999) || !within(time.month, 1, 12) || !within(time.day, 1, 31)) return false;
+    const std::chrono::year_month_day date{std::chrono::year(time.year),
+                                           std::chrono::month(static_cast<unsigned>(time.month)),
+                                           std::chrono::day(static_cast<unsigned>(time.day))};
+    return date.ok() && within(time.hour, 0, 24) && within(time.minute, 0, 59) && within(time.second, 0, 60);
 }
 
 std::optional<calendar_time_s> parseDateTime(const std::string& text, const std::string& timeZone) {
@@ -97,7 +104,9 @@ std::optional<int64_t> toSeconds(const WallTime& time, const char* zone, int fir
                      &error);
     const UDate milliseconds = ucal_getMillis(calendar, &error);
     if (U_FAILURE(error)) return std::nullopt;
-    return static_cast<int64_t>(milliseconds / kMsPerSecond);
+    const auto seconds = static_cast<int64_t>(milliseconds / kMsPerSecond);
+    if (seconds < kFirstSecond || seconds > kLastSecond) return std::nullopt;
+    return seconds;
 }
 
 // The wall time of an instant in GMT.

@@ -21,7 +21,8 @@ struct WallTime {
     int second = 0;
 };
 
-// The instant of a wall time in a zone. NULL: "tzid is NULL so set gmt" is logged. An unknown zone counts as GMT.
+// The instant of a wall time in a zone, nothing outside the years 1 to 9999. NULL: "tzid is NULL so set gmt" is logged. An unknown
+// zone counts as GMT.
 // `firstDayOfWeek` 1..7 is set on the calendar, other values are not.
 [[nodiscard]] std::optional<int64_t> toSeconds(const WallTime& time, const char* zone,
                                                int firstDayOfWeek = 0);

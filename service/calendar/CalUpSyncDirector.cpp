@@ -24,10 +24,11 @@ int CalUpSyncDirector::onProgress(double, double, double, double) {
 
 int CalUpSyncDirector::run() {
     mFailure.clear();
-    mMustEnd = false;
+    mMustEnd = mIsInTrouble = false;
     const int calendars = syncCalendar();
     if (calendars == kStopped || calendars == kTokenFailed || mMustEnd) return calendars;
     const int tasks = syncTodo();
+    if (calendars == kOk && tasks == kOk) mFailure = mParked.summary();
     return tasks == kStopped || tasks == kTokenFailed || calendars == kOk ? tasks : calendars;
 }
 
@@ -45,7 +46,7 @@ int CalUpSyncDirector::syncBooks(CalSyncSide& side, CalUpSyncTask& task) {
         CalBookMetaData book;
         if (isStopped()) return kStopped;
         if (store->books().get(calendarId, &book) != kOk) continue;
-        CalUploader uploader(&side, &task, mpStopQuery, book);
+        CalUploader uploader(&side, &task, mpStopQuery, &mParked, book);
         const int result = uploader.run();
         if (uploader.sent() > 0) {
             SYNC_INFO("%s(%s): %d changes sent", manager.kind().bookName, book.uri.c_str(), uploader.sent());
@@ -53,6 +54,7 @@ int CalUpSyncDirector::syncBooks(CalSyncSide& side, CalUpSyncTask& task) {
         if (result == kStopped) return kStopped;
         if (result == kOk) continue;
         if (mFailure.empty()) mFailure = uploader.failure();
+        mIsInTrouble = mIsInTrouble || uploader.isInTrouble();
         if (result == kTokenFailed) return result;
         if (first == kOk) first = result;
         mMustEnd = uploader.mustEnd();

@@ -7,6 +7,7 @@
 
 #include "calendar/CalSyncSide.h"
 #include "calendar/CalUpSyncTasks.h"
+#include "common/ParkedItems.h"
 #include "common/SyncCurl.h"
 #include "common/SyncDirector.h"
 
@@ -19,6 +20,8 @@ public:
 
     int run() override;
     [[nodiscard]] std::string lastFailure() const override { return mFailure; }
+    [[nodiscard]] bool isInTrouble() const override { return mIsInTrouble; }
+    void forgetRefusals() override { mParked.clear(); }
 
     [[nodiscard]] int syncCalendar() { return syncBooks(mEvents, mEventTask); }
     [[nodiscard]] int syncTodo() { return syncBooks(mTodos, mTodoTask); }
@@ -35,6 +38,8 @@ private:
     CalTodoSide mTodos;
     CalUpSyncEventTask mEventTask;
     CalUpSyncTodoTask mTodoTask;
+    ParkedItems mParked;
     bool mMustEnd = false;  // the server is out of reach
-    std::string mFailure;   // worker thread while a run is going on, main thread after it
+    bool mIsInTrouble = false;
+    std::string mFailure;  // worker thread while a run is going on, main thread after it
 };

@@ -50,6 +50,7 @@ UpReply CalUpSyncTask::judge(int result, const std::string& body) {
         SYNC_ERR("setString fail");
     }
     reply.answer = answerOf(status);
+    reply.isForGood = http_status::isRefusedForGood(status);
     if (isRead && reply.answer == UpAnswer::kAccepted && !reply.uri.empty()) reply.item = parser.copyRoot();
     reply.isCancelled = isRead && json_access::textOr(parser.root(), "status", "") == "cancelled";
     if (reply.answer != UpAnswer::kAccepted) {

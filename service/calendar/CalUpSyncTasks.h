@@ -25,6 +25,7 @@ struct UpReply {
     bool isCancelled = false;           // the answer says so of the item
     JsonNodePtr item;                   // the item as the server has it now, where the answer is one
     std::string reason;                 // for people, of what was not accepted
+    bool isForGood = false;             // a refusal that holds as long as the item stays as it is
 
     // Whether an item that was to be deleted is gone for good.
     [[nodiscard]] bool isRemoved() const {
@@ -40,6 +41,8 @@ public:
     [[nodiscard]] UpReply insert(const std::string& bookUri, const std::string& body);
     [[nodiscard]] UpReply update(const std::string& bookUri, const std::string& uri, const std::string& body);
     [[nodiscard]] UpReply remove(const std::string& bookUri, const std::string& uri);
+
+    [[nodiscard]] bool isAskedToWait() const { return mCurl.isAskedToWait(); }
 
 protected:
     // The service's requests.

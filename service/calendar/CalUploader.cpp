@@ -21,10 +21,12 @@ constexpr const char* kStoreFails = "the device's stores cannot be written";
 
 }  // namespace
 
-CalUploader::CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* stopQuery, CalBookMetaData book)
+CalUploader::CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* stopQuery, ParkedItems* parked,
+                         CalBookMetaData book)
     : mSide(*side),
       mTask(*task),
       mpStopQuery(stopQuery),
+      mParked(*parked),
       mBook(std::move(book)),
       mKind(side->manager().kind()) {}
 
@@ -43,7 +45,7 @@ int CalUploader::run() {
     }
     for (Row& row : mRows) {
         if (mEnd == End::kAll || isStopped()) break;
-        if (row.deleted != 0) sendDeleted(row);
+        if (row.deleted != 0 && !isParked(row)) sendDeleted(row);
     }
     if (writeBack() != kOk && mResult == kOk) mResult = kFailed;
     return isStopped() ? kStopped : mResult;
@@ -78,6 +80,12 @@ int CalUploader::dropMarks() {
 void CalUploader::fail(const Row& row, const UpReply& reply) {
     SYNC_ERR("%s(%d, %s) could not be sent: %s", mKind.itemName, row.event_id, row.uri.c_str(),
              reply.reason.c_str());
+    if (reply.isForGood) {
+        mParked.park(mKind.itemName, row.event_id, versionToPark(row), reply.reason);
+    } else {
+        mIsInTrouble = true;
+    }
+    if (mTask.isAskedToWait()) mEnd = End::kAll;
     if (mResult != kOk) return;
     mResult = reply.result != kOk ? reply.result : kFailed;
     mFailure = reply.result == kTokenFailed
@@ -115,7 +123,7 @@ int CalUploader::findSentItems() {
         [this] { return isStopped(); });
     if (fetched == kOk) return readRows();
     // Without the list nobody knows, so those items wait; the others go on.
-    mSkipUnconfirmed = true;
+    mSkipUnconfirmed = mIsInTrouble = true;
     mResult = fetched;
     mFailure = std::string(mKind.bookName) + " " + mBook.uri + ": " + mSide.failure();
     if (fetched == kTokenFailed || mSide.unreachable()) mEnd = End::kAll;
@@ -127,7 +135,7 @@ int CalUploader::markAsSent() {
     if (!transaction.begun()) return kFailed;
     for (Row& row : mRows) {
         if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || row.original_event_id != 0) continue;
-        if (row.etag == kUnconfirmedEtag) continue;
+        if (row.etag == kUnconfirmedEtag || isParked(row)) continue;
         Row marked = row;
         marked.etag = kUnconfirmedEtag;
         if (mpStore->updateItem(marked) != kOk) return kFailed;
@@ -162,10 +170,18 @@ void CalUploader::sendItem(Row& row) {
         return;
     }
     const CalendarRecord record(raw);
-    if (row.dirty != 0) {
+    const int version = intOf(raw, mKind.version);
+    // What goes up now counts as seen, with all instances: those of a later edit must be marked before. That edit asks for a run itself.
+    if (mKind.hasSeries() && version != row.version && version != intOf(raw, mKind.syncedVersion)) {
+        SYNC_INFO("%s(%d) was edited again, it waits for the next look at the device's changes",
+                  mKind.itemName, row.event_id);
+        return;
+    }
+    if (row.dirty != 0 && !isParked(row)) {
         const std::string body = mKind.build(raw);
         if (body.empty()) {
             UpReply unreadable;
+            unreadable.isForGood = true;
             unreadable.reason = "the record cannot be written as JSON";
             return fail(row, unreadable);
         }
@@ -260,6 +276,7 @@ void CalUploader::sendDeleted(Row& row) {
     const UpReply reply = mTask.remove(mBook.uri, row.uri);
     if (!reply.isRemoved()) return endWith(row, reply, End::kNone);
     ++mSent;
+    mParked.forget(mKind.itemName, row.event_id);
     row.deleted = row.dirty = 0;
     if (mpStore->updateItem(row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
 }
@@ -267,14 +284,30 @@ void CalUploader::sendDeleted(Row& row) {
 void CalUploader::store(Row& row, int version, int expectedVersion, JsonNodePtr item) {
     row.version = version;
     ++mSent;
+    mParked.forget(mKind.itemName, row.event_id);
     if (mpStore->updateItem(row) != kOk) {
         SYNC_ERR("%s", mKind.texts.updateRow);
+        mIsInTrouble = true;
         if (mResult == kOk) mFailure = kStoreFails;
         mResult = kFailed;
         mEnd = End::kAll;
         return;
     }
     mSentItems.push_back({{row.event_id, expectedVersion, row.uri, row.etag}, std::move(item)});
+}
+
+// An edit of a series, or of an instance of it, was in the way: without etags the rows differ from the list, and the next download takes
+// what the server has.
+int CalUploader::forgetEtags(const std::set<int>& items) {
+    if (items.empty()) return kOk;
+    SyncTransaction transaction(mpStore->database());
+    if (!transaction.begun()) return kFailed;
+    for (Row& row : mRows) {
+        if (!items.contains(row.event_id)) continue;
+        row.etag.clear();
+        if (mpStore->updateItem(row) != kOk) return kFailed;
+    }
+    return transaction.commit();
 }
 
 // The records learn what the server calls them, so that they can be recognised without their rows.
@@ -285,12 +318,16 @@ int CalUploader::writeBack() {
         SYNC_ERR("get svc fail");
         return kFailed;
     }
+    std::set<int> left;
     for (const Sent& sent : mSentItems) {
-        if (!::writeBack(mKind, sent.record, jsonObjectOf(sent.item))) return kFailed;
+        bool isLeft = false;
+        if (!::writeBack(mKind, sent.record, jsonObjectOf(sent.item), &isLeft)) return kFailed;
+        if (isLeft) left.insert(sent.record.itemId);
     }
     if (!transaction.commit()) {
         SYNC_ERR("get svc fail");
         return kFailed;
     }
+    if (forgetEtags(left) != kOk) return kFailed;
     return mSide.manager().passOwnWrites(mBook.calendar_id);
 }

@@ -8,18 +8,21 @@
 
 #include <list>
 #include <map>
+#include <set>
 #include <string>
 #include <vector>
 
 #include "calendar/CalSyncSide.h"
 #include "calendar/CalUpSyncTasks.h"
 #include "calendar/CalWriteBack.h"
+#include "common/ParkedItems.h"
 #include "common/SyncDirector.h"
 
 class CalUploader {
 public:
     // Nothing is owned; `stopQuery` may be NULL.
-    CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* stopQuery, CalBookMetaData book);
+    CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* stopQuery, ParkedItems* parked,
+                CalBookMetaData book);
 
     // 0, 1 when stopped, -5, or -1 with failure(). What could be sent was sent.
     [[nodiscard]] int run();
@@ -28,6 +31,8 @@ public:
     // Whether the run of the account ends here.
     [[nodiscard]] bool mustEnd() const { return mEnd == End::kAll; }
     [[nodiscard]] int sent() const { return mSent; }
+    // Whether a failure was the server's or the network's, not that of single items.
+    [[nodiscard]] bool isInTrouble() const { return mIsInTrouble; }
 
 private:
     enum class End { kNone, kDirtyOfBook, kAll };
@@ -39,6 +44,13 @@ private:
     };
 
     [[nodiscard]] bool isStopped() const { return mpStopQuery != nullptr && mpStopQuery->isStopped(); }
+    // A deletion is a change of its own, also of an item whose last edit was refused.
+    [[nodiscard]] static int versionToPark(const Row& row) {
+        return row.deleted != 0 ? -1 - row.version : row.version;
+    }
+    [[nodiscard]] bool isParked(const Row& row) const {
+        return mParked.isParked(mKind.itemName, row.event_id, versionToPark(row));
+    }
     void fail(const Row& row, const UpReply& reply);
     void endWith(const Row& row, const UpReply& reply, End end);
     [[nodiscard]] int readRows();
@@ -61,6 +73,7 @@ private:
     void store(Row& row, int version, int expectedVersion, JsonNodePtr item);
     // The records learn what the server calls them.
     [[nodiscard]] int writeBack();
+    [[nodiscard]] int forgetEtags(const std::set<int>& items);
 
     // --- instances of a series
     void sendInstances(Row& series, calendar_record_h record);
@@ -77,6 +90,7 @@ private:
     CalSyncSide& mSide;
     CalUpSyncTask& mTask;
     IStopQuery* const mpStopQuery;
+    ParkedItems& mParked;
     const CalBookMetaData mBook;
     const CalItemKind& mKind;
     CalItemStore* mpStore = nullptr;
@@ -86,6 +100,7 @@ private:
     std::vector<Sent> mSentItems;
     bool mSkipUnconfirmed = false;
     End mEnd = End::kNone;
+    bool mIsInTrouble = false;
     int mResult = sync_result::kOk;
     int mSent = 0;
     std::string mFailure;

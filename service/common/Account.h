@@ -3,9 +3,11 @@
 // loop and two workers share an account.
 #pragma once
 
+#include <array>
 #include <mutex>
 #include <string>
 
+#include "common/RetryGate.h"
 #include "common/vantor_pim_sync.h"
 
 class Account {
@@ -41,6 +43,8 @@ public:
     // first whether the token is still the one that the server refused.
     std::mutex& refreshMutex() { return mRefreshMutex; }
 
+    [[nodiscard]] RetryGate& retryGate(vantor_pim_sync_type_e type) { return mRetryGates[type]; }
+
 private:
     struct Fields {
         int accountId = 0;
@@ -66,4 +70,5 @@ private:
     mutable std::mutex mMutex;
     Fields mFields;  // guarded by mMutex
     std::mutex mRefreshMutex;
+    std::array<RetryGate, 2> mRetryGates;  // by type
 };

@@ -1,6 +1,8 @@
 #include "common/AccountDBHelper.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <cstdio>
@@ -8,6 +10,7 @@
 #include <cstring>
 #include <vector>
 
+#include "common/Handles.h"
 #include "common/SyncLog.h"
 #include "platform/root.h"
 
@@ -75,6 +78,25 @@ using RecordPtr = std::unique_ptr<vantor_pim_sync_account_s, FreeRecord>;
 
 RecordPtr newRecord() {
     return RecordPtr(static_cast<vantor_pim_sync_account_s*>(calloc(1, sizeof(vantor_pim_sync_account_s))));
+}
+
+using File = std::unique_ptr<FILE, FreeWith<fclose>>;
+
+// The token file, never through a link; NULL with errno when it is none. *info is what was opened, whatever lay there before.
+File openToken(const char* path, struct stat* info) {
+    constexpr off_t kMaxTokenBytes = 64 * 1024;
+    const int fd = open(path, O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC);
+    File file(fd != -1 ? fdopen(fd, "rb") : nullptr);
+    if (!file) {
+        if (fd != -1) close(fd);
+        return nullptr;
+    }
+    if (fstat(fd, info) != 0) return nullptr;
+    if (!S_ISREG(info->st_mode) || info->st_size > kMaxTokenBytes) {
+        file.reset();
+        errno = EINVAL;
+    }
+    return file;
 }
 
 }  // namespace
@@ -220,17 +242,15 @@ int AccountDBHelper::getSecureKey(int accountId, std::string* key) {
     snprintf(path, sizeof path, "%s%s", platform::rootedPath(kTrustedFolder).c_str(), name);
     // The reasons of our own have an error number too, so that the log never says "Success".
     struct stat info {};
-    int error = stat(path, &info) != 0 ? errno : 0;
+    int error = lstat(path, &info) != 0 ? errno : 0;
     if (error == 0 && info.st_size < 1) error = ENODATA;
     if (error != 0) {
         SYNC_ERR("stat(%s) failed : %s", path, strerror(error));
         return kFailed;
     }
-    constexpr off_t kMaxTokenBytes = 64 * 1024;
-    const bool isToken = S_ISREG(info.st_mode) && info.st_size <= kMaxTokenBytes;
-    const std::unique_ptr<FILE, int (*)(FILE*)> file(isToken ? fopen(path, "re") : nullptr, fclose);
+    const File file = openToken(path, &info);
     if (!file) {
-        SYNC_ERR("fopen(%s) failed : %s", path, strerror(isToken ? errno : EINVAL));
+        SYNC_ERR("fopen(%s) failed : %s", path, strerror(errno));
         return kFailed;
     }
     std::string content(static_cast<size_t>(info.st_size), '\0');

@@ -17,6 +17,10 @@ void DirectedSyncAgent::setDirectors(std::unique_ptr<SyncDirector> down, std::un
     mpUpDirector = std::move(up);
 }
 
+void DirectedSyncAgent::forgetRefusals() {
+    mpUpDirector->forgetRefusals();
+}
+
 int DirectedSyncAgent::doUpSync() {
     const int result = mpWorker->start(mpUpDirector.get(), this);
     if (result != kOk) onRequestsDropped();
@@ -33,6 +37,7 @@ int DirectedSyncAgent::doStop() {
 
 void DirectedSyncAgent::onSyncCompleted(SyncDirector* director, int result) {
     noteHalf(isDown(director), result, director->lastFailure());
+    noteServer(result, director->isInTrouble());
     if (result == kTokenFailed) onRequestsDropped();
     // Reserved before the run is ended, so that both halves are one visible sync.
     if (isDown(director) && result == kOk && hasSomethingToSend()) (void)startUpSync();

@@ -24,6 +24,7 @@ protected:
     [[nodiscard]] SyncWorker* worker() { return mpWorker.get(); }
     // A run did not begin, was told to stop or lost its authorisation: an up sync that was asked for meanwhile may not come.
     virtual void onRequestsDropped() {}
+    void forgetRefusals() override;
 
 private:
     void onSyncCompleted(SyncDirector* director, int result) override;

@@ -5,6 +5,8 @@
 #include <string_view>
 
 #include "common/Handles.h"
+#include "common/HeaderText.h"
+#include "common/HttpStatus.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 #include "platform/error.h"
@@ -172,6 +174,10 @@ int HttpTransfer::perform() {
     }
     CurlList list;
     for (const std::string& header : headers) {
+        if (!header_text::isValid(header)) {
+            SYNC_ERR("a header of the request would not stay on its line, nothing is sent");
+            return kFailed;
+        }
         curl_slist* longer = curl_slist_append(list.get(), header.c_str());
         if (longer == nullptr) return kFailed;
         (void)list.release();
@@ -194,6 +200,10 @@ int HttpTransfer::perform() {
         return resultOf(code);
     }
     curl_easy_getinfo(curl.get(), CURLINFO_RESPONSE_CODE, &status);
+    curl_off_t wait = 0;
+    const bool isBusy = status == http_status::kTooManyRequests || status == http_status::kUnavailable;
+    if (isBusy && curl_easy_getinfo(curl.get(), CURLINFO_RETRY_AFTER, &wait) == CURLE_OK)
+        retryAfter = static_cast<long>(wait);
     const char* type = nullptr;
     if (curl_easy_getinfo(curl.get(), CURLINFO_CONTENT_TYPE, &type) == CURLE_OK && type != nullptr)
         contentType = type;

@@ -50,6 +50,7 @@ struct HttpTransfer {
 
     long status = 0;               // of the answer, 0 without one
     std::string contentType = {};  // likewise
+    long retryAfter = 0;           // seconds that an answer 429 or 503 asks to wait, 0 when it does not say
 
     // 0 for any HTTP status, else -1, -2 (aborted by the observer) or -3 (time-out). A request that writes goes to the wire once.
     [[nodiscard]] int perform();

@@ -3,6 +3,7 @@
 
 #include <json-glib/json-glib.h>
 
+#include <climits>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -47,6 +48,13 @@ inline std::optional<int64_t> integer(JsonObject* parent, const char* name) {
     JsonNode* node = member(parent, name);
     if (!holds(node, G_TYPE_INT64)) return std::nullopt;
     return json_node_get_int(node);
+}
+
+// Absent as well when an int cannot hold it.
+inline std::optional<int> number(JsonObject* parent, const char* name) {
+    const std::optional<int64_t> value = integer(parent, name);
+    if (!value || *value < INT_MIN || *value > INT_MAX) return std::nullopt;
+    return static_cast<int>(*value);
 }
 
 // Only `true` is true.

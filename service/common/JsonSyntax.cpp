@@ -3,6 +3,9 @@
 #include <glib.h>
 
 #include <algorithm>
+#include <charconv>
+#include <cmath>
+#include <string>
 
 namespace json_syntax {
 
@@ -10,7 +13,7 @@ namespace {
 
 class Checker {
 public:
-    explicit Checker(std::string_view text) : mRest(text) {}
+    Checker(std::string_view text, std::vector<size_t>* lone) : mText(text), mRest(text), mpLone(lone) {}
 
     bool document() {
         skipSpace();
@@ -97,8 +100,33 @@ private:
         constexpr size_t kHexDigits = 4;
         if (mRest.size() < kHexDigits) return false;
         const std::string_view digits = mRest.substr(0, kHexDigits);
+        if (digits.find_first_not_of("0123456789abcdefABCDEF") != std::string_view::npos) return false;
+        noteSurrogate(digits);
         mRest.remove_prefix(kHexDigits);
-        return digits.find_first_not_of("0123456789abcdefABCDEF") == std::string_view::npos;
+        return true;
+    }
+
+    // With `digits`, of an escape that is one, still at the front of the rest.
+    void noteSurrogate(std::string_view digits) {
+        constexpr size_t kEscapeLength = sizeof("\\uD83D") - 1;
+        const auto isHalf = [](std::string_view half, std::string_view thirds) {
+            return (half[0] == 'd' || half[0] == 'D') && thirds.find(half[1]) != std::string_view::npos;
+        };
+        constexpr std::string_view kHigh = "89abAB";
+        constexpr std::string_view kLow = "cdefCDEF";
+        const auto at = static_cast<size_t>(digits.data() - mText.data()) - 2;
+        if (isHalf(digits, kLow)) {
+            if (mHighEnd != at) mpLone->push_back(at);
+        } else if (isHalf(digits, kHigh)) {
+            const std::string_view next = mText.substr(at + kEscapeLength, kEscapeLength);
+            const bool isPair =
+                next.size() == kEscapeLength && next.starts_with("\\u") && isHalf(next.substr(2), kLow);
+            if (isPair) {
+                mHighEnd = at + kEscapeLength;
+            } else {
+                mpLone->push_back(at);
+            }
+        }
     }
 
     bool digits() {
@@ -108,25 +136,42 @@ private:
     }
 
     bool number() {
+        const std::string_view from = mRest;
+        bool isInteger = true;
         take('-');
         if (!take('0') && !digits()) return false;
-        if (take('.') && !digits()) return false;
-        if (take('e') || take('E')) {
-            if (!take('+')) take('-');
-            return digits();
+        if (take('.')) {
+            isInteger = false;
+            if (!digits()) return false;
         }
-        return true;
+        if (take('e') || take('E')) {
+            isInteger = false;
+            if (!take('+')) take('-');
+            if (!digits()) return false;
+        }
+        return isHeld(from.substr(0, from.size() - mRest.size()), isInteger);
     }
 
+    // The parser makes another number, or none, of what its types cannot hold.
+    static bool isHeld(std::string_view number, bool isInteger) {
+        int64_t value = 0;
+        if (isInteger)
+            return std::from_chars(number.data(), number.data() + number.size(), value).ec == std::errc();
+        return std::isfinite(g_ascii_strtod(std::string(number).c_str(), nullptr));
+    }
+
+    const std::string_view mText;
     std::string_view mRest;
+    std::vector<size_t>* const mpLone;
+    size_t mHighEnd = 0;  // where the second half of a pair has to begin
 };
 
 }  // namespace
 
-bool isValid(std::string_view text) {
+bool isValid(std::string_view text, std::vector<size_t>* lone) {
     // A zero byte inside is no valid UTF-8 here either.
     return g_utf8_validate(text.data(), static_cast<gssize>(text.size()), nullptr) != FALSE &&
-           Checker(text).document();
+           Checker(text, lone).document();
 }
 
 }  // namespace json_syntax

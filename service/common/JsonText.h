@@ -8,7 +8,7 @@
 
 namespace json_text {
 
-// NULL when the text is no JSON to the letter or nested too deeply.
+// NULL when the text is no JSON to the letter or nested too deeply. Half a surrogate pair is read as U+FFFD.
 [[nodiscard]] JsonNodePtr parse(std::string_view text);
 [[nodiscard]] std::string textOf(JsonNode* node);
 

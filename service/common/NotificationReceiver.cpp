@@ -94,10 +94,10 @@ void NotificationReceiver::subscribe() {
     initialize();
     if (mNotificationWd == -1) {
         const std::string path = platform::rootedPath(mPath);
-        mNotificationWd = inotify_add_watch(mINotifyFd, path.c_str(), IN_ACCESS);
+        mNotificationWd = inotify_add_watch(mINotifyFd, path.c_str(), IN_ACCESS | IN_DONT_FOLLOW);
         SYNC_ASSERT(mNotificationWd != -1);
         // Replaces the mask: from here on only the closing of a written file is told.
-        const int ret = inotify_add_watch(mINotifyFd, path.c_str(), IN_CLOSE_WRITE);
+        const int ret = inotify_add_watch(mINotifyFd, path.c_str(), IN_CLOSE_WRITE | IN_DONT_FOLLOW);
         SYNC_ASSERT(ret == mNotificationWd);
     }
     mSubscribed.push_back(this);

@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <ctime>
+#include <utility>
 
 #include "common/Account.h"
 #include "common/AccountDBHelper.h"
@@ -54,6 +55,7 @@ SyncAgent::SyncAgent(Account* account, vantor_pim_sync_type_e type)
 
 SyncAgent::~SyncAgent() {
     for (const guint source : mIdleSources) g_source_remove(source);
+    if (mPauseSource != 0) g_source_remove(mPauseSource);
     mpAccount = nullptr;
     mState = SYNC_AGENT_STATE_NONE;
     mOperation = 0;
@@ -83,6 +85,12 @@ void SyncAgent::setState(int newState) {
 
 int SyncAgent::startSync() {
     const AgentLock lock(&mMutex);
+    mpAccount->retryGate(getType()).open();
+    mMustForgetRefusals = true;
+    return startSyncWithoutLock();
+}
+
+int SyncAgent::startSyncWithoutLock() {
     if (mState == SYNC_AGENT_STATE_IN_PROGRESS) return kFailed;
     if (mState != SYNC_AGENT_STATE_READY) {
         SYNC_ERR("The sync agent isn't available");
@@ -99,12 +107,30 @@ int SyncAgent::startSync() {
 
 int SyncAgent::startUpSync() {
     const AgentLock lock(&mMutex);
-    return startUpSyncWithoutLock();
+    return mustWait() ? kFailed : startUpSyncWithoutLock();
 }
 
 bool SyncAgent::requestUpSync() {
     const AgentLock lock(&mMutex);
-    return startUpSyncWithoutLock() == kOk || mIsUpSyncReserved;
+    return mustWait() || startUpSyncWithoutLock() == kOk || mIsUpSyncReserved;
+}
+
+bool SyncAgent::mustWait() {
+    const int seconds = mpAccount->retryGate(getType()).secondsLeft();
+    if (seconds <= 0) return false;
+    if (mPauseSource == 0)
+        mPauseSource = g_timeout_add_seconds(static_cast<guint>(seconds), onPauseOver, this);
+    return true;
+}
+
+gboolean SyncAgent::onPauseOver(gpointer data) {
+    auto* agent = static_cast<SyncAgent*>(data);
+    {
+        const AgentLock lock(&agent->mMutex);
+        agent->mPauseSource = 0;
+    }
+    agent->sendWhatWaits();
+    return FALSE;
 }
 
 int SyncAgent::startUpSyncWithoutLock() {
@@ -204,6 +230,7 @@ int SyncAgent::continueWithoutLock(int result) {
         return startDownSyncWithoutLock();
     }
     if (result == kOk && finished == SYNC_OPERATION_DOWN_SYNC) updateSyncTime();
+    if (mustWait()) mIsUpSyncReserved = false;
     if (mIsUpSyncReserved) {
         if (finished != SYNC_OPERATION_DOWN_SYNC) setState(SYNC_AGENT_STATE_READY);
         mOperation = SYNC_OPERATION_IDLE;
@@ -232,13 +259,17 @@ int SyncAgent::addIdleRequest(SyncAgentOperation operation) {
 gboolean SyncAgent::onIdleRequest(gpointer data) {
     const IdleRequest request = *static_cast<IdleRequest*>(data);
     SyncAgent* agent = request.agent;
+    bool mustForget = false;
     {
         const AgentLock lock(&agent->mMutex);
         agent->mIdleSources.erase(request.source);
+        if (request.operation == SYNC_AGENT_OPERATION_UP_SYNC)
+            mustForget = std::exchange(agent->mMustForgetRefusals, false);
     }
     int result = kFailed;
     switch (request.operation) {
         case SYNC_AGENT_OPERATION_UP_SYNC:
+            if (mustForget) agent->forgetRefusals();
             result = agent->doUpSync();
             break;
         case SYNC_AGENT_OPERATION_DOWN_SYNC:
@@ -301,7 +332,12 @@ void SyncAgent::onSchedule() {
     }
     if (autoSync == 0) return;
     if (mpAccount->getRoaming() == 0 && is_roaming_zone() != 0) return;
-    (void)startSync();
+    if (const int seconds = mpAccount->retryGate(getType()).secondsLeft(); seconds > 0) {
+        SYNC_INFO("the scheduled sync is left out, the server is left alone for %d more seconds", seconds);
+        return;
+    }
+    const AgentLock lock(&mMutex);
+    (void)startSyncWithoutLock();
 }
 
 void SyncAgent::makeAvailable() {
@@ -315,6 +351,16 @@ void SyncAgent::makeAvailable() {
 
 void SyncAgent::sendWhatWaits() {
     if (hasSomethingToSend()) (void)startUpSync();
+}
+
+void SyncAgent::noteServer(int result, bool isInTrouble) {
+    RetryGate& gate = mpAccount->retryGate(getType());
+    if (result == kOk) gate.open();
+    if (result != kFailed || !isInTrouble) return;
+    gate.runFailed();
+    if (!hasSomethingToSend()) return;
+    const AgentLock lock(&mMutex);
+    (void)mustWait();
 }
 
 void SyncAgent::noteHalf(bool isDown, int result, const std::string& failure) {

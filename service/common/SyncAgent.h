@@ -57,7 +57,8 @@ public:
     SyncAgent(const SyncAgent&) = delete;
     SyncAgent& operator=(const SyncAgent&) = delete;
 
-    // All: 0, or -1 for refusal.
+    // All: 0, or -1 for refusal. A sync that a client asks for begins whatever the server said before; an up sync, which nobody asks
+    // for, waits until the server may be asked again.
     [[nodiscard]] int startSync();
     [[nodiscard]] int startUpSync();
     // The same for whoever need not ask twice: whether an up sync has begun or is queued behind what runs.
@@ -82,6 +83,10 @@ protected:
 
     // Records how a half ended, for the tool. Called before continueSync.
     void noteHalf(bool isDown, int result, const std::string& failure);
+    // What the half's end means for runs that nobody asks for; `isInTrouble` as in SyncDirector.h.
+    void noteServer(int result, bool isInTrouble);
+    // The up sync that begins is one that a client has asked for: what was refused for good is tried again.
+    virtual void forgetRefusals() {}
 
     // Whether marks or unexamined changes wait on the device.
     [[nodiscard]] virtual bool hasSomethingToSend() { return false; }
@@ -98,6 +103,10 @@ private:
     [[nodiscard]] int startUpSyncWithoutLock();
     [[nodiscard]] int startDownSyncWithoutLock();
     [[nodiscard]] int continueWithoutLock(int result);
+    [[nodiscard]] int startSyncWithoutLock();
+    // Whether the server is left alone for now; then what waits is sent when the pause is over.
+    [[nodiscard]] bool mustWait();
+    static gboolean onPauseOver(gpointer data);
     void updateSyncTime();
     void signal();
     [[nodiscard]] int addIdleRequest(SyncAgentOperation operation);
@@ -111,6 +120,8 @@ private:
     bool mIsUpSyncReserved;
     bool mIsRemoving;
     bool mIsWaitingResult;
+    bool mMustForgetRefusals = false;
+    guint mPauseSource = 0;        // likewise, 0 when no pause is waited for
     std::set<guint> mIdleSources;  // posted and not yet run; they go with the agent
     SyncRunStatus mRunStatus;
 };

@@ -27,6 +27,8 @@ int SyncCurl::performCurl(const std::string& url, const HttpMethod& method, cons
                           .share = mpShare};
     const int result = transfer.perform();
     if (result == sync_result::kOk) *httpCode = transfer.status;
+    if (transfer.retryAfter > 0)
+        mpAccount->retryGate(VANTOR_PIM_SYNC_TYPE_CALENDAR).askedToWait(transfer.retryAfter);
     return result;
 }
 

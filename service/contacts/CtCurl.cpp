@@ -133,6 +133,10 @@ bool CtCurl::isOwn(const std::string& url) const {
     return !origin.empty() && origin == originOfUrl(feedBase());
 }
 
+bool CtCurl::isAskedToWait() const {
+    return mpAccount->retryGate(VANTOR_PIM_SYNC_TYPE_CONTACTS).isAskedToWait();
+}
+
 HttpTransfer CtCurl::makeTransfer(const std::string& url, const char* method, Access access) {
     HttpTransfer transfer{
         .url = url, .method = method, .timeout = kTimeoutSeconds, .observer = mpObserver, .share = mpShare};
@@ -144,6 +148,10 @@ int CtCurl::exchange(HttpTransfer& transfer) {
     mHttpStatus = 0;
     const int result = transfer.perform();
     mHttpStatus = transfer.status;
+    // Whom anybody may ask (profiles, their images) does not speak for the account's server.
+    const bool isAccounts = !transfer.headers.empty();
+    if (transfer.retryAfter > 0 && isAccounts)
+        mpAccount->retryGate(VANTOR_PIM_SYNC_TYPE_CONTACTS).askedToWait(transfer.retryAfter);
     if (transfer.reply != nullptr) logText(*transfer.reply);
     if (result == kTransferTimeout) return kTimedOut;
     return result == kOk ? kOk : kFailed;

@@ -1,5 +1,6 @@
 #include "contacts/CtFeedParsers.h"
 
+#include "common/HeaderText.h"
 #include "common/JsonAccess.h"
 #include "common/JsonText.h"
 #include "common/SyncLog.h"
@@ -181,7 +182,7 @@ int CtEntryMetaDataParser::getMetaData(const std::string& text, CtEntryMetaData*
 int CtAccessTokenParser::getAccessToken(const std::string& text, std::string* token) {
     const JsonNodePtr root = json_text::parse(text);
     const std::string found = textOr(json_access::objectIn(root.get()), "access_token", "");
-    if (found.empty()) {
+    if (found.empty() || !header_text::isValid(found)) {
         SYNC_ERR("don't have token");
         return kFailed;
     }

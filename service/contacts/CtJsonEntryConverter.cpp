@@ -63,8 +63,13 @@ void addImage(JsonObject* entry, contacts_record_h contact) {
         SYNC_ERR("Spec[website.href] out!");
         throw JsonException("Spec[website.href] out!");
     }
+    const std::string id = CtIdUtil::idAfterCom(href);
+    if (!CtIdUtil::isFileName(id)) {
+        SYNC_ERR("the photo's id(%.64s) cannot name a file", id.c_str());
+        return;
+    }
     ContactsRecord image = create(_contacts_image);
-    setText(image.get(), CONTACTS_IMAGE_PATH, "/tmp/" + CtIdUtil::idAfterCom(href));
+    setText(image.get(), CONTACTS_IMAGE_PATH, "/tmp/" + id);
     addChild(contact, CONTACTS_CONTACT_IMAGES, std::move(image));
 }
 

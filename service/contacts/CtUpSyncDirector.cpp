@@ -37,6 +37,7 @@ int CtUpSyncDirector::findSentItems(int addressBookId) {
 
 int CtUpSyncDirector::run() {
     mFailure.clear();
+    mIsInTrouble = true;
     CtDataManager& manager = CtDataManager::getInstance();
     const int accountId = mpAccount->getAccountId();
     int addressBookId = 0;
@@ -46,9 +47,10 @@ int CtUpSyncDirector::run() {
         return kFailed;
     }
     if (const int result = findSentItems(addressBookId); result != kOk) return result;
-    CtUploader uploader(manager.metaData(), addressBookId, &mCurl, mpStopQuery);
+    CtUploader uploader(manager.metaData(), addressBookId, &mCurl, mpStopQuery, &mParked);
     const int result = uploader.run();
-    mFailure = uploader.failure();
+    mFailure = result == kOk ? mParked.summary() : uploader.failure();
+    mIsInTrouble = uploader.isInTrouble();
     if (uploader.sent() == 0) return result;
     SYNC_INFO("contacts: %d changes sent", uploader.sent());
     return manager.passOwnWrites(addressBookId) == kOk || result != kOk ? result : kFailed;

@@ -5,6 +5,7 @@
 #include <memory>
 #include <string>
 
+#include "common/ParkedItems.h"
 #include "common/SyncDirector.h"
 #include "contacts/CtCurl.h"
 
@@ -17,6 +18,8 @@ public:
 
     int run() override;
     [[nodiscard]] std::string lastFailure() const override { return mFailure; }
+    [[nodiscard]] bool isInTrouble() const override { return mIsInTrouble; }
+    void forgetRefusals() override { mParked.clear(); }
 
 private:
     int onProgress(double, double, double, double) override {
@@ -28,5 +31,7 @@ private:
     Account* const mpAccount;
     IStopQuery* const mpStopQuery;
     CtCurl mCurl;
+    ParkedItems mParked;
+    bool mIsInTrouble = false;
     std::string mFailure;
 };

@@ -30,6 +30,7 @@ CtUpReply CtUpSyncTask::judge(int result) const {
     CtUpReply reply;
     reply.result = result;
     reply.answer = result == kTokenFailed ? CtAnswer::kNoAnswer : answerOf(mpCurl->lastHttpStatus());
+    reply.isForGood = result != kTokenFailed && http_status::isRefusedForGood(mpCurl->lastHttpStatus());
     // A body that could not be sent was not done.
     if (reply.answer == CtAnswer::kAccepted && result != kOk) reply.answer = CtAnswer::kRefused;
     if (reply.answer == CtAnswer::kNoAnswer) {

@@ -20,8 +20,9 @@ enum class CtAnswer {
 struct CtUpReply {
     CtAnswer answer = CtAnswer::kNoAnswer;
     int result = sync_result::kFailed;  // SyncResult.h
-    CtEntryMetaData meta;  // of the entry as the server has it now; empty where the answer did not tell
-    std::string reason;    // for people, of what was not accepted
+    CtEntryMetaData meta;    // of the entry as the server has it now; empty where the answer did not tell
+    std::string reason;      // for people, of what was not accepted
+    bool isForGood = false;  // a refusal that holds as long as the item stays as it is
 
     [[nodiscard]] bool isAccepted() const { return answer == CtAnswer::kAccepted; }
 };

@@ -50,54 +50,72 @@ bool isOfServer(const CtGroupSyncRow& row) {
 
 }  // namespace
 
-CtUploader::CtUploader(CtMetaDataDBHelper* store, int addressBookId, CtCurl* curl, IStopQuery* stopQuery)
-    : mpStore(store), mAddressBookId(addressBookId), mTask(curl), mpCurl(curl), mpStopQuery(stopQuery) {}
+CtUploader::CtUploader(CtMetaDataDBHelper* store, int addressBookId, CtCurl* curl, IStopQuery* stopQuery,
+                       ParkedItems* parked)
+    : mpStore(store),
+      mAddressBookId(addressBookId),
+      mTask(curl),
+      mpCurl(curl),
+      mpStopQuery(stopQuery),
+      mParked(*parked) {}
 
 int CtUploader::run() {
     std::vector<CtGroupSyncRow> groups;
     std::vector<CtContactSyncRow> contacts;
     if (mpStore->getAllGroups(mAddressBookId, &groups) != kOk || markAsSent<CtGroupKind>(&groups) != kOk) {
-        mFailure = kStoreFails;
-        return kFailed;
+        failOfStore(kStoreFails);
+        return mResult;
     }
     for (CtGroupSyncRow& row : groups) {
-        if (!isOver() && row.dirty != 0 && row.deleted == 0) sendGroup(row);
+        if (!isOver() && row.dirty != 0 && row.deleted == 0 && !isParked<CtGroupKind>(row)) sendGroup(row);
     }
     // After the groups, so that memberships name those that were just made.
     if (mGroups.load(*mpStore, mAddressBookId) != kOk ||
         mpStore->getAllContacts(mAddressBookId, &contacts) != kOk ||
         markAsSent<CtContactKind>(&contacts) != kOk) {
-        mFailure = kStoreFails;
-        return kFailed;
+        failOfStore(kStoreFails);
+        return mResult;
     }
     mpComposer = std::make_unique<ContactComposer>(mGroups.composer(mpCurl->feedBase()));
     for (CtContactSyncRow& row : contacts) {
         const bool waits = row.dirty != 0 || row.image_dirty != 0;
-        if (!isOver() && waits && row.deleted == 0) sendContact(row);
+        if (!isOver() && waits && row.deleted == 0 && !isParked<CtContactKind>(row)) sendContact(row);
     }
     for (CtContactSyncRow& row : contacts) {
-        if (!isOver() && row.deleted != 0) sendDeleted<CtContactKind>(CtItemType::kContact, row);
+        if (!isOver() && row.deleted != 0 && !isParked<CtContactKind>(row))
+            sendDeleted<CtContactKind>(CtItemType::kContact, row);
     }
     for (CtGroupSyncRow& row : groups) {
-        if (!isOver() && row.deleted != 0) sendDeleted<CtGroupKind>(CtItemType::kGroup, row);
+        if (!isOver() && row.deleted != 0 && !isParked<CtGroupKind>(row))
+            sendDeleted<CtGroupKind>(CtItemType::kGroup, row);
     }
     const bool groupsLearned = writeBack<CtGroupKind>(mSentGroups) == kOk;
-    if ((writeBack<CtContactKind>(mSentContacts) != kOk || !groupsLearned) && mResult == kOk) {
-        mResult = kFailed;
-        mFailure = kStoreFails;
-    }
+    if (writeBack<CtContactKind>(mSentContacts) != kOk || !groupsLearned) failOfStore(kStoreFails);
     return mpStopQuery != nullptr && mpStopQuery->isStopped() ? kStopped : mResult;
 }
 
-void CtUploader::fail(const char* itemName, int id, const std::string& uri, const CtUpReply& reply) {
-    SYNC_ERR("%s(%d, %s) could not be sent: %s", itemName, id, uri.c_str(), reply.reason.c_str());
-    if (reply.answer == CtAnswer::kNoAnswer) mIsOver = true;
+template <class Kind>
+void CtUploader::fail(const typename Kind::Row& row, const CtUpReply& reply) {
+    const int id = row.*Kind::kId;
+    SYNC_ERR("%s(%d, %s) could not be sent: %s", Kind::kName, id, row.uri.c_str(), reply.reason.c_str());
+    if (reply.isForGood) {
+        mParked.park(Kind::kName, id, versionToPark(row), reply.reason);
+    } else {
+        mIsInTrouble = true;
+    }
+    if (reply.answer == CtAnswer::kNoAnswer || mpCurl->isAskedToWait()) mIsOver = true;
     if (reply.result == kTokenFailed) mResult = kTokenFailed;
     if (mResult == kOk) mResult = kFailed;
     if (!mFailure.empty()) return;
-    mFailure = reply.result == kTokenFailed
-                   ? "the account's authorisation is no longer accepted"
-                   : std::string(itemName) + " " + std::to_string(id) + " could not be sent: " + reply.reason;
+    mFailure = reply.result == kTokenFailed ? "the account's authorisation is no longer accepted"
+                                            : std::string(Kind::kName) + " " + std::to_string(id) +
+                                                  " could not be sent: " + reply.reason;
+}
+
+void CtUploader::failOfStore(const char* text) {
+    mIsInTrouble = true;
+    if (mResult == kOk) mResult = kFailed;
+    if (mFailure.empty()) mFailure = text;
 }
 
 template <class Kind>
@@ -105,7 +123,8 @@ int CtUploader::markAsSent(std::vector<typename Kind::Row>* rows) {
     SyncTransaction transaction(mpStore->database());
     if (!transaction.begun()) return kFailed;
     for (auto& row : *rows) {
-        if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || row.etag == kCtUnconfirmedEtag)
+        if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || row.etag == kCtUnconfirmedEtag ||
+            isParked<Kind>(row))
             continue;
         row.etag = kCtUnconfirmedEtag;
         if (Kind::update(*mpStore, row) != kOk) return kFailed;
@@ -119,10 +138,10 @@ void CtUploader::store(typename Kind::Row& row, const CtUpReply& reply, int vers
     if (!reply.meta.etag.empty()) row.etag = reply.meta.etag;
     if (!reply.meta.updated.empty()) row.updated = reply.meta.updated;
     row.version = version;
+    mParked.forget(Kind::kName, row.*Kind::kId);
     if (Kind::update(*mpStore, row) == kOk) return;
     SYNC_ERR("metaDB %s fail", std::is_same_v<Kind, CtContactKind> ? "updateContact" : "updateGroupEtag");
-    mResult = kFailed;
-    if (mFailure.empty()) mFailure = kStoreFails;
+    failOfStore(kStoreFails);
     mIsOver = true;
 }
 
@@ -142,8 +161,7 @@ ContactsRecord CtUploader::readRecord(const char* view, int id) {
     // One that was just deleted is met as a deletion by the next look at the device's changes.
     if (code == PLATFORM_ERROR_NONE || code == PLATFORM_ERROR_NOT_FOUND) return ContactsRecord(raw);
     SYNC_ERR("get fail %d", code);
-    if (mResult == kOk) mResult = kFailed;
-    if (mFailure.empty()) mFailure = "the device's stores cannot be read";
+    failOfStore("the device's stores cannot be read");
     return nullptr;
 }
 
@@ -163,7 +181,8 @@ void CtUploader::sendGroup(CtGroupSyncRow& row) {
     CtUpReply reply;
     reply.reason = "the group has no name";
     reply.answer = CtAnswer::kRefused;
-    if (name.empty()) return fail("group", row.group_id, row.uri, reply);
+    reply.isForGood = name.empty();
+    if (name.empty()) return fail<CtGroupKind>(row, reply);
     if (!row.uri.empty()) {
         reply = mTask.update(CtItemType::kGroup, row.uri, row.etag, GroupComposer::compose(name, row.etag));
         if (reply.answer == CtAnswer::kConflict || row.etag.empty()) {
@@ -183,7 +202,7 @@ void CtUploader::sendGroup(CtGroupSyncRow& row) {
             row.etag.clear();
             if (CtGroupKind::update(*mpStore, row) != kOk) mIsOver = true;
         }
-        return fail("group", row.group_id, row.uri, reply);
+        return fail<CtGroupKind>(row, reply);
     }
     row.dirty = 0;
     ++mSent;
@@ -221,7 +240,7 @@ bool CtUploader::sendFields(CtContactSyncRow& row, contacts_record_h record) {
             row.etag.clear();
             if (mpStore->updateContact(row) != kOk) mIsOver = true;
         }
-        fail("contact", row.contact_id, row.uri, reply);
+        fail<CtContactKind>(row, reply);
         return false;
     }
     row.dirty = waitsForGroup(record) ? 1 : 0;
@@ -279,7 +298,7 @@ bool CtUploader::sendPhoto(CtContactSyncRow& row, contacts_record_h record) {
         if (path.empty() && row.photo_etag.empty()) return true;
     }
     if (!reply.isAccepted()) {
-        fail("contact", row.contact_id, row.uri, reply);
+        fail<CtContactKind>(row, reply);
         return false;
     }
     takePhotoReply(row, record, reply);
@@ -315,9 +334,7 @@ void CtUploader::sendDeleted(CtItemType type, typename Kind::Row& row) {
             SYNC_ERR("%s(%d) was deleted before the server's answer to it was known", Kind::kName, id);
         if (Kind::forget(*mpStore, id) == kOk) return;
         mIsOver = true;
-        mResult = kFailed;
-        if (mFailure.empty()) mFailure = kStoreFails;
-        return;
+        return failOfStore(kStoreFails);
     }
     if (isOfServer(row)) {
         SYNC_ERR("%s(%s) belongs to the server, the device's deletion is not sent", Kind::kName,
@@ -336,7 +353,7 @@ void CtUploader::sendDeleted(CtItemType type, typename Kind::Row& row) {
         reply = mTask.remove(type, row.uri, row.etag);
         if (reply.answer != CtAnswer::kConflict) break;
     }
-    if (!reply.isAccepted() && reply.answer != CtAnswer::kGone) return fail(Kind::kName, id, row.uri, reply);
+    if (!reply.isAccepted() && reply.answer != CtAnswer::kGone) return fail<Kind>(row, reply);
     ++mSent;
     clearMarks(&row);
     store<Kind>(row, {}, row.version);

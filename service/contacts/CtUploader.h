@@ -11,6 +11,7 @@
 #include <utility>
 #include <vector>
 
+#include "common/ParkedItems.h"
 #include "common/SyncDirector.h"
 #include "contacts/CtGroupMap.h"
 #include "contacts/CtItemKind.h"
@@ -19,13 +20,16 @@
 class CtUploader {
 public:
     // Nothing is owned; `stopQuery` may be NULL.
-    CtUploader(CtMetaDataDBHelper* store, int addressBookId, CtCurl* curl, IStopQuery* stopQuery);
+    CtUploader(CtMetaDataDBHelper* store, int addressBookId, CtCurl* curl, IStopQuery* stopQuery,
+               ParkedItems* parked);
 
     // 0, 1 when stopped, -5, or -1 with failure(). What could be sent was sent.
     [[nodiscard]] int run();
 
     [[nodiscard]] const std::string& failure() const { return mFailure; }
     [[nodiscard]] int sent() const { return mSent; }
+    // Whether a failure was the server's, the network's or the device's, not that of single items.
+    [[nodiscard]] bool isInTrouble() const { return mIsInTrouble; }
 
 private:
     // What the record learns of the server's answer.
@@ -38,7 +42,18 @@ private:
     [[nodiscard]] bool isOver() const {
         return mIsOver || (mpStopQuery != nullptr && mpStopQuery->isStopped());
     }
-    void fail(const char* itemName, int id, const std::string& uri, const CtUpReply& reply);
+    template <class Kind>
+    [[nodiscard]] bool isParked(const typename Kind::Row& row) const {
+        return mParked.isParked(Kind::kName, row.*Kind::kId, versionToPark(row));
+    }
+    // A deletion is a change of its own, also of an item whose last edit was refused.
+    template <class Row>
+    [[nodiscard]] static int versionToPark(const Row& row) {
+        return row.deleted != 0 ? -1 - row.version : row.version;
+    }
+    template <class Kind>
+    void fail(const typename Kind::Row& row, const CtUpReply& reply);
+    void failOfStore(const char* text);
     template <class Kind>
     void store(typename Kind::Row& row, const CtUpReply& reply, int version);
     template <class Kind>
@@ -68,12 +83,14 @@ private:
     CtUpSyncTask mTask;
     CtCurl* const mpCurl;
     IStopQuery* const mpStopQuery;
+    ParkedItems& mParked;
     CtGroupMap mGroups;
     std::unique_ptr<ContactComposer> mpComposer;  // once the groups are sent
 
     std::vector<Sent> mSentContacts;
     std::vector<Sent> mSentGroups;
     bool mIsOver = false;
+    bool mIsInTrouble = false;
     int mResult = sync_result::kOk;
     int mSent = 0;
     std::string mFailure;

@@ -149,8 +149,10 @@ void CtXmlElement::write(std::string* out) const {
 }
 
 bool CtXmlElement::fromJson(std::string_view member, JsonObject* object, CtXmlElement* out) {
-    CtXmlElement element{.name = member == "content" ? "atom:content" : ctXmlName(member)};
-    if (object == nullptr || !readObject(object, &element, 0)) return false;
+    const bool isContent = member == "content";
+    if (object == nullptr || (!isContent && !isQualifiedName(member, /*isElement=*/true))) return false;
+    CtXmlElement element{.name = isContent ? "atom:content" : ctXmlName(member)};
+    if (!readObject(object, &element, 0)) return false;
     *out = std::move(element);
     return true;
 }

@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sqlite3.h>
+#include <sys/stat.h>
 
 #include <fstream>
 #include <iterator>
@@ -87,13 +88,16 @@ TEST(AccountTool, ATokenIsOneWordInAPlainFile) {
     // A link that somebody put there is neither read nor written through.
     const std::filesystem::path victim = tool.root().path() / "victim";
     std::ofstream(victim) << "before";
-    std::filesystem::create_symlink(
-        victim,
-        tool.root().at("/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted/7_file"));
+    const auto tokenFile =
+        tool.root().at("/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted/7_file");
+    std::filesystem::create_symlink(victim, tokenFile);
     EXPECT_EQ(lonely.addAccount("token").status, 1);
     std::ifstream file(victim);
     EXPECT_EQ(std::string((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>()),
               "before");
+    std::filesystem::remove(tokenFile);
+    ASSERT_EQ(mkfifo(tokenFile.c_str(), 0600), 0);
+    EXPECT_EQ(lonely.addAccount("token").status, 1) << "nor is a FIFO waited for";
 }
 
 TEST(AccountTool, RemoveCleansAnAccountThatOnlyTheServiceKnows) {

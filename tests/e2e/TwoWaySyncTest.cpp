@@ -203,6 +203,22 @@ TEST_F(TwoWay, WhatIsGoneOnTheServerGoesOnTheDevice) {
     expectSameAndQuiet();
 }
 
+TEST_F(TwoWay, AnInstanceEditedWhileItsSeriesGoesUpIsSentToo) {
+    const std::string series = std::to_string(add("event", mBook, kDaily));
+    expectSoon("the series", [&] { return eventsNamed("Daily").size() == 1; });
+    // Held once before the series is read for its etag, once after.
+    for (const char* method : {"GET", "PATCH"}) {
+        mPair.provider.admin("POST", "/hold", {{"method", method}, {"path", "events/"}});
+        run({"event", "set", series, "location=" + std::string(method)});
+        mPair.provider.admin("GET", "/hold?atLeast=1&timeoutMs=10000");
+        const std::string day = method[0] == 'G' ? "20260603" : "20260604";
+        run({"event", "set", series, "--instance", day + "T080000Z", "summary=" + std::string(method)});
+        mPair.provider.admin("POST", "/release");
+        expectSoon("the instance", [&] { return eventsNamed(method).size() == 1; });
+    }
+    expectSameAndQuiet();
+}
+
 TEST_F(TwoWay, AKilledDaemonSendsNothingTwice) {
     mPair.provider.admin("POST", "/faults",
                          {{"method", "POST"},

@@ -48,7 +48,8 @@ void pims_ipc_svc_run_main_loop(void* main_loop);
 int pims_ipc_svc_deinit();
 
 // --- client: any one thread at a time a handle ----------------------------------------------------
-// Connects. PLATFORM_ERROR_NOT_FOUND when nobody serves the path, PLATFORM_ERROR_PERMISSION_DENIED.
+// Connects. PLATFORM_ERROR_NOT_FOUND when nobody serves the path, PLATFORM_ERROR_PERMISSION_DENIED when the caller may not or
+// what is there is no socket (links are not followed).
 [[nodiscard]] int pims_ipc_create(const char* path, pims_ipc_h* ipc);
 int pims_ipc_destroy(pims_ipc_h ipc);
 // Blocks until the reply, at most `timeout_ms`. *data_out is NULL for a reply without data; the caller

@@ -1,6 +1,7 @@
 // Accounts, alarms and the opening of the service socket. (The wire itself is tested through the daemon.)
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
 #include <filesystem>
 #include <fstream>
@@ -135,6 +136,15 @@ TEST(ServiceSocket, OpensOnlyWhereItMay) {
         {"a file", [](const std::filesystem::path& path) { std::ofstream(path) << "x"; }, false},
         {"a link to nowhere",
          [](const std::filesystem::path& path) { std::filesystem::create_symlink("/nowhere", path); }, false},
+        {"a FIFO", [](const std::filesystem::path& path) { EXPECT_EQ(mkfifo(path.c_str(), 0600), 0); },
+         false},
+        {"a link to a stale socket",
+         [](const std::filesystem::path& path) {
+             EXPECT_EQ(
+                 statusOf(inOtherProcess([] { return pims_ipc_svc_init("/tmp/other", getgid(), 0660); })), 0);
+             std::filesystem::create_symlink("other", path);
+         },
+         false},
         {"a stale socket",
          [](const std::filesystem::path&) {
              EXPECT_EQ(statusOf(inOtherProcess([] { return pims_ipc_svc_init("/tmp/s", getgid(), 0660); })),
@@ -158,6 +168,20 @@ TEST(ServiceSocket, OpensOnlyWhereItMay) {
         }
         EXPECT_EQ(pims_ipc_svc_deinit(), 0);
     }
+}
+
+TEST(ServiceSocket, ClientsFollowNoLink) {
+    const TestRoot root;
+    ASSERT_EQ(pims_ipc_svc_init("/tmp/s", getgid(), 0660), 0);
+    std::filesystem::create_symlink("s", root.at("/tmp/link"));
+    ASSERT_EQ(mkfifo(root.at("/tmp/fifo").c_str(), 0600), 0);
+    pims_ipc_h ipc = nullptr;
+    for (const char* path : {"/tmp/link", "/tmp/fifo"})
+        EXPECT_EQ(pims_ipc_create(path, &ipc), PLATFORM_ERROR_PERMISSION_DENIED) << path;
+    EXPECT_EQ(pims_ipc_create("/tmp/none", &ipc), PLATFORM_ERROR_NOT_FOUND);
+    ASSERT_EQ(pims_ipc_create("/tmp/s", &ipc), 0);
+    EXPECT_EQ(pims_ipc_destroy(ipc), 0);
+    EXPECT_EQ(pims_ipc_svc_deinit(), 0);
 }
 
 TEST(IpcData, KeepsToItsLimits) {

@@ -79,6 +79,8 @@ TEST(CalCurl, GivesUpInItsOwnTime) {
     for (const Row& row :
          {Row{"a token that is refused again and again", R"({"access_token":"bad"})", kOk, 5},
           Row{"no token in the reply", R"({"error":"invalid_grant"})", kTokenFailed, 1},
+          Row{"a token that would begin a header of its own", R"({"access_token":"good\r\nX-Other: 1"})",
+              kTokenFailed, 1},
           Row{"a reply that cannot be read", "{oops", kOk, 5}}) {
         SCOPED_TRACE(row.name);
         Client client;
@@ -119,7 +121,10 @@ TEST(CalCurl, RepliesInflatedOrNot) {
         {"empty", "", kOk, ""},
         {"cut short", zipped.substr(0, zipped.size() / 2), kFailed, ""},
         {"without its check sum", zipped.substr(0, zipped.size() - 4), kFailed, ""},
-        {"text after a zero byte", gzip(std::string("ab\0cd", 5)), kOk, "ab"},
+        {"zero bytes at the end", gzip(std::string("ab\0\0", 4)), kOk, "ab"},
+        {"nothing but a zero byte", gzip(std::string(1, '\0')), kOk, ""},
+        {"an empty list and junk after a zero byte", gzip(std::string("{\"items\":[]}\0junk", 17)), kFailed,
+         ""},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);

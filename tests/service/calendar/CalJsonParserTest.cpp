@@ -288,6 +288,32 @@ TEST(CalJsonParser, TakesJsonToTheLetter) {
     EXPECT_EQ(free, 35);
 }
 
+TEST(CalJsonParser, HalfASurrogatePairIsOneUnknownCharacter) {
+    struct Row {
+        const char* json;
+        const char* text;
+    };
+    for (const Row& row :
+         {Row{R"(a\ud83d\ude00b)",
+              "a\xF0\x9F\x98\x80"
+              "b"},
+          Row{R"(a\uD800b)",
+              "a\xEF\xBF\xBD"
+              "b"},
+          Row{R"(a\uDFAA)", "a\xEF\xBF\xBD"},
+          Row{R"(\uDd1e\uD834b)",
+              "\xEF\xBF\xBD\xEF\xBF\xBD"
+              "b"},
+          Row{R"(\uD888\u0041)",
+              "\xEF\xBF\xBD"
+              "A"},
+          Row{R"(\uD83D\uD83D\uDE00)", "\xEF\xBF\xBD\xF0\x9F\x98\x80"},
+          Row{R"(\uD83D\uDE00\uDE00)", "\xF0\x9F\x98\x80\xEF\xBF\xBD"}, Row{R"(\\uD800)", "\\uD800"}}) {
+        const CalendarRecord record = convert(kTimes + R"(,"summary":")" + row.json + R"(")");
+        EXPECT_EQ(textOf(record.get(), CALENDAR_EVENT_SUMMARY), row.text) << row.json;
+    }
+}
+
 TEST(CalMappings, GoBothWaysButForTheLossyRows) {
     using namespace cal_mapping;
     const auto check = [](const auto& table, std::initializer_list<std::string_view> oneWay) {

@@ -117,18 +117,23 @@ TEST(AccountDBHelper, TokensComeFromTheirFiles) {
         int result;
         const char* token;
     };
-    for (const Row& row : {Row{"abc", 0, "abc"}, Row{"abc\n", 0, "abc"}, Row{"abc\r\n", 0, "abc"},
-                           Row{"a b\n\n", 0, "a b\n"}, Row{"", -1, "before"}}) {
+    for (const Row& row : {Row{"", -1, "before"}, Row{"abc\n", 0, "abc"}, Row{"abc\r\n", 0, "abc"},
+                           Row{"a b\n\n", 0, "a b\n"}, Row{"abc", 0, "abc"}}) {
         writeToken(root, 7, row.content);
         std::string token = "before";
         EXPECT_EQ(store.getSecureKey(7, &token), row.result) << row.content;
         EXPECT_EQ(token, row.token);
     }
-    std::filesystem::create_directory(
-        root.at("/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted/8_file"));
-    std::string untouched = "before";
-    EXPECT_EQ(store.getSecureKey(8, &untouched), -1) << "a folder is no token";
-    EXPECT_EQ(untouched, "before");
+    const auto trusted = root.at("/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted");
+    std::filesystem::create_directory(trusted / "8_file");
+    std::filesystem::create_symlink(trusted / "7_file", trusted / "9_file");
+    ASSERT_EQ(mkfifo((trusted / "10_file").c_str(), 0600), 0);
+    for (const int id : {8, 9, 10}) {
+        std::string untouched = "before";
+        EXPECT_EQ(store.getSecureKey(id, &untouched), -1) << "a folder, a link or a FIFO is no token";
+        EXPECT_EQ(untouched, "before");
+    }
+    writeToken(root, 7, "");
     ASSERT_EQ(store.insertAccount(Account(fields(7))), 0);
     std::list<std::unique_ptr<Account>> accounts;
     EXPECT_DEATH((void)store.getAllAccounts(&accounts), "get token fail");

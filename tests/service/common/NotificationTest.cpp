@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <fcntl.h>
+#include <sys/stat.h>
 
 #include <filesystem>
 
@@ -116,6 +117,31 @@ TEST(Notification, AMissingFileEndsTheProcess) {
     EXPECT_DEATH(
         NotificationSendManager().notifyChange(7, kContacts, NotificationSendManager::SYNC_STATE_NO_CHANGE),
         "fd != -1");
+}
+
+TEST(Notification, WhatIsPutInAFilesPlaceIsNotFollowed) {
+    const TestRoot root;
+    const std::filesystem::path victim = root.path() / "victim";
+    std::ofstream(victim) << "precious";
+    for (const char* path : {kCalendarNotificationPath, kContactsNotificationPath})
+        std::filesystem::remove(root.at(path));
+    std::filesystem::create_symlink(victim, root.at(kCalendarNotificationPath));
+    ASSERT_EQ(mkfifo(root.at(kContactsNotificationPath).c_str(), 0600), 0);
+
+    NotificationReceiveManager receivers;
+    int told = 0;
+    receivers.attachListener(std::make_shared<StateChangedListener>(kCalendar, count, &told));
+    std::ofstream(victim, std::ios::app) << "!";
+    iterateReady();
+    EXPECT_EQ(told, 0) << "writes to another file are nobody's business";
+    receivers.detachAllListeners();
+
+    EXPECT_DEATH(
+        NotificationSendManager().notifyChange(7, kCalendar, NotificationSendManager::SYNC_STATE_NO_CHANGE),
+        "fd != -1");
+    EXPECT_EQ(std::filesystem::file_size(victim), 9U);
+    // Neither waits for a reader that never comes.
+    NotificationSendManager().notifyChange(7, kContacts, NotificationSendManager::SYNC_STATE_NO_CHANGE);
 }
 
 TEST(SyncScheduleManager, AlarmsCallTheirListener) {

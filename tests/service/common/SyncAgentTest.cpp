@@ -305,6 +305,45 @@ TEST_F(SyncAgentStates, ScheduledSyncsKeepToTheSwitches) {
     EXPECT_EQ(agent.takeRun(), "down") << "an unset switch counts as on";
 }
 
+TEST_F(SyncAgentStates, AServerThatIsLeftAloneIsAskedByClientsOnly) {
+    RetryGate& gate = account.retryGate(VANTOR_PIM_SYNC_TYPE_CALENDAR);
+    gate.askedToWait(1000);
+    gate.askedToWait(10);
+    EXPECT_GT(gate.secondsLeft(), 990) << "the longest counts";
+    agent.onSchedule();
+    EXPECT_EQ(agent.startUpSync(), -1);
+    EXPECT_TRUE(agent.requestUpSync()) << "it comes when the pause is over";
+    EXPECT_EQ(agent.takeRun(), "");
+    ASSERT_EQ(agent.startSync(), 0);
+    EXPECT_EQ(agent.takeRun(), "down");
+    EXPECT_EQ(gate.secondsLeft(), 0);
+    // An up sync that was asked for during a run that shut the gate waits as well.
+    EXPECT_TRUE(agent.requestUpSync());
+    gate.runFailed();
+    agent.continueSync(-1);
+    EXPECT_EQ(agent.takeRun(), "");
+    EXPECT_EQ(agent.getState(), SYNC_AGENT_STATE_READY);
+}
+
+TEST(RetryGate, PausesDoubleUpToAnHour) {
+    RetryGate gate;
+    int last = 0;
+    for (int i = 0; i < 20; ++i) {
+        gate.runFailed();
+        const int left = gate.secondsLeft();
+        EXPECT_GE(left, std::min(30 << std::min(i, 7), 3600) * 3 / 4 - 1);
+        EXPECT_LE(left, 3600);
+        if (i < 6) {
+            EXPECT_GT(left, last);
+        }
+        last = left;
+    }
+    EXPECT_FALSE(gate.isAskedToWait());
+    gate.open();
+    gate.runFailed();
+    EXPECT_LE(gate.secondsLeft(), 30) << "a run that went well begins anew";
+}
+
 TEST_F(SyncAgentStates, ARequestThatWasPostedGoesWithItsAgent) {
     auto doomed = std::make_unique<FakeAgent>(&account);
     ASSERT_EQ(doomed->startSync(), 0);

@@ -79,6 +79,7 @@ TEST_F(ContactSync, AContactWaitsForAGroupThatIsRefused) {
     ASSERT_EQ(serverNames(), std::set<std::string>{"member"}) << "its other fields go up";
     EXPECT_TRUE(manager().hasSomethingToSend(mAccount.getAccountId()));
     mServer.groupWriteStatus = 0;
+    mUp.forgetRefusals();  // as a client that asks for a sync does
     sync();
     EXPECT_EQ(mServer.all("contacts").begin()->second["gContact$groupMembershipInfo"].size(), 1U);
     EXPECT_EQ(groupsOf(deviceContacts()["member"]), std::vector<int>{group});
@@ -102,6 +103,7 @@ TEST_F(ContactSync, ARefusedPhotoSendsNoFieldsAgain) {
     EXPECT_EQ(deviceNames(), std::set<std::string>{"a server"}) << "only the photo is the device's change";
     EXPECT_EQ(imageOf(deviceContacts()["a server"]), "mine");
     mServer.photoWriteStatus = 0;
+    mUp.forgetRefusals();
     sync();
     EXPECT_EQ(mServer.photo("a"), "mine");
     sync();

@@ -233,6 +233,18 @@ TEST_F(ContactMapping, AnyTextIsWellFormedAndTheSame) {
     EXPECT_FALSE(readAtom("<atom:entry>" + ctXmlEscape("\xC3\x28 broken \xFF") + "</atom:entry>").is_null());
 }
 
+TEST_F(ContactMapping, AnElementThatNoNameCanBeMadeOfIsLeftOut) {
+    for (const char* member : {"gd$em/il", "gd$", "gContact$a b", "gd$1x", "gd$a$b", "gd$a><b"}) {
+        const Json entry = {{"gd$name", {{"gd$givenName", {{"$t", "Ada"}}}}},
+                            {member, {{"$t", "x"}}},
+                            {"gContact$hobby", {{"$t", "sums"}}}};
+        const Json back = sent(recordOf(entry).get());
+        ASSERT_FALSE(back.is_null()) << member;
+        EXPECT_EQ(back["gContact$hobby"]["$t"], "sums");
+        EXPECT_FALSE(back.contains(member));
+    }
+}
+
 TEST_F(ContactMapping, UnreadableEntries) {
     struct Case {
         const char* entry;
@@ -256,6 +268,8 @@ TEST_F(ContactMapping, UnreadableEntries) {
         {R"({"link":[{"rel":"x/rel#photo","gd$etag":"e"}]})", false, 0},
         {R"({"link":[{"rel":"x/rel#photo","href":"h/a.com/p"}]})", true, 0, CONTACTS_CONTACT_IMAGES},
         {R"({"link":[{"rel":"x/rel#photo","href":"h/a.com/p","gd$etag":"e"}]})", true, 1,
+         CONTACTS_CONTACT_IMAGES},
+        {R"({"link":[{"rel":"x/rel#photo","href":"h/a.com/../etc/passwd","gd$etag":"e"}]})", true, 0,
          CONTACTS_CONTACT_IMAGES},
         {"[]", false, 0},
         {"{", false, 0},

@@ -1,8 +1,10 @@
 // The contacts client against a server that answers from a script.
 #include <gtest/gtest.h>
+#include <sys/stat.h>
 
 #include <filesystem>
 #include <fstream>
+#include <functional>
 
 #include "common/Account.h"
 #include "common/SyncResult.h"
@@ -67,6 +69,8 @@ TEST(CtCurl, RenewsTheTokenOnceAndSendsTheServicesHeaders) {
     EXPECT_EQ(client.curl.update(edit, "", "<x/>", &client.reply), kFailed);
     EXPECT_EQ(client.curl.remove(edit, "", &client.reply), kFailed);
     EXPECT_EQ(client.server.requests, before) << "without an etag nothing goes out";
+    EXPECT_EQ(client.curl.update(edit, "\"e\"\r\nX-Other: 1", "<x/>", &client.reply), kFailed);
+    EXPECT_EQ(client.server.requests, before) << "nor with one that would begin a header of its own";
 }
 
 TEST(CtCurl, WhatAnAnswerMeans) {
@@ -182,6 +186,38 @@ TEST(CtCurl, PhotosAreStagedSafely) {
     EXPECT_EQ(client.curl.upsertImage(photoUrl, "", "/tmp/mine"), kOk);
     EXPECT_EQ(client.header("If-Match"), "") << "there was no photo before";
     EXPECT_EQ(client.curl.upsertImage(photoUrl, "", "/tmp/none"), kFailed);
+}
+
+TEST(CtCurl, WhatLiesWhereAPhotoIsStagedIsNeitherUsedNorWaitedFor) {
+    Client client;
+    client.account.setAccessToken("good");
+    const auto path = client.root.at("/tmp/p1");
+    const auto victim = client.root.path() / "victim";
+    std::ofstream(victim) << "precious";
+    const std::function<void()> planted[] = {
+        [&] { ASSERT_EQ(mkfifo(path.c_str(), 0666), 0); },
+        [&] { std::filesystem::create_hard_link(victim, path); },
+        [&] { std::filesystem::create_symlink(victim, path); },
+    };
+    for (const auto& plant : planted) {
+        plant();
+        const std::unique_ptr<CtStagedPhoto> photo = CtStagedPhoto::create("p1");
+        ASSERT_NE(photo, nullptr);
+        EXPECT_TRUE(std::filesystem::is_regular_file(std::filesystem::symlink_status(path)));
+        EXPECT_EQ(std::filesystem::hard_link_count(path), 1U);
+        EXPECT_EQ(std::filesystem::status(path).permissions(),
+                  std::filesystem::perms::owner_read | std::filesystem::perms::owner_write);
+    }
+    EXPECT_EQ(std::filesystem::file_size(victim), 8U);
+    std::filesystem::create_directory(path);
+    EXPECT_EQ(CtStagedPhoto::create("p1"), nullptr);
+    std::filesystem::remove(path);
+    for (const auto& plant : {planted[0], planted[2]}) {
+        plant();
+        EXPECT_EQ(client.curl.upsertImage(client.url + "/photo", "", "/tmp/p1"), kFailed);
+        std::filesystem::remove(path);
+    }
+    EXPECT_EQ(client.server.requests, 0) << "what is no plain file is not sent";
 }
 
 TEST(CtCurl, TheSizeOfAProfileImage) {

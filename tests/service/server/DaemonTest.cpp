@@ -14,6 +14,7 @@
 #include "platform/root.h"
 #include "platform/settings.h"
 #include "support/Daemon.h"
+#include "support/Hostile.h"
 
 namespace {
 
@@ -124,6 +125,30 @@ TEST(Daemon, BadClientsDisturbNobody) {
     EXPECT_EQ(write(silent[0], "\x20", 1), 1);  // half a length, for ever
     EXPECT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers.size(), 2U);
     for (const int fd : silent) close(fd);
+}
+
+TEST(Daemon, NoArgumentBringsItDown) {
+    const TestRoot root;
+    addDeviceAccount(root, 7);
+    Daemon daemon(root);
+    const Ipc ipc = daemon.connect();
+    ASSERT_TRUE(ipc) << daemon.log();
+    for (const hostile::Body& body : hostile::jsonSuite()) {
+        for (const char* command :
+             {"add_account", "update_account", "get_account", "remove_account", "get_state"}) {
+            const IpcData request(pims_ipc_data_create_with_size(64, 0));
+            ASSERT_EQ(pims_ipc_data_put(request.get(), body.text.data(), body.text.size()), 0) << body.name;
+            pims_ipc_data_h raw = nullptr;
+            ASSERT_EQ(pims_ipc_call(ipc.get(), kServiceModule, command, request.get(), &raw, 10'000), 0)
+                << body.name;
+            const IpcData reply(raw);
+            int result = 0;
+            EXPECT_EQ(vantor_pim_sync_ipc_unmarshal_int(raw, &result), 0);
+            EXPECT_EQ(result, -1) << command << " " << body.name;
+        }
+    }
+    EXPECT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers, (std::vector<int>{0, 0}))
+        << "no account was made";
 }
 
 TEST(Daemon, LivesAndDies) {

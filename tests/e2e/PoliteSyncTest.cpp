@@ -1,0 +1,147 @@
+// The daemon is no nuisance: pauses that a server asks for are kept, what it refuses for good is not sent again and again.
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <functional>
+#include <thread>
+
+#include "e2e/Eventually.h"
+#include "e2e/SyncPair.h"
+
+namespace {
+
+// One kind of data and what an edit of it is.
+struct Kind {
+    const char* name;
+    const char* path;  // of the requests that write items
+    std::function<int(SyncPair&, const std::string& text)> add;
+    const char* noun;
+    const char* field;
+};
+
+void PrintTo(const Kind& kind, std::ostream* out) {
+    *out << kind.name;
+}
+
+int numberOf(const CommandResult& added) {
+    EXPECT_EQ(added.status, 0) << added.error;
+    return std::atoi(added.output.c_str());
+}
+
+int addEvent(SyncPair& pair, const std::string& text) {
+    const int book = pair.localCalendar(1, pair.wireCalendars(1).at(0).at("summary"));
+    return numberOf(
+        pair.device.tool({"event", "add", "--calendar", std::to_string(book), "-"},
+                         Json({{"summary", text}, {"start", "2026-06-01"}, {"end", "2026-06-02"}}).dump()));
+}
+
+int addContact(SyncPair& pair, const std::string& text) {
+    return numberOf(
+        pair.device.tool({"contact", "add", "--account", "1", "-"}, Json({{"nickname", text}}).dump()));
+}
+
+const Kind kKinds[] = {{"calendar", "/events", addEvent, "event", "summary="},
+                       {"contacts", "contacts/.*/full", addContact, "contact", "nickname="}};
+
+class Polite : public testing::TestWithParam<Kind> {
+protected:
+    Polite() : mPair(1, {"--seed", "sample"}, GetParam().name) {
+        EXPECT_EQ(mPair.sync(1).status, 0);
+        mPair.provider.admin("DELETE", "/requests");  // the token's is a POST too
+    }
+
+    int add(const std::string& text) { return GetParam().add(mPair, text); }
+    void edit(int id, const std::string& text) {
+        const CommandResult done =
+            mPair.device.tool({GetParam().noun, "set", std::to_string(id), GetParam().field + text});
+        EXPECT_EQ(done.status, 0) << done.error;
+    }
+    int posts() { return mPair.requestCounts()["POST"]; }
+    int pending() {
+        for (const Json& status : mPair.device.json({"status", "1"})) {
+            if (status.at("kind") == GetParam().name) return status.at("pending").at("dirty");
+        }
+        return -1;
+    }
+    std::string failure() {
+        for (const Json& status : mPair.device.json({"status", "1"})) {
+            if (status.at("kind") == GetParam().name) return status.at("failure");
+        }
+        return {};
+    }
+    void answerPosts(int status, int count, const Json& headers = Json::object()) {
+        mPair.installFault({{"method", "POST"},
+                            {"path", GetParam().path},
+                            {"kind", "status"},
+                            {"status", status},
+                            {"count", count},
+                            {"headers", headers}});
+    }
+    static void wait(int milliseconds) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
+    }
+
+    SyncPair mPair;
+};
+
+TEST_P(Polite, APauseThatTheServerAsksForIsKept) {
+    answerPosts(429, 1, {{"Retry-After", "3"}});
+    const auto begin = std::chrono::steady_clock::now();
+    add("first");
+    ASSERT_TRUE(eventually([&] { return posts() == 1; }));
+    add("second");
+    wait(1000);
+    EXPECT_EQ(posts(), 1) << "an edit does not end the pause";
+    EXPECT_TRUE(eventually([&] { return pending() == 0; })) << mPair.device.daemonLog();
+    EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
+    EXPECT_EQ(posts(), 3);
+    // A client's own request does not wait.
+    answerPosts(503, 1, {{"Retry-After", "3600"}});
+    add("third");
+    ASSERT_TRUE(eventually([&] { return posts() == 4; }));
+    EXPECT_EQ(mPair.sync(1).status, 0) << mPair.device.daemonLog();
+    EXPECT_EQ(pending(), 0);
+    mPair.expectFaultsUsed();
+}
+
+TEST_P(Polite, AServerInTroubleIsNotAskedAgainAtOnce) {
+    answerPosts(500, 50);
+    const int id = add("first");
+    ASSERT_TRUE(eventually([&] { return posts() == 1; }));
+    for (int i = 0; i < 5; ++i) {
+        edit(id, "edit " + std::to_string(i));
+        wait(200);
+    }
+    EXPECT_LE(posts(), 2);
+    mPair.provider.admin("DELETE", "/faults");
+    EXPECT_EQ(mPair.sync(1).status, 0) << mPair.device.daemonLog();
+    EXPECT_EQ(pending(), 0);
+}
+
+TEST_P(Polite, WhatIsRefusedForGoodIsParkedUntilItChanges) {
+    answerPosts(400, 1);
+    const int refused = add("refused");
+    ASSERT_TRUE(eventually([&] { return posts() == 1 && pending() == 1; }));
+    for (int i = 0; i < 3; ++i) {
+        add("good " + std::to_string(i));
+        EXPECT_TRUE(eventually([&] { return posts() == 2 + i && pending() == 1; }))
+            << posts() << ' ' << pending() << mPair.device.daemonLog();
+    }
+    EXPECT_NE(failure().find("waits until it is changed"), std::string::npos) << failure();
+    edit(refused, "mended");
+    EXPECT_TRUE(eventually([&] { return pending() == 0; })) << mPair.device.daemonLog();
+    EXPECT_EQ(posts(), 5);
+    // And a client that asks for a sync has it tried again.
+    answerPosts(422, 1);
+    add("refused again");
+    ASSERT_TRUE(eventually([&] { return posts() == 6 && pending() == 1; }));
+    EXPECT_EQ(mPair.sync(1).status, 0) << mPair.device.daemonLog();
+    EXPECT_EQ(pending(), 0);
+    EXPECT_EQ(failure(), "");
+    mPair.expectQuiet(1);
+}
+
+INSTANTIATE_TEST_SUITE_P(Kinds, Polite, testing::ValuesIn(kKinds),
+                         [](const testing::TestParamInfo<Kind>& row) { return std::string(row.param.name); });
+
+}  // namespace

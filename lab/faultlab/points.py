@@ -1,4 +1,6 @@
 """A trial at one step: the daemon is disturbed there, comes back, syncs, and is judged."""
+import json
+import time
 from collections import Counter
 from dataclasses import dataclass, field
 
@@ -6,7 +8,8 @@ from faultlab import checker
 
 SYNCS = 4  # after the disturbance, for quiet: a failed one, one that sends, one that sees what became of it, and one more
 DISTURBED_SYNC_S = 20
-FAILING_SYNC_S = 3  # a tool that waits for a report which the daemon cannot write waits in vain
+FAILING_SYNC_S = 10
+LOOK_S = 0.02
 THREADS = {"main": "main", "worker": "sync-worker"}
 
 
@@ -57,6 +60,18 @@ def sync_until_quiet(trial, kind, outcome):
     return False
 
 
+def _run_with_failing_disk(device, kind):
+    """Until the run is over; the daemon may be unable to publish that, so its state is asked for."""
+    device.run("sync", "1", kind)
+    end = time.monotonic() + FAILING_SYNC_S
+    while device.is_running() and time.monotonic() < end:
+        status, output = device.run("status", "1", "--json")
+        states = [entry["state"] for entry in json.loads(output)] if status == 0 else []
+        if "in progress" not in states:
+            return
+        time.sleep(LOOK_S)
+
+
 def _disturbed_run(trial, kind, point, outcome):
     device = trial.device
     device.start(point.options())
@@ -65,7 +80,7 @@ def _disturbed_run(trial, kind, point, outcome):
         if not device.stop():
             outcome.problems.append("the daemon did not end when it was told to")
     else:
-        device.sync(1, kind, FAILING_SYNC_S)
+        _run_with_failing_disk(device, kind)
         device.heal()
     report = device.report()
     outcome.hit = next((line[4:] for line in report if line.startswith("hit ")), "")

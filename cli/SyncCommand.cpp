@@ -1,4 +1,5 @@
 // sync, stop: asking the daemon for a sync, and waiting for its end.
+#include <algorithm>
 #include <vector>
 
 #include "AccountStore.h"
@@ -56,6 +57,7 @@ bool isSwitchedOn(int account, vantor_pim_sync_type_e kind) {
 // The run to wait for. A sync that is going on or queued already is as good as a new one.
 int start(int account, vantor_pim_sync_type_e kind) {
     const SyncState state(account, kind);
+    const int before = state.run();
     int code = 0;
     for (int tries = 0; tries < kMostStartTries; ++tries) {
         code = vantor_pim_sync_start(account, kind);
@@ -68,7 +70,12 @@ int start(int account, vantor_pim_sync_type_e kind) {
         if (!isOn || tries + 1 == kMostStartTries) throw Failure(sync_client::refusal(code, account, kind));
     }
     output::progress(sync_client::kindName(kind) + (code == 0 ? ": sync started" : ": a sync is going on"));
-    return state.run();
+    const int run = state.run();
+    if (run != before || state.ended() < run ||
+        sync_client::state(account, kind) != SYNC_AGENT_STATE_IN_PROGRESS)
+        return run;
+    // The daemon could not write its number: to wait for the last one that it wrote would be over at once.
+    return std::max(run, state.ended()) + 1;
 }
 
 // What went wrong, "" for nothing.

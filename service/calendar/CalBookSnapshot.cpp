@@ -97,6 +97,7 @@ void CalBookSnapshot::readUnconfirmed() {
         const CalendarRecord record(raw);
         // The version comes with the content: an edit after this look is still to be found.
         mRecords[row.event_id].version = intOf(raw, mKind.version);
+        mRecords[row.event_id].hasDates = mKind.hasSeries() && !textOf(raw, CALENDAR_EVENT_EXDATE).empty();
         mUnconfirmed.emplace(mKind.comparable(raw), i);
     }
 }
@@ -166,6 +167,12 @@ bool CalBookSnapshot::hasChangedInstance(int seriesEventId) const {
         if (hasLocalChange(mRows[found->second])) return true;
     }
     return false;
+}
+
+bool CalBookSnapshot::isBehindRow(const CalEventMetaData& row) const {
+    const CalRecordState* state = record(row.event_id);
+    return state != nullptr && (state->etag != row.etag || state->uid != row.uri) && !hasLocalChange(row) &&
+           !hasUnseenChange(row);
 }
 
 bool CalBookSnapshot::hasUnseenChange(const CalEventMetaData& row) const {

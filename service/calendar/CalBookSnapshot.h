@@ -21,6 +21,7 @@ struct CalRecordState {
     std::string uid;
     std::string etag;  // as stored with the sync's own last write
     std::string recurrenceId;
+    bool hasDates = false;  // cancelled instances; known of an item that may have reached the server
 
     [[nodiscard]] bool isEnginesOwnWrite() const { return syncedVersion != 0 && syncedVersion == version; }
 };
@@ -55,6 +56,8 @@ public:
     [[nodiscard]] bool hasLocalChange(const CalEventMetaData& row) const;
     // The same of any instance of a series.
     [[nodiscard]] bool hasChangedInstance(int seriesEventId) const;
+    // Whether the record is older than its row: it was sent, and a kill came before it learned what the server made of it.
+    [[nodiscard]] bool isBehindRow(const CalEventMetaData& row) const;
     // Whether a user wrote the record, or an exception of the series, since the change walk last looked.
     [[nodiscard]] bool hasUnseenChange(const CalEventMetaData& row) const;
 

@@ -88,7 +88,7 @@ private:
             planned.row = newRow(entry);
             planned.rowWrite = RowWrite::kReplaceLost;
             if (!convertJson2Record(entry, "json parse fail", &planned.record)) return;
-        } else if (row.etag == entry.etag) {
+        } else if (row.etag == entry.etag && !mSnapshot.isBehindRow(row)) {
             return;
         } else if (mSnapshot.hasLocalChange(row)) {
             if (row.etag.empty()) return;  // compared once the change is sent
@@ -120,7 +120,8 @@ private:
         planned.row = sent;
         planned.row.uri = entry->id;
         planned.row.etag = entry->etag;
-        planned.row.dirty = 0;
+        // Cancelled instances go up after their series, and were not part of what was sent.
+        planned.row.dirty = mSnapshot.record(sent.event_id)->hasDates ? 1 : 0;
         planned.row.version = mSnapshot.record(sent.event_id)->version;
         planned.rowWrite = RowWrite::kUpdate;
         planned.ownWrite = false;
@@ -216,7 +217,8 @@ private:
     bool planKnownInstance(const CalListInfo& entry, const ExceptionInfo& info, const CalEventMetaData& known,
                            PlannedInstance* planned) const {
         const bool lost = known.event_id > 0 && mSnapshot.isLost(known);
-        if (!lost && known.etag == entry.etag && known.uri == entry.id) return false;
+        if (!lost && known.etag == entry.etag && known.uri == entry.id && !mSnapshot.isBehindRow(known))
+            return false;
         planned->rowWrite = RowWrite::kUpdate;
         if (mSnapshot.hasLocalChange(known)) {
             if (known.etag.empty() && known.uri == entry.id)
@@ -265,7 +267,8 @@ private:
 
 bool needsContent(const CalListInfo& entry, const CalBookSnapshot& snapshot) {
     if (const CalEventMetaData* row = snapshot.rowByUri(entry.id)) {
-        return snapshot.isLost(*row) || (row->etag != entry.etag && !snapshot.hasLocalChange(*row));
+        return snapshot.isLost(*row) || snapshot.isBehindRow(*row) ||
+               (row->etag != entry.etag && !snapshot.hasLocalChange(*row));
     }
     const int orphan = snapshot.orphan(entry.id);
     const CalRecordState* state = orphan != 0 ? snapshot.record(orphan) : nullptr;

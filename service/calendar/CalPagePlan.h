@@ -6,7 +6,8 @@
 //   listed          sent, no answer       says the same         the row takes id and etag
 //   listed          none                  own, untouched        take over (its etag equal) or update
 //   listed          none                  own, user edited it   take over as dirty: the device's change wins
-//   etag equal      any                   any                   nothing; a lost record is inserted again
+//   etag equal      any                   any                   nothing; a lost record is inserted again, and one
+//                                                               that does not know what its row knows is written
 //   etag differs    clean                 as the sync left it   update
 //   etag differs    dirty, deleted or a change not examined     row takes the etag: the device's change wins
 // An instance of a series follows the same rules; one whose series is not there yet waits.

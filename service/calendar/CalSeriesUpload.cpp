@@ -46,6 +46,22 @@ bool CalUploader::hasUnsentDates(const Row& series, calendar_record_h record) {
     });
 }
 
+int CalUploader::seenVersion(const Row& row, calendar_record_h record) {
+    int version = intOf(record, mKind.version);
+    if (!mKind.hasSeries()) return version;
+    const int own = intOf(record, CALENDAR_EVENT_OWN_VERSION);
+    if (row.dirty == 0 && own > std::max(row.version, intOf(record, mKind.syncedVersion))) version = own - 1;
+    calendar_read::forEachChild(record, CALENDAR_EVENT_EXCEPTIONS, [&](calendar_record_h child) {
+        const int childVersion = intOf(child, CALENDAR_EVENT_VERSION);
+        const Row* known = instanceRow(row.event_id, textOf(child, CALENDAR_EVENT_RECURRENCE_ID));
+        const bool isSeen = known != nullptr && known->event_id == intOf(child, CALENDAR_EVENT_ID) &&
+                            (known->dirty != 0 || known->version >= childVersion);
+        const bool isOwnWrite = intOf(child, CALENDAR_EVENT_SYNCED_VERSION) == childVersion;
+        if (!isSeen && !isOwnWrite) version = std::min(version, childVersion - 1);
+    });
+    return version;
+}
+
 void CalUploader::sendInstances(Row& series, calendar_record_h record) {
     if (series.dirty != 0 && !isParked(series) && hasUnsentDates(series, record) &&
         sendDates(series, record)) {
@@ -65,7 +81,7 @@ void CalUploader::sendInstances(Row& series, calendar_record_h record) {
             if (mpStore->updateItem(*row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
             continue;
         }
-        if (!isParked(*row)) sendInstance(series, intOf(record, mKind.version), *row, child->second);
+        if (!isParked(*row)) sendInstance(series, seenVersion(series, record), *row, child->second);
     }
 }
 
@@ -87,6 +103,9 @@ void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, c
         return removeGone(row, version);
     }
     if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
+    if (hasOwnUri && !row.etag.empty() && before.etag != row.etag) {
+        SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName, uri.c_str());
+    }
     std::string etag = before.etag;
     JsonNodePtr item;
     if (!update(row, uri, body, &etag, &item)) return;

@@ -198,8 +198,7 @@ void CalUploader::insertItem(Row& row, calendar_record_h record, const std::stri
             row.etag = reply.etag;
             // A series stays marked until the server has its cancelled instances too.
             row.dirty = hasUnsentDates(row, record) ? 1 : 0;
-            return store(row, intOf(record, mKind.version), intOf(record, mKind.version),
-                         std::move(reply.item));
+            return store(row, seenVersion(row, record), seenVersion(row, record), std::move(reply.item));
         case UpAnswer::kRefused: {
             fail(row, reply);
             row.etag.clear();
@@ -214,10 +213,14 @@ void CalUploader::insertItem(Row& row, calendar_record_h record, const std::stri
 }
 
 void CalUploader::updateItem(Row& row, calendar_record_h record, const std::string& body) {
-    const int version = intOf(record, mKind.version);
+    const int version = seenVersion(row, record);
     const UpReply before = mTask.getEtag(mBook.uri, row.uri);
     if (before.answer == UpAnswer::kGone) return removeGone(row, version);
     if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
+    if (!row.etag.empty() && before.etag != row.etag) {
+        SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName,
+                 row.uri.c_str());
+    }
     JsonNodePtr item;
     if (!update(row, row.uri, body, &row.etag, &item)) return;
     row.dirty = hasUnsentDates(row, record) ? 1 : 0;

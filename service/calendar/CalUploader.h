@@ -81,6 +81,9 @@ private:
     // Whether every date was taken.
     [[nodiscard]] bool sendDates(Row& series, calendar_record_h record);
     [[nodiscard]] bool sendDate(const Row& series, const std::string& date);
+    // The record's version, or the one before what a user changed since the changes were looked for and what is not sent with
+    // the row: an exception, or the series when only its exceptions are sent. It is still to be found.
+    [[nodiscard]] int seenVersion(const Row& row, calendar_record_h record);
     [[nodiscard]] bool hasUnsentDates(const Row& series, calendar_record_h record);
     [[nodiscard]] Row* instanceRow(int seriesId, const std::string& recurrenceId);
 

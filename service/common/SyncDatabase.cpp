@@ -6,6 +6,7 @@
 
 #include <chrono>
 #include <memory>
+#include <optional>
 #include <thread>
 #include <utility>
 
@@ -54,16 +55,17 @@ struct CloseDatabase {
 };
 using ShortConnection = std::unique_ptr<sqlite3, CloseDatabase>;
 
-// False only for a store that nobody finished making: one that cannot be read is somebody's data.
-bool hasTables(const std::string& path) {
+// False only for a store that nobody finished making. Nothing for one that cannot be read: it is somebody's data.
+std::optional<bool> hasTables(const std::string& path) {
     sqlite3* opened = nullptr;
-    if (db_util_open(path.c_str(), &opened, 0) != SQLITE_OK) return true;
+    if (db_util_open(path.c_str(), &opened, 0) != SQLITE_OK) return std::nullopt;
     const ShortConnection database(opened);
     bool found = false;
     const auto note = [](void* any, int, char**, char**) { return *static_cast<bool*>(any) = true, 0; };
     const int code =
         sqlite3_exec(database.get(), "SELECT 1 FROM sqlite_master LIMIT 1", note, &found, nullptr);
-    return found || code != SQLITE_OK;
+    if (code != SQLITE_OK && !found) return std::nullopt;
+    return found;
 }
 
 }  // namespace
@@ -101,7 +103,13 @@ int SyncDatabase::openDb() {
     const bool isThere = fd != -1;
     if (isThere) close(fd);
     // A daemon that was killed while it made the store left a file without tables.
-    if (!isThere || (mpHandle == nullptr && !hasTables(path))) {
+    const std::optional<bool> isMade = isThere && mpHandle == nullptr ? hasTables(path) : isThere;
+    if (!isMade) {
+        // Not opened, or nobody would look again once it can be read.
+        SYNC_ERR("%s cannot be read", path.c_str());
+        return kFailed;
+    }
+    if (!*isMade) {
         if (const int result = makeDb(); result != kOk) {
             SYNC_ERR("makeDb fail");
             return result;

@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 #include <signal.h>
 
+#include <filesystem>
+
 #include "e2e/Eventually.h"
 #include "e2e/SyncPair.h"
 
@@ -242,6 +244,21 @@ TEST(CalendarSync, WaitingForTwoSyncsWithinOneSecondSeesBoth) {
     const std::string second = addEvent(pair, calendar, timedEvent("second"));
     ASSERT_EQ(pair.device.sync(1).status, 0);
     EXPECT_FALSE(pair.localEvent(second).is_null());
+}
+
+TEST(CalendarSync, ASyncWhoseNumberCannotBeWrittenIsWaitedForAllTheSame) {
+    SyncPair pair;
+    ASSERT_EQ(pair.device.sync(1).status, 0);
+    const std::string key =
+        pair.device.root().at("/opt/usr/data/settings/memory/vantor-pim-sync/1/calendar/run");
+    std::filesystem::remove(key);
+    std::filesystem::create_directory(key);  // nothing can be renamed over it
+    const std::string added = addEvent(pair, pair.firstCalendar(1), timedEvent("new"));
+    pair.installFault({{"method", "GET"}, {"path", "calendarList"}, {"kind", "delay"}, {"delayMs", 700}});
+
+    EXPECT_EQ(pair.device.sync(1).status, 0);
+
+    EXPECT_FALSE(pair.localEvent(added).is_null());
 }
 
 TEST(CalendarSync, OverHttpsWithAnUnknownCertificateVerifiesOnlyWhenAsked) {

@@ -236,6 +236,61 @@ TEST_F(TwoWay, AKilledDaemonSendsNothingTwice) {
     EXPECT_EQ(eventsNamed("Meeting").size(), 1U);
 }
 
+TEST_F(TwoWay, ASeriesWhoseAnswerWasLostStillSendsItsCancelledDays) {
+    run({"daemon", "stop"});
+    const std::string series = std::to_string(add("event", mBook, kDaily));
+    run({"event", "delete", series, "--instance", "20260604T080000Z"});
+    run({"event", "set", series, "--instance", "20260605T080000Z", "summary=Late"});
+    mPair.installFault({{"method", "POST"}, {"path", "events$"}, {"kind", "reset"}, {"afterHandling", true}});
+    run({"daemon", "start"});
+    EXPECT_TRUE(eventually([&] { return mPair.provider.admin("GET", "/faults")["faults"].empty(); }));
+    EXPECT_TRUE(eventually([&] { return mPair.device.sync(1).status == 0; })) << mPair.device.daemonLog();
+    expectSameAndQuiet();
+    EXPECT_EQ(eventsNamed("Daily").size(), 1U);
+    EXPECT_EQ(eventsNamed("Late").size(), 1U);
+}
+
+TEST_F(TwoWay, AnInstanceEditedWhileItsSeriesWaitsForItsUploadIsSentToo) {
+    const std::string before = std::to_string(add("event", mBook, kMeeting));
+    const std::string series = std::to_string(add("event", mBook, kDaily));
+    expectSoon("the series", [&] { return eventsNamed("Daily").size() == 1; });
+    expectSameAndQuiet();
+    mPair.provider.admin("POST", "/hold", {{"method", "PATCH"}, {"path", "events/"}});
+    run({"daemon", "stop"});
+    run({"event", "set", before, "location=Room 2"});
+    run({"event", "set", series, "location=Room 2"});
+    run({"daemon", "start"});
+    mPair.provider.admin("GET", "/hold?atLeast=1&timeoutMs=5000");
+    // The changes have been looked for, the series has not been read yet.
+    run({"event", "set", series, "--instance", "20260605T080000Z", "summary=Late"});
+    mPair.provider.admin("POST", "/release");
+    expectSoon("the instance", [&] { return eventsNamed("Late").size() == 1; });
+    expectSameAndQuiet();
+}
+
+TEST_F(TwoWay, AnEditThatGoesOverAnUnseenOneIsNamedInTheLog) {
+    const std::string series = std::to_string(add("event", mBook, kDaily));
+    run({"event", "set", series, "--instance", "20260605T080000Z", "summary=Late"});
+    expectSoon("the instance", [&] { return eventsNamed("Late").size() == 1; });
+    expectSameAndQuiet();
+    run({"daemon", "stop"});
+    const std::string path = "/calendars/" + pathText(mCalendar) + "/events/";
+    for (const char* summary : {"Daily", "Late"}) {
+        const std::string id = eventsNamed(summary).at(0)["id"];
+        mPair.provider.admin("PATCH", path + id, {{"location", "the server's"}});
+    }
+    run({"event", "set", series, "location=the device's"});
+    run({"event", "set", series, "--instance", "20260605T080000Z", "location=the device's"});
+    run({"daemon", "start"});
+    expectSameAndQuiet();
+    for (const char* summary : {"Daily", "Late"}) {
+        const Json event = eventsNamed(summary).at(0);
+        EXPECT_EQ(event["location"], "the device's");
+        EXPECT_THAT(mPair.device.daemonLog(), testing::HasSubstr("event(" + event["id"].get<std::string>() +
+                                                                 ") was changed on both sides"));
+    }
+}
+
 TEST_F(TwoWay, AnEditDuringARevokedAuthorisationGoesUpAfterIt) {
     const std::string email = mPair.provider.accounts().at(0).email;
     mPair.provider.admin("POST", "/tokens/revoke", {{"email", email}});

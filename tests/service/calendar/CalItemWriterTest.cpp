@@ -188,6 +188,30 @@ TEST(CalItemWriter, ARecordThatWasUpdatedBeforeItsRowIsNoLocalChange) {
     EXPECT_EQ(device.text("a", kSummary), "a 3");
 }
 
+TEST(CalItemWriter, ARecordThatDoesNotKnowWhatItsRowKnowsIsWritten) {
+    CalendarFixture device;
+    device.download({{event("a", "1"), event("b", "1"), series("s", "1"), instance("s", 3, "1")}});
+    // As if killed after the upload's rows and before its records.
+    for (const char* uri : {"a", "b", "s"}) {
+        CalEventMetaData row = device.row(uri);
+        row.etag = "2";
+        ASSERT_EQ(device.manager.metaData()->updateItem(row), 0);
+    }
+    CalEventMetaData exception = instanceRow(device, 3);
+    exception.etag = "2";
+    ASSERT_EQ(device.manager.metaData()->updateItem(exception), 0);
+    device.userSets("b", kSummary, "mine");
+    const std::vector<std::vector<Json>> list = {
+        {event("a", "2"), event("b", "2"), series("s", "2"), instance("s", 3, "2")}};
+
+    device.download(list);
+
+    EXPECT_THAT(device.summaries(), ElementsAre("a 2", "mine", "s 2", instanceUid(3) + " 2"));
+    const int version = device.storeVersion();
+    device.download(list);
+    EXPECT_EQ(device.storeVersion(), version);
+}
+
 TEST(CalItemWriter, OnlyProofDeletes) {
     struct Case {
         const char* name;

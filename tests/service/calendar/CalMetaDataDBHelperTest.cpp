@@ -1,6 +1,7 @@
 // The calendar sync metadata store on real files.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 #include <sys/stat.h>
 
 #include <fstream>
@@ -73,6 +74,23 @@ TEST(CalMetaDataDBHelper, AStoreThatNobodyFinishedMakingIsMadeAgain) {
     std::string uri;
     EXPECT_EQ(again.getEventUri(1, &uri), kOk);
     EXPECT_EQ(uri, "a");
+}
+
+TEST(CalMetaDataDBHelper, AnUnfinishedStoreThatCannotBeReadIsMadeOnceItCan) {
+    const TestRoot root;
+    sqlite3* unfinished = nullptr;
+    ASSERT_EQ(sqlite3_open(root.at(kFile).c_str(), &unfinished), SQLITE_OK);
+    ASSERT_EQ(sqlite3_exec(unfinished, "PRAGMA user_version = 1", nullptr, nullptr, nullptr), SQLITE_OK);
+    sqlite3_close(unfinished);
+    const std::string journal = root.at(kFile).string() + "-journal";
+    std::filesystem::remove(journal);
+    std::filesystem::create_directory(journal);
+    CalMetaDataDBHelper store;
+    EXPECT_NE(store.insertEvent(eventRow(1, 1, "a")), kOk);
+
+    std::filesystem::remove(journal);
+
+    EXPECT_EQ(store.insertEvent(eventRow(1, 1, "a")), kOk);
 }
 
 TEST(CalMetaDataDBHelper, DeletionsCascade) {

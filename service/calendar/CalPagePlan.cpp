@@ -91,7 +91,6 @@ private:
         } else if (row.etag == entry.etag && !mSnapshot.isBehindRow(row)) {
             return;
         } else if (mSnapshot.hasLocalChange(row)) {
-            if (row.etag.empty()) return;  // compared once the change is sent
             SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName,
                      entry.id.c_str());
         } else if (mSnapshot.hasUnseenChange(row)) {
@@ -221,8 +220,6 @@ private:
             return false;
         planned->rowWrite = RowWrite::kUpdate;
         if (mSnapshot.hasLocalChange(known)) {
-            if (known.etag.empty() && known.uri == entry.id)
-                return false;  // compared once the change is sent
             SYNC_ERR("event(%s) was changed on both sides, the device's change wins", entry.id.c_str());
             const std::string etag = planned->row.etag;
             planned->row = known;

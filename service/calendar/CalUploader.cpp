@@ -296,20 +296,6 @@ void CalUploader::store(Row& row, int version, int expectedVersion, JsonNodePtr 
     mSentItems.push_back({{row.event_id, expectedVersion, row.uri, row.etag}, std::move(item)});
 }
 
-// An edit of a series, or of an instance of it, was in the way: without etags the rows differ from the list, and the next download takes
-// what the server has.
-int CalUploader::forgetEtags(const std::set<int>& items) {
-    if (items.empty()) return kOk;
-    SyncTransaction transaction(mpStore->database());
-    if (!transaction.begun()) return kFailed;
-    for (Row& row : mRows) {
-        if (!items.contains(row.event_id)) continue;
-        row.etag.clear();
-        if (mpStore->updateItem(row) != kOk) return kFailed;
-    }
-    return transaction.commit();
-}
-
 // The records learn what the server calls them, so that they can be recognised without their rows.
 int CalUploader::writeBack() {
     if (mSentItems.empty()) return kOk;
@@ -318,16 +304,12 @@ int CalUploader::writeBack() {
         SYNC_ERR("get svc fail");
         return kFailed;
     }
-    std::set<int> left;
     for (const Sent& sent : mSentItems) {
-        bool isLeft = false;
-        if (!::writeBack(mKind, sent.record, jsonObjectOf(sent.item), &isLeft)) return kFailed;
-        if (isLeft) left.insert(sent.record.itemId);
+        if (!::writeBack(mKind, sent.record, jsonObjectOf(sent.item))) return kFailed;
     }
     if (!transaction.commit()) {
         SYNC_ERR("get svc fail");
         return kFailed;
     }
-    if (forgetEtags(left) != kOk) return kFailed;
     return mSide.manager().passOwnWrites(mBook.calendar_id);
 }

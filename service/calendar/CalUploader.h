@@ -8,7 +8,6 @@
 
 #include <list>
 #include <map>
-#include <set>
 #include <string>
 #include <vector>
 
@@ -73,7 +72,6 @@ private:
     void store(Row& row, int version, int expectedVersion, JsonNodePtr item);
     // The records learn what the server calls them.
     [[nodiscard]] int writeBack();
-    [[nodiscard]] int forgetEtags(const std::set<int>& items);
 
     // --- instances of a series
     void sendInstances(Row& series, calendar_record_h record);

@@ -7,7 +7,7 @@
 
 using sync_result::kOk;
 
-bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* item, bool* isLeft) {
+bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* item) {
     std::vector<unsigned> properties = {kind.id, kind.uid, kind.etag};
     properties.insert(properties.end(), kind.serverFields.begin(), kind.serverFields.end());
     CalendarList list;
@@ -24,7 +24,6 @@ bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* it
     const record_write_options_s options{.by_sync = true,
                                          .expected_versions = std::span(&sent.expectedVersion, 1)};
     const int code = calendar_db_update_record(record, options);
-    const bool wasChanged = code == PLATFORM_ERROR_CONFLICT || code == PLATFORM_ERROR_NOT_FOUND;
-    if (isLeft != nullptr) *isLeft = wasChanged;
-    return code == PLATFORM_ERROR_NONE || wasChanged;
+    // Changed again meanwhile: the next run sends it and comes back here, or the next download finds it behind its row.
+    return code == PLATFORM_ERROR_NONE || code == PLATFORM_ERROR_CONFLICT || code == PLATFORM_ERROR_NOT_FOUND;
 }

@@ -13,6 +13,5 @@ struct CalWriteBack {
 };
 
 // Writes it by the sync, inside the thread's open transaction. `item` is the item as the server has it, NULL when it did not say.
-// A record that was changed or deleted meanwhile is left alone (`isLeft`). False when the store cannot be written.
-[[nodiscard]] bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* item,
-                             bool* isLeft = nullptr);
+// A record that was changed or deleted meanwhile is left alone. False when the store cannot be written.
+[[nodiscard]] bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* item);

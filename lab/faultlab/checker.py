@@ -90,13 +90,6 @@ class Sides:
         return problems + (self.contact_problems() if "contacts" in kinds else [])
 
 
-def stray_photos(device, contacts):
-    """Photo files that no contact names: a kill may leave none behind for good."""
-    folder = device.root / "opt/usr/data/records/contacts-images"
-    there = {str(file) for file in folder.iterdir()} if folder.exists() else set()
-    return sorted(there - {contact["photo"] for contact in contacts})
-
-
 def quiet_problems(provider, device, numbers, kinds):
     """One more sync sends no write and changes no store."""
     provider.forget_requests()

@@ -162,7 +162,7 @@ int Store::writeChildren(Record& record, int id, ChildWrite how, int version) {
             mConnection.prepare(std::string("DELETE FROM ") + child.table + " WHERE parent = ?");
         if (const int code = clear.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);
         const std::string sql = insertChild(child);
-        for (const auto& entry : record.children(i)) {
+        for (const auto& entry : std::as_const(record).children(i)) {
             Statement insert = mConnection.prepare(sql);
             insert.bind(int64_t{id});
             for (size_t k = 0; k < child.properties.size(); ++k) {

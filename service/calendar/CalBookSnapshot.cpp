@@ -16,52 +16,39 @@ int readRecordStates(const CalItemKind& kind, int bookId, std::unordered_map<int
     std::vector<unsigned> properties = {kind.id, kind.version, kind.syncedVersion, kind.uid, kind.etag};
     if (kind.hasSeries())
         properties.insert(properties.end(), {kind.ownVersion, kind.seriesId, kind.recurrenceId});
-    calendar_query_h rawQuery = nullptr;
-    if (calendar_query_create(kind.view, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
-    const CalendarQuery query(rawQuery);
-    calendar_list_h rawList = nullptr;
-    if (calendar_query_add_filter_int(query.get(), kind.bookId, bookId) != PLATFORM_ERROR_NONE ||
-        calendar_query_set_projection(query.get(), properties.data(), properties.size()) !=
-            PLATFORM_ERROR_NONE ||
-        calendar_db_get_records_with_query(query.get(), 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("get_records_with_query fail");
-        return kFailed;
-    }
-    const CalendarList list(rawList);
-    calendar_read::forEach(list.get(), [&kind, states](calendar_record_h record) {
-        CalRecordState state;
-        state.version = intOf(record, kind.version);
-        state.ownVersion = intOf(record, kind.ownVersion);
-        state.syncedVersion = intOf(record, kind.syncedVersion);
-        state.uid = textOf(record, kind.uid);
-        state.etag = textOf(record, kind.etag);
-        if (kind.hasSeries()) {
-            state.originalEventId = intOf(record, kind.seriesId);
-            state.recurrenceId = textOf(record, kind.recurrenceId);
-        }
-        states->emplace(intOf(record, kind.id), std::move(state));
-    });
-    return kOk;
+    const int code = calendar_read::forEachPart(
+        kind.view, kind.bookId, bookId, properties, [&kind, states](calendar_record_h record) {
+            CalRecordState state;
+            state.version = intOf(record, kind.version);
+            state.ownVersion = intOf(record, kind.ownVersion);
+            state.syncedVersion = intOf(record, kind.syncedVersion);
+            state.uid = textOf(record, kind.uid);
+            state.etag = textOf(record, kind.etag);
+            if (kind.hasSeries()) {
+                state.originalEventId = intOf(record, kind.seriesId);
+                state.recurrenceId = textOf(record, kind.recurrenceId);
+            }
+            states->emplace(intOf(record, kind.id), std::move(state));
+        });
+    if (code == PLATFORM_ERROR_NONE) return kOk;
+    SYNC_ERR("get_records_with_query fail");
+    return kFailed;
 }
 
 // Items that a user deleted since the book's changes were last examined.
 int readUnseenDeletions(const CalItemKind& kind, const CalBookMetaData& book,
                         std::unordered_set<int>* eventIds) {
-    calendar_list_h rawList = nullptr;
     int current = 0;
-    if (calendar_db_get_changes_by_version(kind.view, book.calendar_id, book.sync_version, &rawList,
-                                           &current) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("db_get_changes_by_version fail");
-        return kFailed;
-    }
-    const CalendarList list(rawList);
-    calendar_read::forEach(list.get(), [eventIds](calendar_record_h record) {
-        const bool deleted = intOf(record, CALENDAR_UPDATED_INFO_MODIFIED_STATUS) == RECORD_DELETED;
-        const bool own = intOf(record, CALENDAR_UPDATED_INFO_SYNCED_VERSION) ==
-                         intOf(record, CALENDAR_UPDATED_INFO_VERSION);
-        if (deleted && !own) eventIds->insert(intOf(record, CALENDAR_UPDATED_INFO_ID));
-    });
-    return kOk;
+    const int code = calendar_read::forEachChange(
+        kind.view, book.calendar_id, book.sync_version, &current, [eventIds](calendar_record_h record) {
+            const bool deleted = intOf(record, CALENDAR_UPDATED_INFO_MODIFIED_STATUS) == RECORD_DELETED;
+            const bool own = intOf(record, CALENDAR_UPDATED_INFO_SYNCED_VERSION) ==
+                             intOf(record, CALENDAR_UPDATED_INFO_VERSION);
+            if (deleted && !own) eventIds->insert(intOf(record, CALENDAR_UPDATED_INFO_ID));
+        });
+    if (code == PLATFORM_ERROR_NONE) return kOk;
+    SYNC_ERR("db_get_changes_by_version fail");
+    return kFailed;
 }
 
 }  // namespace

@@ -55,26 +55,25 @@ bool readChange(calendar_record_h record, LocalChange* change) {
     return true;
 }
 
-int readChanges(const CalItemKind& kind, int calendarId, int since, std::vector<LocalChange>* changes,
-                int* current) {
-    calendar_list_h rawList = nullptr;
-    if (calendar_db_get_changes_by_version(kind.view, calendarId, since, &rawList, current) !=
-        PLATFORM_ERROR_NONE) {
-        SYNC_ERR("db_get_changes_by_version fail");
-        return kFailed;
-    }
-    const CalendarList list(rawList);
-    for (int code = calendar_list_first(rawList); code == PLATFORM_ERROR_NONE;
-         code = calendar_list_next(rawList)) {
-        calendar_record_h record = nullptr;
-        LocalChange change;
-        if (calendar_list_get_current_record_p(rawList, &record) != PLATFORM_ERROR_NONE) {
-            SYNC_ERR("list_get_current_record_p fail");
-        } else if (readChange(record, &change)) {
-            changes->push_back(std::move(change));
-        }
-    }
-    return kOk;
+// What others than the sync changed, and whether there was anything at all.
+struct Changes {
+    std::vector<LocalChange> foreign;
+    bool any = false;
+    int current = 0;
+};
+
+int readChanges(const CalItemKind& kind, int calendarId, int since, Changes* changes) {
+    const int code = calendar_read::forEachChange(kind.view, calendarId, since, &changes->current,
+                                                  [changes](calendar_record_h record) {
+                                                      LocalChange change;
+                                                      if (!readChange(record, &change)) return;
+                                                      changes->any = true;
+                                                      if (!change.ownWrite())
+                                                          changes->foreign.push_back(std::move(change));
+                                                  });
+    if (code == PLATFORM_ERROR_NONE) return kOk;
+    SYNC_ERR("db_get_changes_by_version fail");
+    return kFailed;
 }
 
 void readSeries(LocalChange* change) {
@@ -198,11 +197,6 @@ private:
     std::map<std::pair<int, std::string>, CalEventMetaData> mInstances;  // by series and recurrence id
 };
 
-bool areOwn(const std::vector<LocalChange>& changes) {
-    return std::all_of(changes.begin(), changes.end(),
-                       [](const LocalChange& change) { return change.ownWrite(); });
-}
-
 }  // namespace
 
 bool CalManager::setChanged(int calendarId) {
@@ -210,45 +204,44 @@ bool CalManager::setChanged(int calendarId) {
     if (store == nullptr) return false;
     int since = 0;
     (void)store->books().getVersion(calendarId, &since);
-    std::vector<LocalChange> changes;
-    int current = 0;
-    return readChanges(mKind, calendarId, since, &changes, &current) == kOk && !areOwn(changes);
+    Changes changes;
+    return readChanges(mKind, calendarId, since, &changes) == kOk && !changes.foreign.empty();
 }
 
 int CalManager::passOwnWrites(int calendarId) {
     CalItemStore* store = prepared();
     int since = 0;
-    std::vector<LocalChange> changes;
-    int current = 0;
+    Changes changes;
     if (store == nullptr || store->books().getVersion(calendarId, &since) != kOk ||
-        readChanges(mKind, calendarId, since, &changes, &current) != kOk) {
+        readChanges(mKind, calendarId, since, &changes) != kOk) {
         return kFailed;
     }
-    return changes.empty() || !areOwn(changes) ? kOk : store->books().updateVersion(calendarId, current);
+    return !changes.any || !changes.foreign.empty()
+               ? kOk
+               : store->books().updateVersion(calendarId, changes.current);
 }
 
 int CalManager::setBookChanged(int calendarId) {
     CalItemStore* store = prepared();
     CalBookMetaData book;
     if (store == nullptr || store->books().get(calendarId, &book) != kOk) return kFailed;
-    std::vector<LocalChange> changes;
-    int current = 0;
-    if (readChanges(mKind, calendarId, book.sync_version, &changes, &current) != kOk) return kFailed;
+    Changes changes;
+    if (readChanges(mKind, calendarId, book.sync_version, &changes) != kOk) return kFailed;
     // A store that nobody wrote stays as it is.
-    if (changes.empty() || current <= book.sync_version) return kOk;
-    std::erase_if(changes, [](const LocalChange& change) { return change.ownWrite(); });
+    if (!changes.any || changes.current <= book.sync_version) return kOk;
     // Everything is read from the calendar service before the transaction begins.
-    for (LocalChange& change : changes) {
+    for (LocalChange& change : changes.foreign) {
         if (mKind.hasSeries() && change.status != RECORD_DELETED) readSeries(&change);
     }
     std::vector<CalEventMetaData> rows;
-    if (!changes.empty() && store->getAllItems(calendarId, &rows) != kOk) return kFailed;
+    if (!changes.foreign.empty() && store->getAllItems(calendarId, &rows) != kOk) return kFailed;
     Marker marker(mKind, *store, book, rows);
 
     // The version moves first, but only together with the marks: a walk that was cut off is walked again.
     SyncTransaction transaction(store->database());
-    if (!transaction.begun() || store->books().updateVersion(calendarId, current) != kOk) return kFailed;
-    for (const LocalChange& change : changes) {
+    if (!transaction.begun() || store->books().updateVersion(calendarId, changes.current) != kOk)
+        return kFailed;
+    for (const LocalChange& change : changes.foreign) {
         if (marker.mark(change) != kOk) return kFailed;
     }
     return transaction.commit();

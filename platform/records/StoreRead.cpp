@@ -15,9 +15,9 @@ class Snapshot {
 public:
     explicit Snapshot(Connection& connection)
         : mConnection(connection),
-          mOwn(!connection.inTransaction() && connection.run("BEGIN") == SQLITE_OK) {}
+          mOwn(!connection.inTransaction() && connection.prepare("BEGIN").step() == SQLITE_DONE) {}
     ~Snapshot() {
-        if (mOwn) (void)mConnection.run("COMMIT");
+        if (mOwn) (void)mConnection.prepare("COMMIT").step();
     }
     Snapshot(const Snapshot&) = delete;
     Snapshot& operator=(const Snapshot&) = delete;
@@ -72,13 +72,14 @@ std::string childrenOf(const View& child, const std::string& selectIds) {
 }  // namespace
 
 int Store::get(const View& view, int id, std::unique_ptr<Record>* out) {
+    if (view.table == nullptr || view.role == Role::kChild) return PLATFORM_ERROR_INVALID_PARAMETER;
     Query query(view);
     query.filters.push_back({static_cast<size_t>(view.indexOf(view.idProperty)), int64_t{id}});
-    RecordList found;
-    if (const int code = this->query(query, 0, 1, &found); code != PLATFORM_ERROR_NONE) return code;
-    if (found.records.empty()) return PLATFORM_ERROR_NOT_FOUND;
-    out->reset(found.records.front());
-    found.release();
+    std::unique_ptr<Record> found;
+    const int code = visit(query, [&found](std::unique_ptr<Record>& record) { found = std::move(record); });
+    if (code != PLATFORM_ERROR_NONE) return code;
+    if (found == nullptr) return PLATFORM_ERROR_NOT_FOUND;
+    *out = std::move(found);
     return PLATFORM_ERROR_NONE;
 }
 
@@ -188,14 +189,17 @@ int Store::visit(const Query& query, const Use& use) {
 int Store::hand(const Query& query, std::vector<std::unique_ptr<Record>>* batch, const Use& use) {
     if (batch->empty()) return PLATFORM_ERROR_NONE;
     std::map<int, Record*> byId;
-    std::string ids = "[";
+    std::string list = "[";
     for (const auto& record : *batch) {
         byId[record->id()] = record.get();
-        ids.append(ids.size() > 1 ? "," : "").append(std::to_string(record->id()));
+        list.append(list.size() > 1 ? "," : "").append(std::to_string(record->id()));
     }
-    ids += "]";
-    if (const int code =
-            readChildren(*query.view, query, "SELECT value FROM json_each(?)", {Value(ids)}, &byId);
+    list += "]";
+    // One is looked up without a table of ids.
+    const bool isOne = batch->size() == 1;
+    const Value ids = isOne ? Value(int64_t{batch->front()->id()}) : Value(std::move(list));
+    const char* const selectIds = isOne ? "?" : "SELECT value FROM json_each(?)";
+    if (const int code = readChildren(*query.view, query, selectIds, {ids}, &byId);
         code != PLATFORM_ERROR_NONE) {
         return code;
     }

@@ -1,5 +1,7 @@
 #include "common/SyncWorker.h"
 
+#include <malloc.h>
+
 #include <cerrno>
 #include <mutex>
 
@@ -115,6 +117,8 @@ int SyncWorker::addRequest() {
 gboolean SyncWorker::runRequest(gpointer data) {
     const std::shared_ptr<SyncRequest> request = fromSource<SyncRequest>(data);
     request->result = request->director->run();
+    // What the run needed goes back: the next one may be hours away.
+    malloc_trim(0);
     addResponse(request);
     return G_SOURCE_REMOVE;
 }

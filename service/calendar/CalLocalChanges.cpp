@@ -77,32 +77,22 @@ int readChanges(const CalItemKind& kind, int calendarId, int since, Changes* cha
 }
 
 void readSeries(LocalChange* change) {
-    calendar_record_h raw = nullptr;
-    if (calendar_db_get_record(_calendar_event, change->itemId, &raw) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("db_get_record fail");
-        return;
-    }
-    const CalendarRecord record(raw);
-    change->ownVersion = intOf(raw, CALENDAR_EVENT_OWN_VERSION);
-    unsigned count = 0;
-    if (calendar_record_get_child_record_count(raw, CALENDAR_EVENT_EXCEPTIONS, &count) !=
-        PLATFORM_ERROR_NONE) {
-        SYNC_ERR("get_child_record_coun fail");
-        return;
-    }
-    for (unsigned i = 0; i < count; ++i) {
-        calendar_record_h child = nullptr;
-        if (calendar_record_get_child_record_at_p(raw, CALENDAR_EVENT_EXCEPTIONS, i, &child) !=
-            PLATFORM_ERROR_NONE) {
-            SYNC_ERR("get child fail[%u]", i);
-            continue;
-        }
+    const auto readChild = [change](calendar_record_h child) {
         const int version = intOf(child, CALENDAR_EVENT_VERSION);
         change->children.push_back({.eventId = intOf(child, CALENDAR_EVENT_ID),
                                     .version = version,
                                     .ownWrite = intOf(child, CALENDAR_EVENT_SYNCED_VERSION) == version,
                                     .recurrenceId = textOf(child, CALENDAR_EVENT_RECURRENCE_ID)});
-    }
+    };
+    bool isFound = false;
+    const int code = calendar_read::forEachPart(
+        _calendar_event, CALENDAR_EVENT_ID, change->itemId,
+        {CALENDAR_EVENT_OWN_VERSION, CALENDAR_EVENT_EXCEPTIONS}, [&](calendar_record_h record) {
+            isFound = true;
+            change->ownVersion = intOf(record, CALENDAR_EVENT_OWN_VERSION);
+            calendar_read::forEachChild(record, CALENDAR_EVENT_EXCEPTIONS, readChild);
+        });
+    if (code != PLATFORM_ERROR_NONE || !isFound) SYNC_ERR("db_get_record fail");
 }
 
 // Marks the rows of one book; runs inside the store's transaction and touches nothing else.

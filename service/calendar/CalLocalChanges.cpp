@@ -3,9 +3,11 @@
 // A change is the sync's own when its version is the one stored in the row, or when the record says that the sync wrote it
 // last (the row may be missing after a crash; the next download takes such a record over).
 #include <algorithm>
+#include <optional>
 #include <unordered_map>
 
 #include "calendar/CalManager.h"
+#include "calendar/CalTransaction.h"
 #include "common/SyncLog.h"
 #include "common/SyncService.h"
 #include "platform/calendar_read.h"
@@ -93,6 +95,15 @@ void readSeries(LocalChange* change) {
             calendar_read::forEachChild(record, CALENDAR_EVENT_EXCEPTIONS, readChild);
         });
     if (code != PLATFORM_ERROR_NONE || !isFound) SYNC_ERR("db_get_record fail");
+}
+
+void readAllSeries(std::vector<LocalChange>* changes) {
+    // Taking the store's lock costs more than a record: many are read under one, and nothing is written.
+    std::optional<CalTransaction> reading;
+    if (changes->size() > 1) reading.emplace();
+    for (LocalChange& change : *changes) {
+        if (change.status != RECORD_DELETED) readSeries(&change);
+    }
 }
 
 // Marks the rows of one book; runs inside the store's transaction and touches nothing else.
@@ -220,9 +231,7 @@ int CalManager::setBookChanged(int calendarId) {
     // A store that nobody wrote stays as it is.
     if (!changes.any || changes.current <= book.sync_version) return kOk;
     // Everything is read from the calendar service before the transaction begins.
-    for (LocalChange& change : changes.foreign) {
-        if (mKind.hasSeries() && change.status != RECORD_DELETED) readSeries(&change);
-    }
+    if (mKind.hasSeries()) readAllSeries(&changes.foreign);
     std::vector<CalEventMetaData> rows;
     if (!changes.foreign.empty() && store->getAllItems(calendarId, &rows) != kOk) return kFailed;
     Marker marker(mKind, *store, book, rows);

@@ -31,6 +31,12 @@ bool readChange(contacts_record_h record, bool hasImage, CtLocalChange* change) 
     return true;
 }
 
+void checkBook(const CtLocalChange& change, int addressBookId) {
+    if (change.addressBookId != addressBookId)
+        SYNC_ERR("addressbook_id(%d) : ab_id(%d)?", addressBookId, change.addressBookId);
+    SYNC_ASSERT_TEXT(change.addressBookId == addressBookId, "!\"What the hell of this ab_id?\"");
+}
+
 int logged(int result, const char* failureText) {
     if (result != kOk) SYNC_ERR_AS("markOne", "%s", failureText);
     return result;
@@ -82,9 +88,7 @@ int read(int addressBookId, int since, Changes* changes) {
             CtLocalChange change;
             isReadable = isReadable && readChange(record, std::is_same_v<Kind, CtContactKind>, &change);
             if (!isReadable) return;
-            if (change.addressBookId != addressBookId)
-                SYNC_ERR("addressbook_id(%d) : ab_id(%d)?", addressBookId, change.addressBookId);
-            SYNC_ASSERT_TEXT(change.addressBookId == addressBookId, "!\"What the hell of this ab_id?\"");
+            checkBook(change, addressBookId);
             changes->any = true;
             if (!change.isOwnWrite()) changes->foreign.push_back(change);
         });

@@ -14,7 +14,7 @@ namespace platform {
 class StoreWatch {
 public:
     // `path` is the database's file on this machine; its folder must exist. Writes that fall together are told once, some
-    // milliseconds after the first.
+    // milliseconds after the first. A write of another file in the folder is told as well: whoever is told looks for himself.
     StoreWatch(const std::string& path, std::function<void()> onWritten);
     ~StoreWatch();
     StoreWatch(const StoreWatch&) = delete;
@@ -25,14 +25,18 @@ public:
     void again();
 
 private:
+    [[nodiscard]] bool arm();
+    void onEvents();
     static gboolean onReadable(gint fd, GIOCondition condition, gpointer self);
     static gboolean onTimeout(gpointer self);
 
-    const std::string mName;  // of the file in its folder
+    const std::string mFolder;
     const std::function<void()> mOnWritten;
     int mDescriptor = -1;
+    int mWatch = -1;  // of the folder; -1 between a notice and the look that follows it
     guint mSource = 0;
     guint mTimeout = 0;
+    gint64 mLastLook = 0;  // monotonic µs, 0: never
 };
 
 }  // namespace platform

@@ -2,11 +2,25 @@
 
 #include <sqlite3.h>
 
+#include <mutex>
+#include <set>
+
 #include "platform/log.h"
 
 namespace {
 
 constexpr int kBusyTimeoutMs = 10'000;
+
+// The open connections of the process.
+struct Connections {
+    std::mutex mutex;
+    std::set<sqlite3*> handles;
+};
+
+Connections& connections() {
+    static auto* const all = new Connections;
+    return *all;
+}
 
 int configure(sqlite3* handle) {
     sqlite3_busy_timeout(handle, kBusyTimeoutMs);
@@ -35,9 +49,20 @@ int db_util_open(const char* path, sqlite3** handle, int /*options*/) {
         return code & 0xff;
     }
     *handle = opened;
+    const std::lock_guard lock(connections().mutex);
+    connections().handles.insert(opened);
     return SQLITE_OK;
 }
 
 int db_util_close(sqlite3* handle) {
+    {
+        const std::lock_guard lock(connections().mutex);
+        connections().handles.erase(handle);
+    }
     return sqlite3_close_v2(handle);
+}
+
+void db_util_release_memory() {
+    const std::lock_guard lock(connections().mutex);
+    for (sqlite3* handle : connections().handles) sqlite3_db_release_memory(handle);
 }

@@ -53,7 +53,13 @@ Statement& Statement::bind(const std::string& value) {
 
 Statement& Statement::bind(const Value& value) {
     if (const auto* number = std::get_if<int64_t>(&value)) return bind(*number);
-    if (const auto* text = std::get_if<std::string>(&value)) return bind(*text);
+    if (const auto* text = std::get_if<std::string>(&value)) {
+        if (mpStatement != nullptr && mCode == SQLITE_OK) {
+            mCode = sqlite3_bind_text64(mpStatement, mNext++, text->data(), text->size(), SQLITE_STATIC,
+                                        SQLITE_UTF8);
+        }
+        return *this;
+    }
     return bind(timeText(std::get<calendar_time_s>(value)));
 }
 
@@ -87,20 +93,24 @@ int Connection::open(const std::string& path) {
 }
 
 void Connection::close() {
+    mByView.clear();
     mStatements.clear();
     db_util_close(std::exchange(mpHandle, nullptr));
 }
 
 Statement Connection::prepare(const std::string& sql) {
-    if (const auto known = mStatements.find(sql); known != mStatements.end())
-        return Statement(known->second.get());
+    return Statement(kept(sql));
+}
+
+sqlite3_stmt* Connection::kept(const std::string& sql) {
+    if (const auto known = mStatements.find(sql); known != mStatements.end()) return known->second.get();
     sqlite3_stmt* statement = nullptr;
     if (sqlite3_prepare_v3(mpHandle, sql.c_str(), -1, SQLITE_PREPARE_PERSISTENT, &statement, nullptr) !=
         SQLITE_OK) {
-        return Statement(nullptr);
+        return nullptr;
     }
     mStatements[sql].reset(statement);
-    return Statement(statement);
+    return statement;
 }
 
 int Connection::run(const std::string& sql) {

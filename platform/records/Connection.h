@@ -4,8 +4,10 @@
 
 #include <sqlite3.h>
 
+#include <map>
 #include <string>
 #include <unordered_map>
+#include <utility>
 
 #include "Record.h"
 
@@ -23,7 +25,9 @@ public:
 
     Statement& bind(int64_t value);
     Statement& bind(const std::string& value);
+    // A text is not copied: the value must outlive the steps.
     Statement& bind(const Value& value);
+    Statement& bind(Value&& value) = delete;
 
     // Steps once: SQLITE_ROW, SQLITE_DONE or an error.
     int step();
@@ -48,6 +52,13 @@ public:
     [[nodiscard]] bool isOpen() const { return mpHandle != nullptr; }
 
     [[nodiscard]] Statement prepare(const std::string& sql);
+    // The statement of `kind` for a view, whose text is made by the first call alone.
+    template <class MakeText>
+    [[nodiscard]] Statement prepare(const View& view, int kind, MakeText text) {
+        sqlite3_stmt*& known = mByView[{&view, kind}];
+        if (known == nullptr) known = kept(text());
+        return Statement(known);
+    }
     // Runs statements without values: SQLITE_OK or an error.
     [[nodiscard]] int run(const std::string& sql);
     [[nodiscard]] int64_t lastRowId() const { return sqlite3_last_insert_rowid(mpHandle); }
@@ -59,8 +70,12 @@ private:
     struct Finalize {
         void operator()(sqlite3_stmt* statement) const noexcept { sqlite3_finalize(statement); }
     };
+    // NULL when the text cannot be prepared.
+    [[nodiscard]] sqlite3_stmt* kept(const std::string& sql);
+
     sqlite3* mpHandle = nullptr;
     std::unordered_map<std::string, std::unique_ptr<sqlite3_stmt, Finalize>> mStatements;
+    std::map<std::pair<const View*, int>, sqlite3_stmt*> mByView;  // of those, owned by mStatements
 };
 
 }  // namespace platform::records

@@ -1,5 +1,7 @@
 #include "Record.h"
 
+#include <mutex>
+
 namespace platform::records {
 
 namespace {
@@ -18,23 +20,52 @@ Value defaultOf(const Property& property) {
     return int64_t{0};
 }
 
+// Made once for each view; views are constants.
+const std::vector<Value>& defaultsOf(const View& view) {
+    static std::mutex mutex;
+    static std::map<const View*, std::vector<Value>> all;
+    const std::lock_guard lock(mutex);
+    std::vector<Value>& defaults = all[&view];
+    if (defaults.empty()) {
+        for (const Property& property : view.properties) defaults.push_back(defaultOf(property));
+    }
+    return defaults;
+}
+
 }  // namespace
 
 Record::Record(const View& view)
-    : mView(&view), mPresent(view.properties.size(), true), mChildren(view.properties.size()) {
-    mValues.reserve(view.properties.size());
-    for (const Property& property : view.properties) mValues.push_back(defaultOf(property));
-}
+    : mView(&view),
+      mDefaults(&defaultsOf(view)),
+      mSlots(view.properties.size(), kDefault),
+      mPresent(view.properties.size(), true) {}
 
 std::unique_ptr<Record> Record::clone() const {
     auto copy = std::make_unique<Record>(*mView);
+    copy->mSlots = mSlots;
     copy->mValues = mValues;
     copy->mPresent = mPresent;
     copy->readExceptions = readExceptions;
-    for (size_t i = 0; i < mChildren.size(); ++i) {
-        for (const auto& child : mChildren[i]) copy->mChildren[i].push_back(child->clone());
+    for (const auto& [index, children] : mChildren) {
+        for (const auto& child : children) copy->mChildren[index].push_back(child->clone());
     }
     return copy;
+}
+
+void Record::setAt(size_t index, Value value) {
+    mPresent[index] = true;
+    if (mSlots[index] != kDefault) {
+        mValues[mSlots[index]] = std::move(value);
+        return;
+    }
+    mSlots[index] = static_cast<uint8_t>(mValues.size());
+    mValues.push_back(std::move(value));
+}
+
+const Record::Children& Record::children(size_t index) const {
+    static const Children kNone;
+    const auto found = mChildren.find(index);
+    return found != mChildren.end() ? found->second : kNone;
 }
 
 int64_t Record::number(unsigned property) const {
@@ -52,16 +83,18 @@ void Record::setNumber(unsigned property, int64_t value) {
 }
 
 bool Record::hasSameContent(const Record& other) const {
-    for (size_t i = 0; i < mValues.size(); ++i) {
+    for (size_t i = 0; i < mSlots.size(); ++i) {
         const Property& property = mView->properties[i];
         if (property.readOnly || property.id == mView->exceptionsProperty) continue;
         if (property.type != Type::kChildren) {
-            if (mValues[i] != other.mValues[i]) return false;
+            if (valueAt(i) != other.valueAt(i)) return false;
             continue;
         }
-        if (mChildren[i].size() != other.mChildren[i].size()) return false;
-        for (size_t child = 0; child < mChildren[i].size(); ++child) {
-            if (!mChildren[i][child]->hasSameContent(*other.mChildren[i][child])) return false;
+        const Children& mine = children(i);
+        const Children& theirs = other.children(i);
+        if (mine.size() != theirs.size()) return false;
+        for (size_t child = 0; child < mine.size(); ++child) {
+            if (!mine[child]->hasSameContent(*theirs[child])) return false;
         }
     }
     return true;

@@ -1,6 +1,8 @@
 // Record, RecordList, Query: what the services hand out. Not shared between threads.
 #pragma once
 
+#include <cstdint>
+#include <map>
 #include <memory>
 #include <string>
 #include <utility>
@@ -25,17 +27,18 @@ public:
     template <class T>
     [[nodiscard]] const T* get(unsigned property) const {
         const int index = mView->indexOf(property);
-        return index < 0 ? nullptr : std::get_if<T>(&mValues[static_cast<size_t>(index)]);
+        return index < 0 ? nullptr : std::get_if<T>(&valueAt(static_cast<size_t>(index)));
     }
     [[nodiscard]] int64_t number(unsigned property) const;
-    [[nodiscard]] const Value& valueAt(size_t index) const { return mValues[index]; }
+    [[nodiscard]] const Value& valueAt(size_t index) const {
+        return mSlots[index] != kDefault ? mValues[mSlots[index]] : (*mDefaults)[index];
+    }
     [[nodiscard]] int id() const { return static_cast<int>(number(mView->idProperty)); }
     [[nodiscard]] int seriesId() const;
 
-    void setAt(size_t index, Value value) {
-        mValues[index] = std::move(value);
-        mPresent[index] = true;
-    }
+    void setAt(size_t index, Value value);
+    // Makes room for so many values.
+    void reserve(size_t count) { mValues.reserve(count); }
     void setNumber(unsigned property, int64_t value);
 
     // Whether the property was read or set: only those are written by an update.
@@ -45,7 +48,7 @@ public:
 
     using Children = std::vector<std::unique_ptr<Record>>;
     [[nodiscard]] Children& children(size_t index) { return mChildren[index]; }
-    [[nodiscard]] const Children& children(size_t index) const { return mChildren[index]; }
+    [[nodiscard]] const Children& children(size_t index) const;
 
     // Whether both say the same in every property that a user can set, attendees and the like included, exceptions not.
     [[nodiscard]] bool hasSameContent(const Record& other) const;
@@ -53,10 +56,14 @@ public:
     std::vector<int> readExceptions;  // ids of the exceptions that the record was read with
 
 private:
+    // Most records hold few of their view's properties: only what was set takes room.
+    static constexpr uint8_t kDefault = 0xff;
     const View* mView;
-    std::vector<Value> mValues;       // by position in the view
-    std::vector<bool> mPresent;       // likewise
-    std::vector<Children> mChildren;  // likewise, empty for other properties
+    const std::vector<Value>* mDefaults;   // of the view, by position
+    std::vector<uint8_t> mSlots;           // by position in the view: where the value is, or kDefault
+    std::vector<Value> mValues;            // in the order in which they were set
+    std::vector<bool> mPresent;            // by position in the view
+    std::map<size_t, Children> mChildren;  // by position in the view
 };
 
 class RecordList {

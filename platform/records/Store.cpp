@@ -157,8 +157,9 @@ int Store::makeSchema() {
 
 std::string Store::tableText(const View& view) const {
     const std::string table = view.table;
-    std::string text = "CREATE TABLE IF NOT EXISTS " + table + "(id INTEGER PRIMARY KEY AUTOINCREMENT";
-    if (view.role == Role::kChild) text += ", parent INTEGER NOT NULL";
+    std::string text = "CREATE TABLE IF NOT EXISTS " + table + "(id INTEGER PRIMARY KEY";
+    // Nobody outside knows a child by its id: that may come again.
+    text += view.role == Role::kChild ? ", parent INTEGER NOT NULL" : " AUTOINCREMENT";
     if (view.role != Role::kChild)
         text +=
             ", created_version INTEGER NOT NULL, version INTEGER NOT NULL, synced_version INTEGER NOT NULL, "

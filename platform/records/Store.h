@@ -60,6 +60,12 @@ public:
     [[nodiscard]] int get(const View& view, int id, std::unique_ptr<Record>* out);
     [[nodiscard]] int query(const Query& query, int offset, int limit, RecordList* out);
     [[nodiscard]] int changes(const View& view, int bookId, int since, RecordList* out, int* current);
+    // One record at a time, of one state of the store, in no particular order. `use` runs with the lock held and may take the
+    // record over; it must not call the store.
+    using Use = std::function<void(std::unique_ptr<Record>& record)>;
+    [[nodiscard]] int visit(const Query& query, const Use& use);
+    // As changes(), one at a time.
+    [[nodiscard]] int visitChanges(const View& view, int bookId, int since, const Use& use, int* current);
     [[nodiscard]] int currentVersion(int* version);
     [[nodiscard]] int lastChangeVersion(int* version);
 
@@ -127,6 +133,10 @@ private:
     [[nodiscard]] int checkBook(const View& view, int bookId);
 
     // Reading.
+    struct Selected;
+    [[nodiscard]] static Selected select(const Query& query, const std::string& condition,
+                                         const std::string& tail);
+    [[nodiscard]] int hand(const Query& query, std::vector<std::unique_ptr<Record>>* batch, const Use& use);
     [[nodiscard]] int readRecords(const Query& query, const std::string& condition,
                                   const std::vector<Value>& values, const std::string& tail,
                                   std::vector<std::unique_ptr<Record>>* out);

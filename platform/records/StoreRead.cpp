@@ -8,14 +8,16 @@ namespace platform::records {
 
 namespace {
 
+constexpr size_t kFeedValues = 6;  // of a change feed's record
+
 // A read transaction, unless the thread has a transaction open already: several statements see one state.
 class Snapshot {
 public:
     explicit Snapshot(Connection& connection)
         : mConnection(connection),
-          mOwn(!connection.inTransaction() && connection.run("BEGIN") == SQLITE_OK) {}
+          mOwn(!connection.inTransaction() && connection.prepare("BEGIN").step() == SQLITE_DONE) {}
     ~Snapshot() {
-        if (mOwn) (void)mConnection.run("COMMIT");
+        if (mOwn) (void)mConnection.prepare("COMMIT").step();
     }
     Snapshot(const Snapshot&) = delete;
     Snapshot& operator=(const Snapshot&) = delete;
@@ -70,13 +72,14 @@ std::string childrenOf(const View& child, const std::string& selectIds) {
 }  // namespace
 
 int Store::get(const View& view, int id, std::unique_ptr<Record>* out) {
+    if (view.table == nullptr || view.role == Role::kChild) return PLATFORM_ERROR_INVALID_PARAMETER;
     Query query(view);
     query.filters.push_back({static_cast<size_t>(view.indexOf(view.idProperty)), int64_t{id}});
-    RecordList found;
-    if (const int code = this->query(query, 0, 1, &found); code != PLATFORM_ERROR_NONE) return code;
-    if (found.records.empty()) return PLATFORM_ERROR_NOT_FOUND;
-    out->reset(found.records.front());
-    found.release();
+    std::unique_ptr<Record> found;
+    const int code = visit(query, [&found](std::unique_ptr<Record>& record) { found = std::move(record); });
+    if (code != PLATFORM_ERROR_NONE) return code;
+    if (found == nullptr) return PLATFORM_ERROR_NOT_FOUND;
+    *out = std::move(found);
     return PLATFORM_ERROR_NONE;
 }
 
@@ -97,43 +100,112 @@ int Store::query(const Query& query, int offset, int limit, RecordList* out) {
     return PLATFORM_ERROR_NONE;
 }
 
-int Store::readRecords(const Query& query, const std::string& condition, const std::vector<Value>& values,
-                       const std::string& tail, std::vector<std::unique_ptr<Record>>* out) {
-    const View& view = *query.view;
-    std::string columns = "id";
-    std::vector<size_t> read;
+// The statement that reads a query's records, and what its columns are.
+struct Store::Selected {
+    std::string sql;
+    std::vector<size_t> read;  // the properties behind the id
     bool readsChildren = false;
+
+    [[nodiscard]] std::unique_ptr<Record> recordOf(const View& view, const Statement& statement) const {
+        auto record = std::make_unique<Record>(view);
+        record->reserve(read.size() + 1);
+        record->setAllPresent(false);
+        record->setNumber(view.idProperty, statement.integer(0));
+        for (size_t k = 0; k < read.size(); ++k) {
+            record->setAt(read[k], statement.value(static_cast<int>(k) + 1, view.properties[read[k]].type));
+        }
+        return record;
+    }
+};
+
+Store::Selected Store::select(const Query& query, const std::string& condition, const std::string& tail) {
+    const View& view = *query.view;
+    Selected selected;
+    std::string columns = "id";
     for (size_t i = 0; i < view.properties.size(); ++i) {
         if (!isRead(query, i)) continue;
         if (view.properties[i].type == Type::kChildren) {
-            readsChildren = true;
+            selected.readsChildren = true;
         } else {
             columns += std::string(", ") + view.properties[i].column;
-            read.push_back(i);
+            selected.read.push_back(i);
         }
     }
+    selected.sql = "SELECT " + columns + " FROM " + view.table + condition + tail;
+    return selected;
+}
+
+int Store::readRecords(const Query& query, const std::string& condition, const std::vector<Value>& values,
+                       const std::string& tail, std::vector<std::unique_ptr<Record>>* out) {
+    const View& view = *query.view;
+    const Selected selected = select(query, condition, tail);
     std::map<int, Record*> byId;
     {
-        Statement statement =
-            mConnection.prepare("SELECT " + columns + " FROM " + view.table + condition + tail);
+        Statement statement = mConnection.prepare(selected.sql);
         for (const Value& value : values) statement.bind(value);
         int code = statement.step();
         for (; code == SQLITE_ROW; code = statement.step()) {
-            auto record = std::make_unique<Record>(view);
-            record->setAllPresent(false);
-            record->setNumber(view.idProperty, statement.integer(0));
-            for (size_t k = 0; k < read.size(); ++k) {
-                record->setAt(read[k],
-                              statement.value(static_cast<int>(k) + 1, view.properties[read[k]].type));
-            }
-            if (readsChildren) byId[record->id()] = record.get();
+            auto record = selected.recordOf(view, statement);
+            if (selected.readsChildren) byId[record->id()] = record.get();
             out->push_back(std::move(record));
         }
         if (code != SQLITE_DONE) return codeOf(code);
     }
-    if (!readsChildren || byId.empty()) return PLATFORM_ERROR_NONE;
+    if (!selected.readsChildren || byId.empty()) return PLATFORM_ERROR_NONE;
     return readChildren(view, query, std::string("SELECT id FROM ") + view.table + condition + tail, values,
                         &byId);
+}
+
+int Store::visit(const Query& query, const Use& use) {
+    const View& view = *query.view;
+    if (view.table == nullptr || view.role == Role::kChild || query.sortIndex >= 0)
+        return PLATFORM_ERROR_INVALID_PARAMETER;
+    const std::lock_guard lock(mMutex);
+    if (!mConnection.isOpen()) return PLATFORM_ERROR_DATABASE;
+    const Snapshot snapshot(mConnection);
+    std::vector<Value> values;
+    const std::string condition = conditionOf(query, &values);
+    // Without an order the rows come as the index has them, and none waits for the last.
+    const Selected selected = select(query, condition, "");
+    Statement statement = mConnection.prepare(selected.sql);
+    for (const Value& value : values) statement.bind(value);
+    constexpr size_t kAtOnce = 128;
+    std::vector<std::unique_ptr<Record>> batch;
+    int code = statement.step();
+    for (; code == SQLITE_ROW; code = statement.step()) {
+        auto record = selected.recordOf(view, statement);
+        if (!selected.readsChildren) {
+            use(record);
+            continue;
+        }
+        batch.push_back(std::move(record));
+        if (batch.size() < kAtOnce) continue;
+        if (const int handed = hand(query, &batch, use); handed != PLATFORM_ERROR_NONE) return handed;
+    }
+    return code == SQLITE_DONE ? hand(query, &batch, use) : codeOf(code);
+}
+
+// Gives the records their children, hands them out and empties the batch.
+int Store::hand(const Query& query, std::vector<std::unique_ptr<Record>>* batch, const Use& use) {
+    if (batch->empty()) return PLATFORM_ERROR_NONE;
+    std::map<int, Record*> byId;
+    std::string list = "[";
+    for (const auto& record : *batch) {
+        byId[record->id()] = record.get();
+        list.append(list.size() > 1 ? "," : "").append(std::to_string(record->id()));
+    }
+    list += "]";
+    // One is looked up without a table of ids.
+    const bool isOne = batch->size() == 1;
+    const Value ids = isOne ? Value(int64_t{batch->front()->id()}) : Value(std::move(list));
+    const char* const selectIds = isOne ? "?" : "SELECT value FROM json_each(?)";
+    if (const int code = readChildren(*query.view, query, selectIds, {ids}, &byId);
+        code != PLATFORM_ERROR_NONE) {
+        return code;
+    }
+    for (auto& record : *batch) use(record);
+    batch->clear();
+    return PLATFORM_ERROR_NONE;
 }
 
 int Store::readChildren(const View& view, const Query& query, const std::string& selectIds,
@@ -183,6 +255,16 @@ int Store::readChildren(const View& view, const Query& query, const std::string&
 }
 
 int Store::changes(const View& view, int bookId, int since, RecordList* out, int* current) {
+    RecordList found;
+    const auto keep = [&found](std::unique_ptr<Record>& record) {
+        found.records.push_back(record.release());
+    };
+    const int code = visitChanges(view, bookId, since, keep, current);
+    if (code == PLATFORM_ERROR_NONE) out->records.swap(found.records);
+    return code;
+}
+
+int Store::visitChanges(const View& view, int bookId, int since, const Use& use, int* current) {
     if (view.role != Role::kItem || view.feed == nullptr) return PLATFORM_ERROR_INVALID_PARAMETER;
     const FeedShape& feed = *view.feed;
     const std::lock_guard lock(mMutex);
@@ -206,10 +288,10 @@ int Store::changes(const View& view, int bookId, int since, RecordList* out, int
     const int64_t inBook = bookId;
     statement.bind(from).bind(inBook).bind(from).bind(inBook).bind(from).bind(from).bind(
         std::string(view.uri));
-    RecordList found;
     int code = statement.step();
     for (; code == SQLITE_ROW; code = statement.step()) {
         auto record = std::make_unique<Record>(*feed.view);
+        record->reserve(kFeedValues);
         record->setNumber(feed.id, statement.integer(0));
         record->setNumber(feed.book, bookId);
         record->setNumber(feed.change, statement.integer(1));
@@ -217,10 +299,9 @@ int Store::changes(const View& view, int bookId, int since, RecordList* out, int
         record->setNumber(feed.syncedVersion, statement.integer(3));
         if (feed.filesChanged != 0)
             record->setNumber(feed.filesChanged, statement.integer(4) > since ? 1 : 0);
-        found.records.push_back(record.release());
+        use(record);
     }
     if (code != SQLITE_DONE) return codeOf(code);
-    out->records.swap(found.records);
     *current = version;
     return PLATFORM_ERROR_NONE;
 }

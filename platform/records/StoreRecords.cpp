@@ -12,9 +12,22 @@ bool isDone(int code) {
     return code == SQLITE_DONE;
 }
 
-// "UPDATE" and "INSERT" lists are made per view once and kept as prepared statements by their text.
+// Statements that are the same for every record of a view.
+enum Kept { kInsertRow, kInsertChild, kClearChildren, kLoad, kFindBook };
+
 bool isColumn(const Property& property) {
     return property.column != nullptr && !property.readOnly;
+}
+
+std::string insertItem(const View& view) {
+    std::string columns = "created_version, version, own_version, synced_version";
+    std::string places = "?, ?, ?, ?";
+    for (const Property& property : view.properties) {
+        if (!isColumn(property)) continue;
+        columns += std::string(", ") + property.column;
+        places += ", ?";
+    }
+    return std::string("INSERT INTO ") + view.table + "(" + columns + ") VALUES(" + places + ")";
 }
 
 std::string insertChild(const View& child) {
@@ -31,12 +44,13 @@ std::string insertChild(const View& child) {
 }  // namespace
 
 int Store::load(const View& view, int id, Stored* stored) {
-    std::string sql = "SELECT version, synced_version, ";
-    sql += view.bookProperty != 0 ? view.columnOf(view.bookProperty) : "0";
-    sql += ", ";
-    sql += view.hasSeries() ? view.columnOf(view.seriesProperty) : "0";
-    sql += std::string(" FROM ") + view.table + " WHERE id = ?";
-    Statement statement = mConnection.prepare(sql);
+    Statement statement = mConnection.prepare(view, kLoad, [&view] {
+        std::string sql = "SELECT version, synced_version, ";
+        sql += view.bookProperty != 0 ? view.columnOf(view.bookProperty) : "0";
+        sql += ", ";
+        sql += view.hasSeries() ? view.columnOf(view.seriesProperty) : "0";
+        return sql + " FROM " + view.table + " WHERE id = ?";
+    });
     const int code = statement.bind(int64_t{id}).step();
     if (isDone(code)) return PLATFORM_ERROR_NOT_FOUND;
     if (code != SQLITE_ROW) return codeOf(code);
@@ -78,21 +92,16 @@ int Store::touchSeries(Write& write, const View& view, int seriesId) {
 }
 
 int Store::checkBook(const View& view, int bookId) {
-    const View* books = viewOf(view.bookView);
-    if (view.bookTypeProperty == 0) {
-        Statement statement =
-            mConnection.prepare(std::string("SELECT 1 FROM ") + books->table + " WHERE id = ?");
-        const int code = statement.bind(int64_t{bookId}).step();
-        if (code == SQLITE_ROW) return PLATFORM_ERROR_NONE;
-        return isDone(code) ? PLATFORM_ERROR_INVALID_PARAMETER : codeOf(code);
-    }
-    Statement statement =
-        mConnection.prepare(std::string("SELECT ") + books->columnOf(view.bookTypeProperty) + " FROM " +
-                            books->table + " WHERE id = ?");
+    Statement statement = mConnection.prepare(view, kFindBook, [this, &view] {
+        const View* books = viewOf(view.bookView);
+        const char* type = view.bookTypeProperty != 0 ? books->columnOf(view.bookTypeProperty) : "NULL";
+        return std::string("SELECT ") + type + " FROM " + books->table + " WHERE id = ?";
+    });
     const int code = statement.bind(int64_t{bookId}).step();
     if (isDone(code)) return PLATFORM_ERROR_INVALID_PARAMETER;
     if (code != SQLITE_ROW) return codeOf(code);
-    return statement.integer(0) == view.bookType ? PLATFORM_ERROR_NONE : PLATFORM_ERROR_INVALID_PARAMETER;
+    const bool fits = view.bookTypeProperty == 0 || statement.integer(0) == view.bookType;
+    return fits ? PLATFORM_ERROR_NONE : PLATFORM_ERROR_INVALID_PARAMETER;
 }
 
 int Store::insertOne(Write& write, Record& record, int expected) {
@@ -125,15 +134,7 @@ int Store::insertOne(Write& write, Record& record, int expected) {
 
 int Store::insertRow(Write& write, Record& record, int bookId) {
     const View& view = record.view();
-    std::string columns = "created_version, version, own_version, synced_version";
-    std::string places = "?, ?, ?, ?";
-    for (const Property& property : view.properties) {
-        if (!isColumn(property)) continue;
-        columns += std::string(", ") + property.column;
-        places += ", ?";
-    }
-    Statement statement = mConnection.prepare(std::string("INSERT INTO ") + view.table + "(" + columns +
-                                              ") VALUES(" + places + ")");
+    Statement statement = mConnection.prepare(view, kInsertRow, [&view] { return insertItem(view); });
     const int64_t version = write.version();
     statement.bind(version).bind(version).bind(version).bind(write.bySync() ? version : int64_t{0});
     if (view.bookProperty != 0) record.setNumber(view.bookProperty, bookId);
@@ -157,13 +158,19 @@ int Store::writeChildren(Record& record, int id, ChildWrite how, int version) {
         const Property& property = view.properties[i];
         if (property.type != Type::kChildren || property.id == view.exceptionsProperty) continue;
         if (how == ChildWrite::kIfPresent && !record.isPresent(i)) continue;
+        const Record::Children& children = std::as_const(record).children(i);
+        // A record that was just inserted has none to be cleared.
+        if (how == ChildWrite::kFirst && children.empty()) continue;
         const View& child = *viewOf(property.childView);
-        Statement clear =
-            mConnection.prepare(std::string("DELETE FROM ") + child.table + " WHERE parent = ?");
-        if (const int code = clear.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);
-        const std::string sql = insertChild(child);
-        for (const auto& entry : record.children(i)) {
-            Statement insert = mConnection.prepare(sql);
+        if (how != ChildWrite::kFirst) {
+            Statement clear = mConnection.prepare(child, kClearChildren, [&child] {
+                return std::string("DELETE FROM ") + child.table + " WHERE parent = ?";
+            });
+            if (const int code = clear.bind(int64_t{id}).step(); !isDone(code)) return codeOf(code);
+        }
+        for (const auto& entry : children) {
+            Statement insert =
+                mConnection.prepare(child, kInsertChild, [&child] { return insertChild(child); });
             insert.bind(int64_t{id});
             for (size_t k = 0; k < child.properties.size(); ++k) {
                 if (isColumn(child.properties[k])) insert.bind(entry->valueAt(k));
@@ -181,7 +188,9 @@ int Store::keepFiles(Record& record, int id, ChildWrite how, int version) {
     const View& files = filesOf(view);
     const std::string column = files.properties[0].column;
     std::set<std::string> before;
-    {
+    if (how == ChildWrite::kFirst && std::as_const(record).children(index).empty())
+        return PLATFORM_ERROR_NONE;
+    if (how != ChildWrite::kFirst) {
         Statement statement =
             mConnection.prepare("SELECT " + column + " FROM " + files.table + " WHERE parent = ?");
         int code = statement.bind(int64_t{id}).step();

@@ -52,6 +52,10 @@ struct View {
     unsigned keptOnReplace = 0;  // a property of the series that a replacement keeps
 
     [[nodiscard]] int indexOf(unsigned property) const {
+        // The tables list their properties in the order of the ids.
+        const size_t expected = properties.empty() ? 0 : property - properties.front().id;
+        if (expected < properties.size() && properties[expected].id == property)
+            return static_cast<int>(expected);
         for (size_t i = 0; i < properties.size(); ++i) {
             if (properties[i].id == property) return static_cast<int>(i);
         }

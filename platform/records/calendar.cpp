@@ -30,3 +30,12 @@ int calendar_db_get_changes_by_version(const char* view, int book_id, int versio
         return calendarStore().changes(*found, book_id, version, list, current_version);
     });
 }
+
+int calendar_db_for_each_change(const char* view, int book_id, int version, calendar_record_cb use,
+                                void* user_data, int* current_version) {
+    const View* found = calendarStore().viewOf(view);
+    if (found == nullptr || use == nullptr || current_version == nullptr) return kInvalid;
+    return calendarStore().visitChanges(
+        *found, book_id, version, [use, user_data](auto& record) { use(record.get(), user_data); },
+        current_version);
+}

@@ -12,56 +12,20 @@ using sync_result::kOk;
 
 namespace {
 
-int readRecordStates(const CalItemKind& kind, int bookId, std::unordered_map<int, CalRecordState>* states) {
-    std::vector<unsigned> properties = {kind.id, kind.version, kind.syncedVersion, kind.uid, kind.etag};
-    if (kind.hasSeries())
-        properties.insert(properties.end(), {kind.ownVersion, kind.seriesId, kind.recurrenceId});
-    calendar_query_h rawQuery = nullptr;
-    if (calendar_query_create(kind.view, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
-    const CalendarQuery query(rawQuery);
-    calendar_list_h rawList = nullptr;
-    if (calendar_query_add_filter_int(query.get(), kind.bookId, bookId) != PLATFORM_ERROR_NONE ||
-        calendar_query_set_projection(query.get(), properties.data(), properties.size()) !=
-            PLATFORM_ERROR_NONE ||
-        calendar_db_get_records_with_query(query.get(), 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("get_records_with_query fail");
-        return kFailed;
-    }
-    const CalendarList list(rawList);
-    calendar_read::forEach(list.get(), [&kind, states](calendar_record_h record) {
-        CalRecordState state;
-        state.version = intOf(record, kind.version);
-        state.ownVersion = intOf(record, kind.ownVersion);
-        state.syncedVersion = intOf(record, kind.syncedVersion);
-        state.uid = textOf(record, kind.uid);
-        state.etag = textOf(record, kind.etag);
-        if (kind.hasSeries()) {
-            state.originalEventId = intOf(record, kind.seriesId);
-            state.recurrenceId = textOf(record, kind.recurrenceId);
-        }
-        states->emplace(intOf(record, kind.id), std::move(state));
-    });
-    return kOk;
-}
-
 // Items that a user deleted since the book's changes were last examined.
 int readUnseenDeletions(const CalItemKind& kind, const CalBookMetaData& book,
                         std::unordered_set<int>* eventIds) {
-    calendar_list_h rawList = nullptr;
     int current = 0;
-    if (calendar_db_get_changes_by_version(kind.view, book.calendar_id, book.sync_version, &rawList,
-                                           &current) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("db_get_changes_by_version fail");
-        return kFailed;
-    }
-    const CalendarList list(rawList);
-    calendar_read::forEach(list.get(), [eventIds](calendar_record_h record) {
-        const bool deleted = intOf(record, CALENDAR_UPDATED_INFO_MODIFIED_STATUS) == RECORD_DELETED;
-        const bool own = intOf(record, CALENDAR_UPDATED_INFO_SYNCED_VERSION) ==
-                         intOf(record, CALENDAR_UPDATED_INFO_VERSION);
-        if (deleted && !own) eventIds->insert(intOf(record, CALENDAR_UPDATED_INFO_ID));
-    });
-    return kOk;
+    const int code = calendar_read::forEachChange(
+        kind.view, book.calendar_id, book.sync_version, &current, [eventIds](calendar_record_h record) {
+            const bool deleted = intOf(record, CALENDAR_UPDATED_INFO_MODIFIED_STATUS) == RECORD_DELETED;
+            const bool own = intOf(record, CALENDAR_UPDATED_INFO_SYNCED_VERSION) ==
+                             intOf(record, CALENDAR_UPDATED_INFO_VERSION);
+            if (deleted && !own) eventIds->insert(intOf(record, CALENDAR_UPDATED_INFO_ID));
+        });
+    if (code == PLATFORM_ERROR_NONE) return kOk;
+    SYNC_ERR("db_get_changes_by_version fail");
+    return kFailed;
 }
 
 }  // namespace
@@ -69,23 +33,47 @@ int readUnseenDeletions(const CalItemKind& kind, const CalBookMetaData& book,
 int CalBookSnapshot::load(CalItemStore& store, const CalBookMetaData& book) {
     mBook = book;
     // Rows before records: a record that appears in between is the user's own and has no row to be compared with.
-    if (store.getAllItems(book.calendar_id, &mRows) != kOk) return kFailed;
-    if (readRecordStates(mKind, book.calendar_id, &mRecords) != kOk) return kFailed;
-
-    std::unordered_set<int> withRow;
-    bool someMissing = false;
-    for (size_t i = 0; i < mRows.size(); ++i) {
-        index(i);
-        withRow.insert(mRows[i].event_id);
-        someMissing = someMissing || (mRows[i].event_id > 0 && record(mRows[i].event_id) == nullptr);
+    std::vector<CalEventMetaData> rows;
+    if (store.getAllItems(book.calendar_id, &rows) != kOk) return kFailed;
+    for (CalEventMetaData& row : rows) {
+        mRows.push_back(std::move(row));
+        index(mRows.size() - 1);
     }
-    for (const auto& [eventId, state] : mRecords) {
-        if (state.syncedVersion != 0 && !state.uid.empty() && !withRow.contains(eventId)) {
-            mOrphans.emplace(state.uid, eventId);
-        }
-    }
+    rows = {};
+    if (readRecordStates() != kOk) return kFailed;
     readUnconfirmed();
+    const bool someMissing = std::any_of(mRows.begin(), mRows.end(), [this](const CalEventMetaData& row) {
+        return row.event_id > 0 && record(row.event_id) == nullptr;
+    });
     return someMissing ? readUnseenDeletions(mKind, book, &mDeletedByUser) : kOk;
+}
+
+int CalBookSnapshot::readRecordStates() {
+    std::unordered_map<int, const CalEventMetaData*> rows;
+    for (const CalEventMetaData& row : mRows) rows.emplace(row.event_id, &row);
+    std::vector<unsigned> properties = {mKind.id, mKind.version, mKind.syncedVersion, mKind.uid, mKind.etag};
+    if (mKind.hasSeries()) properties.push_back(mKind.ownVersion);
+    const auto take = [&](calendar_record_h record) {
+        const int eventId = intOf(record, mKind.id);
+        const std::string uid = textOf(record, mKind.uid);
+        CalRecordState state;
+        state.version = intOf(record, mKind.version);
+        state.ownVersion = intOf(record, mKind.ownVersion);
+        state.syncedVersion = intOf(record, mKind.syncedVersion);
+        state.etag = textOf(record, mKind.etag);
+        if (const auto row = rows.find(eventId); row != rows.end()) {
+            state.isBehind = state.etag != row->second->etag || uid != row->second->uri;
+            state.etag = {};
+        } else if (state.syncedVersion != 0 && !uid.empty()) {
+            mOrphans.emplace(uid, eventId);
+        }
+        mRecords.emplace(eventId, std::move(state));
+    };
+    const int code =
+        calendar_read::forEachPart(mKind.view, mKind.bookId, mBook.calendar_id, properties, take);
+    if (code == PLATFORM_ERROR_NONE) return kOk;
+    SYNC_ERR("get_records_with_query fail");
+    return kFailed;
 }
 
 void CalBookSnapshot::readUnconfirmed() {
@@ -171,8 +159,7 @@ bool CalBookSnapshot::hasChangedInstance(int seriesEventId) const {
 
 bool CalBookSnapshot::isBehindRow(const CalEventMetaData& row) const {
     const CalRecordState* state = record(row.event_id);
-    return state != nullptr && (state->etag != row.etag || state->uid != row.uri) && !hasLocalChange(row) &&
-           !hasUnseenChange(row);
+    return state != nullptr && state->isBehind && !hasLocalChange(row) && !hasUnseenChange(row);
 }
 
 bool CalBookSnapshot::hasUnseenChange(const CalEventMetaData& row) const {
@@ -189,8 +176,12 @@ void CalBookSnapshot::put(const CalEventMetaData& row) {
                                         : rowByUri(row.uri);
     size_t position = mRows.size();
     if (sameRow(known)) {
-        position = static_cast<size_t>(known - mRows.data());
-        mRows[position] = row;
+        position = row.original_event_id != 0 ? mInstances.at({row.original_event_id, row.recurrence_id})
+                                              : mByUri.at(row.uri);
+        // The text that names the row stays where it is.
+        CalEventMetaData fresh = row;
+        fresh.uri.swap(mRows[position].uri);
+        mRows[position] = std::move(fresh);
     } else {
         mRows.push_back(row);
     }

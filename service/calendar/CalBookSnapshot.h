@@ -2,8 +2,10 @@
 // Owner: one syncEventPage run.   Threads: one worker. Memory: ids, uris, etags and versions, never event bodies.
 #pragma once
 
+#include <deque>
 #include <map>
 #include <string>
+#include <string_view>
 #include <unordered_map>
 #include <unordered_set>
 #include <utility>
@@ -17,10 +19,8 @@ struct CalRecordState {
     int version = 0;        // of its last write (a series: also of its exceptions)
     int ownVersion = 0;     // of its last write, exceptions left out
     int syncedVersion = 0;  // of the sync's own last write, 0 when it never wrote it
-    int originalEventId = 0;
-    std::string uid;
-    std::string etag;  // as stored with the sync's own last write
-    std::string recurrenceId;
+    std::string etag;       // as stored with the sync's own last write; only of a record without a row
+    bool isBehind = false;  // its uid or etag is not its row's
     bool hasDates = false;  // cancelled instances; known of an item that may have reached the server
 
     [[nodiscard]] bool isEnginesOwnWrite() const { return syncedVersion != 0 && syncedVersion == version; }
@@ -70,14 +70,15 @@ public:
 private:
     using InstanceKey = std::pair<int, std::string>;
 
+    [[nodiscard]] int readRecordStates();
     void index(size_t position);
     void readUnconfirmed();
 
     const CalItemKind& mKind;
     CalBookMetaData mBook;
-    std::vector<CalEventMetaData> mRows;
-    std::unordered_map<std::string, size_t> mByUri;
-    std::unordered_map<int, size_t> mByEventId;  // ordinary events
+    std::deque<CalEventMetaData> mRows;                   // never moved
+    std::unordered_map<std::string_view, size_t> mByUri;  // by the rows' own texts
+    std::unordered_map<int, size_t> mByEventId;           // ordinary events
     std::map<InstanceKey, size_t> mInstances;
     std::unordered_map<int, CalRecordState> mRecords;
     std::unordered_map<std::string, int> mOrphans;    // by server id

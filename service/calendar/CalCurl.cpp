@@ -216,20 +216,25 @@ int inflateGzip(const std::string& body, std::string* out, size_t maxBytes) {
     if (inflateInit2(&stream, kGzipWindowBits) != Z_OK) return kFailed;
     stream.next_in = const_cast<Bytef*>(reinterpret_cast<const Bytef*>(body.data()));
     stream.avail_in = static_cast<uInt>(body.size());
-    std::string text(body.size(), '\0');
+    constexpr size_t kUsualGrowth = 4;  // of the text of a page; from there on the space doubles
+    std::string text(std::min(body.size() * kUsualGrowth, maxBytes) + 1, '\0');
     int code = Z_OK;
     while (code == Z_OK) {
-        if (stream.total_out >= text.size()) text.resize(text.size() + body.size() / 2 + 1, '\0');
-        if (text.size() > maxBytes) {
-            SYNC_ERR("the server's answer inflates to more than %zu bytes, it is not taken", maxBytes);
-            break;
+        if (stream.total_out >= text.size()) {
+            if (text.size() > maxBytes) break;
+            text.resize(std::min(text.size() * 2, maxBytes + 1), '\0');
         }
         stream.next_out = reinterpret_cast<Bytef*>(text.data() + stream.total_out);
         stream.avail_out = static_cast<uInt>(text.size() - stream.total_out);
         code = inflate(&stream, Z_SYNC_FLUSH);
     }
     const size_t length = stream.total_out;
-    if (inflateEnd(&stream) != Z_OK || code != Z_STREAM_END) return kFailed;
+    const bool isComplete = inflateEnd(&stream) == Z_OK && code == Z_STREAM_END;
+    if (length > maxBytes) {
+        SYNC_ERR("the server's answer inflates to more than %zu bytes, it is not taken", maxBytes);
+        return kFailed;
+    }
+    if (!isComplete) return kFailed;
     text.resize(length);
     // A text ends at its first zero byte. More than zeros behind it is a broken reply; cut there, a list could prove a deletion.
     const size_t end = std::min(length, text.find('\0'));

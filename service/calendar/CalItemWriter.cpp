@@ -355,13 +355,9 @@ void CalItemWriter::remember(const CalPagePlan& plan, const Batch& batch) {
     const auto rememberRow = [this](const CalEventMetaData& row, bool written) {
         mpSnapshot->put(row);
         if (!written || row.event_id <= 0) return;
-        mpSnapshot->putRecord(row.event_id, {.version = row.version,
-                                             .ownVersion = row.version,
-                                             .syncedVersion = row.version,
-                                             .originalEventId = row.original_event_id,
-                                             .uid = row.uri,
-                                             .etag = row.etag,
-                                             .recurrenceId = row.recurrence_id});
+        mpSnapshot->putRecord(
+            row.event_id,
+            {.version = row.version, .ownVersion = row.version, .syncedVersion = row.version, .etag = {}});
     };
     for (const PlannedEvent& planned : plan.events) {
         const bool rowOnly = planned.rowWrite == RowWrite::kUpdate && planned.expectedVersion == kAnyVersion;

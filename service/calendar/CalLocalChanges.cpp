@@ -3,9 +3,11 @@
 // A change is the sync's own when its version is the one stored in the row, or when the record says that the sync wrote it
 // last (the row may be missing after a crash; the next download takes such a record over).
 #include <algorithm>
+#include <optional>
 #include <unordered_map>
 
 #include "calendar/CalManager.h"
+#include "calendar/CalTransaction.h"
 #include "common/SyncLog.h"
 #include "common/SyncService.h"
 #include "platform/calendar_read.h"
@@ -55,54 +57,52 @@ bool readChange(calendar_record_h record, LocalChange* change) {
     return true;
 }
 
-int readChanges(const CalItemKind& kind, int calendarId, int since, std::vector<LocalChange>* changes,
-                int* current) {
-    calendar_list_h rawList = nullptr;
-    if (calendar_db_get_changes_by_version(kind.view, calendarId, since, &rawList, current) !=
-        PLATFORM_ERROR_NONE) {
-        SYNC_ERR("db_get_changes_by_version fail");
-        return kFailed;
-    }
-    const CalendarList list(rawList);
-    for (int code = calendar_list_first(rawList); code == PLATFORM_ERROR_NONE;
-         code = calendar_list_next(rawList)) {
-        calendar_record_h record = nullptr;
-        LocalChange change;
-        if (calendar_list_get_current_record_p(rawList, &record) != PLATFORM_ERROR_NONE) {
-            SYNC_ERR("list_get_current_record_p fail");
-        } else if (readChange(record, &change)) {
-            changes->push_back(std::move(change));
-        }
-    }
-    return kOk;
+// What others than the sync changed, and whether there was anything at all.
+struct Changes {
+    std::vector<LocalChange> foreign;
+    bool any = false;
+    int current = 0;
+};
+
+int readChanges(const CalItemKind& kind, int calendarId, int since, Changes* changes) {
+    const int code = calendar_read::forEachChange(kind.view, calendarId, since, &changes->current,
+                                                  [changes](calendar_record_h record) {
+                                                      LocalChange change;
+                                                      if (!readChange(record, &change)) return;
+                                                      changes->any = true;
+                                                      if (!change.ownWrite())
+                                                          changes->foreign.push_back(std::move(change));
+                                                  });
+    if (code == PLATFORM_ERROR_NONE) return kOk;
+    SYNC_ERR("db_get_changes_by_version fail");
+    return kFailed;
 }
 
 void readSeries(LocalChange* change) {
-    calendar_record_h raw = nullptr;
-    if (calendar_db_get_record(_calendar_event, change->itemId, &raw) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("db_get_record fail");
-        return;
-    }
-    const CalendarRecord record(raw);
-    change->ownVersion = intOf(raw, CALENDAR_EVENT_OWN_VERSION);
-    unsigned count = 0;
-    if (calendar_record_get_child_record_count(raw, CALENDAR_EVENT_EXCEPTIONS, &count) !=
-        PLATFORM_ERROR_NONE) {
-        SYNC_ERR("get_child_record_coun fail");
-        return;
-    }
-    for (unsigned i = 0; i < count; ++i) {
-        calendar_record_h child = nullptr;
-        if (calendar_record_get_child_record_at_p(raw, CALENDAR_EVENT_EXCEPTIONS, i, &child) !=
-            PLATFORM_ERROR_NONE) {
-            SYNC_ERR("get child fail[%u]", i);
-            continue;
-        }
+    const auto readChild = [change](calendar_record_h child) {
         const int version = intOf(child, CALENDAR_EVENT_VERSION);
         change->children.push_back({.eventId = intOf(child, CALENDAR_EVENT_ID),
                                     .version = version,
                                     .ownWrite = intOf(child, CALENDAR_EVENT_SYNCED_VERSION) == version,
                                     .recurrenceId = textOf(child, CALENDAR_EVENT_RECURRENCE_ID)});
+    };
+    bool isFound = false;
+    const int code = calendar_read::forEachPart(
+        _calendar_event, CALENDAR_EVENT_ID, change->itemId,
+        {CALENDAR_EVENT_OWN_VERSION, CALENDAR_EVENT_EXCEPTIONS}, [&](calendar_record_h record) {
+            isFound = true;
+            change->ownVersion = intOf(record, CALENDAR_EVENT_OWN_VERSION);
+            calendar_read::forEachChild(record, CALENDAR_EVENT_EXCEPTIONS, readChild);
+        });
+    if (code != PLATFORM_ERROR_NONE || !isFound) SYNC_ERR("db_get_record fail");
+}
+
+void readAllSeries(std::vector<LocalChange>* changes) {
+    // Taking the store's lock costs more than a record: many are read under one, and nothing is written.
+    std::optional<CalTransaction> reading;
+    if (changes->size() > 1) reading.emplace();
+    for (LocalChange& change : *changes) {
+        if (change.status != RECORD_DELETED) readSeries(&change);
     }
 }
 
@@ -198,11 +198,6 @@ private:
     std::map<std::pair<int, std::string>, CalEventMetaData> mInstances;  // by series and recurrence id
 };
 
-bool areOwn(const std::vector<LocalChange>& changes) {
-    return std::all_of(changes.begin(), changes.end(),
-                       [](const LocalChange& change) { return change.ownWrite(); });
-}
-
 }  // namespace
 
 bool CalManager::setChanged(int calendarId) {
@@ -210,45 +205,42 @@ bool CalManager::setChanged(int calendarId) {
     if (store == nullptr) return false;
     int since = 0;
     (void)store->books().getVersion(calendarId, &since);
-    std::vector<LocalChange> changes;
-    int current = 0;
-    return readChanges(mKind, calendarId, since, &changes, &current) == kOk && !areOwn(changes);
+    Changes changes;
+    return readChanges(mKind, calendarId, since, &changes) == kOk && !changes.foreign.empty();
 }
 
 int CalManager::passOwnWrites(int calendarId) {
     CalItemStore* store = prepared();
     int since = 0;
-    std::vector<LocalChange> changes;
-    int current = 0;
+    Changes changes;
     if (store == nullptr || store->books().getVersion(calendarId, &since) != kOk ||
-        readChanges(mKind, calendarId, since, &changes, &current) != kOk) {
+        readChanges(mKind, calendarId, since, &changes) != kOk) {
         return kFailed;
     }
-    return changes.empty() || !areOwn(changes) ? kOk : store->books().updateVersion(calendarId, current);
+    return !changes.any || !changes.foreign.empty()
+               ? kOk
+               : store->books().updateVersion(calendarId, changes.current);
 }
 
 int CalManager::setBookChanged(int calendarId) {
     CalItemStore* store = prepared();
     CalBookMetaData book;
     if (store == nullptr || store->books().get(calendarId, &book) != kOk) return kFailed;
-    std::vector<LocalChange> changes;
-    int current = 0;
-    if (readChanges(mKind, calendarId, book.sync_version, &changes, &current) != kOk) return kFailed;
+    Changes changes;
+    if (readChanges(mKind, calendarId, book.sync_version, &changes) != kOk) return kFailed;
     // A store that nobody wrote stays as it is.
-    if (changes.empty() || current <= book.sync_version) return kOk;
-    std::erase_if(changes, [](const LocalChange& change) { return change.ownWrite(); });
+    if (!changes.any || changes.current <= book.sync_version) return kOk;
     // Everything is read from the calendar service before the transaction begins.
-    for (LocalChange& change : changes) {
-        if (mKind.hasSeries() && change.status != RECORD_DELETED) readSeries(&change);
-    }
+    if (mKind.hasSeries()) readAllSeries(&changes.foreign);
     std::vector<CalEventMetaData> rows;
-    if (!changes.empty() && store->getAllItems(calendarId, &rows) != kOk) return kFailed;
+    if (!changes.foreign.empty() && store->getAllItems(calendarId, &rows) != kOk) return kFailed;
     Marker marker(mKind, *store, book, rows);
 
     // The version moves first, but only together with the marks: a walk that was cut off is walked again.
     SyncTransaction transaction(store->database());
-    if (!transaction.begun() || store->books().updateVersion(calendarId, current) != kOk) return kFailed;
-    for (const LocalChange& change : changes) {
+    if (!transaction.begun() || store->books().updateVersion(calendarId, changes.current) != kOk)
+        return kFailed;
+    for (const LocalChange& change : changes.foreign) {
         if (marker.mark(change) != kOk) return kFailed;
     }
     return transaction.commit();

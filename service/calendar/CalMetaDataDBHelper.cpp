@@ -166,6 +166,16 @@ int CalMetaDataDBHelper::insertEvent(const CalEventMetaData& row) {
 }
 
 int CalMetaDataDBHelper::updateEvent(const CalEventMetaData& row) {
+    const std::lock_guard lock(mDatabase.mutex());
+    // Hardly a row changes its book or its series: the indexes of those columns are left in peace.
+    if (const int result = mDatabase.write(
+            "UPDATE eventsync_table SET version=?, dirty=?, deleted=?, exception_type=?, sequence=?, "
+            "recurrence_id=?, uri=?, etag=? WHERE event_id=? AND calendar_id=? AND original_event_id=?",
+            {row.version, row.dirty, row.deleted, row.exception_type, row.sequence, row.recurrence_id,
+             row.uri, row.etag, row.event_id, row.calendar_id, row.original_event_id});
+        result != kOk || mDatabase.changes() > 0) {
+        return result;
+    }
     return mDatabase.write(
         "UPDATE eventsync_table SET event_id=?, calendar_id=?, version=?, dirty=?, deleted=?, "
         "original_event_id=?, "

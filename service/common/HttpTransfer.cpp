@@ -3,6 +3,7 @@
 #include <array>
 #include <mutex>
 #include <string_view>
+#include <utility>
 
 #include "common/Handles.h"
 #include "common/HeaderText.h"
@@ -102,6 +103,8 @@ void unlockShare(CURL*, curl_lock_data data, void* locks) {
 struct HttpShare::State {
     ShareLocks locks;
     CurlShare share;
+    std::mutex idleMutex;
+    CurlEasy idle;  // of the last exchange; goes before the share
 };
 
 HttpShare::HttpShare() : mpState(std::make_unique<State>()) {
@@ -122,9 +125,40 @@ void* HttpShare::handle() const {
     return mpState->share.get();
 }
 
+CurlEasy HttpShare::takeIdle() {
+    const std::lock_guard lock(mpState->idleMutex);
+    return std::move(mpState->idle);
+}
+
+void HttpShare::giveBack(CurlEasy curl) {
+    // Nothing of the exchange is kept: neither its options nor what they point to.
+    curl_easy_reset(curl.get());
+    const std::lock_guard lock(mpState->idleMutex);
+    mpState->idle.swap(curl);
+}
+
 // --- the exchange
 
 namespace {
+
+// An easy handle for one exchange: making one costs more than a small request.
+class UsedHandle {
+public:
+    explicit UsedHandle(std::shared_ptr<HttpShare> share) : mShare(std::move(share)) {
+        if (mShare) mCurl = mShare->takeIdle();
+        if (!mCurl) mCurl.reset(curl_easy_init());
+    }
+    ~UsedHandle() {
+        if (mShare && mCurl) mShare->giveBack(std::move(mCurl));
+    }
+    UsedHandle(const UsedHandle&) = delete;
+    UsedHandle& operator=(const UsedHandle&) = delete;
+    [[nodiscard]] CURL* get() const { return mCurl.get(); }
+
+private:
+    const std::shared_ptr<HttpShare> mShare;
+    CurlEasy mCurl;
+};
 
 void setCommonOptions(CURL* curl, HttpTransfer& transfer, Sink* sink) {
     const bool verified = isPeerVerified();
@@ -167,12 +201,12 @@ void setBody(CURL* curl, const HttpTransfer& transfer) {
 
 int HttpTransfer::perform() {
     status = 0;
-    const CurlEasy curl(curl_easy_init());
-    if (!curl) {
+    CurlList list;  // outlives its use by the handle
+    const UsedHandle curl(share);
+    if (curl.get() == nullptr) {
         SYNC_ERR("curl_easy_init() failed");
         return kFailed;
     }
-    CurlList list;
     for (const std::string& header : headers) {
         if (!header_text::isValid(header)) {
             SYNC_ERR("a header of the request would not stay on its line, nothing is sent");

@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+#include "common/Handles.h"
+
 // Asked during transfers whether to go on; non-zero aborts.
 class IProgressObserver {
 public:
@@ -14,7 +16,7 @@ public:
     virtual int onProgress(double downloadTotal, double downloaded, double uploadTotal, double uploaded) = 0;
 };
 
-// HttpShare: what the easy handles of one worker share (one kept connection per server).
+// HttpShare: what the exchanges of one worker share: one kept connection per server, and an easy handle.
 class HttpShare {
 public:
     HttpShare();
@@ -22,6 +24,9 @@ public:
     HttpShare(const HttpShare&) = delete;
     HttpShare& operator=(const HttpShare&) = delete;
     [[nodiscard]] void* handle() const;  // a CURLSH
+    // The easy handle that waits for the next exchange, NULL when there is none.
+    [[nodiscard]] CurlEasy takeIdle();
+    void giveBack(CurlEasy curl);
 
 private:
     struct State;

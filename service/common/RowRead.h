@@ -1,7 +1,9 @@
 // Reads of the sync metadata stores: single values, rows and lists. A type that can be read has a `take` for its row.
 #pragma once
 
+#include <iterator>
 #include <string>
+#include <utility>
 
 #include "common/SyncDatabase.h"
 
@@ -29,7 +31,11 @@ int readList(SyncDatabase& database, std::string_view sql, SyncDatabase::Params 
         take(row, &found.back());
     });
     if (result != sync_result::kOk) return result;
-    out->insert(out->end(), found.begin(), found.end());
+    if (out->empty()) {
+        *out = std::move(found);
+    } else {
+        out->insert(out->end(), std::make_move_iterator(found.begin()), std::make_move_iterator(found.end()));
+    }
     return sync_result::kOk;
 }
 

@@ -145,8 +145,8 @@ int SyncDatabase::makeDb() {
 }
 
 sqlite3_stmt* SyncDatabase::prepare(std::string_view sql) {
+    if (const auto known = mStatements.find(sql); known != mStatements.end()) return known->second.get();
     const std::string text(sql);
-    if (const auto known = mStatements.find(text); known != mStatements.end()) return known->second.get();
     sqlite3_stmt* statement = nullptr;
     if (sqlite3_prepare_v3(mpHandle, text.c_str(), -1, SQLITE_PREPARE_PERSISTENT, &statement, nullptr) !=
         SQLITE_OK) {
@@ -228,15 +228,11 @@ int SyncDatabase::write(std::string_view sql, Params params) {
         SYNC_ERR("Database is not opened");
         return kFailed;
     }
-    if (begin_trans() != kOk) {
-        SYNC_ERR("begin trans fail");
-        return kFailed;
-    }
+    // Outside of a transaction a statement is one by itself.
     const int code = step(sql, params);
-    const bool written = code == SQLITE_DONE || code == SQLITE_ROW;
-    if (!written) SYNC_ERR("execDb() failed: %s", sqlite3_errmsg(mpHandle));
-    const int ended = end_trans(written);
-    return written ? ended : kFailed;
+    if (code == SQLITE_DONE || code == SQLITE_ROW) return kOk;
+    SYNC_ERR("execDb() failed: %s", sqlite3_errmsg(mpHandle));
+    return kFailed;
 }
 
 int SyncDatabase::read(std::string_view sql, Params params, bool firstOnly,

@@ -65,7 +65,7 @@ public:
     static constexpr int kNotOpened = -1;
     [[nodiscard]] int step(std::string_view sql, Params params);
 
-    // A write in a transaction of its own (nested in an open one).
+    // A write that is a transaction of its own, or part of the open one.
     [[nodiscard]] int write(std::string_view sql, Params params);
 
     // Reads the first row: 0 with `use` called, or -1 (no row: without a log).
@@ -98,7 +98,13 @@ private:
     std::recursive_mutex mMutex;
     sqlite3* mpHandle = nullptr;  // guarded by mMutex, as all below
     int mTransactionDepth = 0;
-    std::unordered_map<std::string, SqliteStmt> mStatements;  // by SQL text
+    struct TextHash {
+        using is_transparent = void;
+        size_t operator()(std::string_view text) const noexcept {
+            return std::hash<std::string_view>()(text);
+        }
+    };
+    std::unordered_map<std::string, SqliteStmt, TextHash, std::equal_to<>> mStatements;  // by SQL text
 };
 
 // A transaction that is rolled back unless commit() was called; holds the store's mutex.

@@ -1,10 +1,13 @@
 #include "common/SyncWorker.h"
 
+#include <malloc.h>
+
 #include <cerrno>
 #include <mutex>
 
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
+#include "platform/database.h"
 
 using sync_result::kFailed;
 using sync_result::kOk;
@@ -115,6 +118,9 @@ int SyncWorker::addRequest() {
 gboolean SyncWorker::runRequest(gpointer data) {
     const std::shared_ptr<SyncRequest> request = fromSource<SyncRequest>(data);
     request->result = request->director->run();
+    // What the run needed goes back: the next one may be hours away.
+    db_util_release_memory();
+    malloc_trim(0);
     addResponse(request);
     return G_SOURCE_REMOVE;
 }

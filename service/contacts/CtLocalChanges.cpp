@@ -1,6 +1,5 @@
 #include "contacts/CtLocalChanges.h"
 
-#include <algorithm>
 #include <unordered_map>
 
 #include "common/SyncLog.h"
@@ -30,6 +29,12 @@ bool readChange(contacts_record_h record, bool hasImage, CtLocalChange* change) 
         }
     }
     return true;
+}
+
+void checkBook(const CtLocalChange& change, int addressBookId) {
+    if (change.addressBookId != addressBookId)
+        SYNC_ERR("addressbook_id(%d) : ab_id(%d)?", addressBookId, change.addressBookId);
+    SYNC_ASSERT_TEXT(change.addressBookId == addressBookId, "!\"What the hell of this ab_id?\"");
 }
 
 int logged(int result, const char* failureText) {
@@ -76,25 +81,20 @@ int markOne(CtMetaDataDBHelper& store, int addressBookId, const CtLocalChange& c
 }  // namespace
 
 template <class Kind>
-int read(int addressBookId, int since, std::vector<CtLocalChange>* changes, int* current) {
-    contacts_list_h rawList = nullptr;
-    if (contacts_db_get_changes_by_version(Kind::kFeed, addressBookId, since, &rawList, current) !=
-        PLATFORM_ERROR_NONE) {
+int read(int addressBookId, int since, Changes* changes) {
+    bool isReadable = true;
+    const int code = contacts_read::forEachChange(
+        Kind::kFeed, addressBookId, since, &changes->current, [&](contacts_record_h record) {
+            CtLocalChange change;
+            isReadable = isReadable && readChange(record, std::is_same_v<Kind, CtContactKind>, &change);
+            if (!isReadable) return;
+            checkBook(change, addressBookId);
+            changes->any = true;
+            if (!change.isOwnWrite()) changes->foreign.push_back(change);
+        });
+    if (code != PLATFORM_ERROR_NONE) {
         SYNC_ERR("db_get_changes_by_version fail");
         return kFailed;
-    }
-    const ContactsList list(rawList);
-    bool isReadable = true;
-    contacts_read::forEach(list.get(), [&](contacts_record_h record) {
-        CtLocalChange change;
-        isReadable = isReadable && readChange(record, std::is_same_v<Kind, CtContactKind>, &change);
-        if (!isReadable) return;
-        changes->push_back(change);
-    });
-    for (const CtLocalChange& change : *changes) {
-        if (change.addressBookId != addressBookId)
-            SYNC_ERR("addressbook_id(%d) : ab_id(%d)?", addressBookId, change.addressBookId);
-        SYNC_ASSERT_TEXT(change.addressBookId == addressBookId, "!\"What the hell of this ab_id?\"");
     }
     return isReadable ? kOk : kFailed;
 }
@@ -103,60 +103,53 @@ namespace {
 
 // The changes since the version that is stored for the address book.
 template <class Kind>
-int readNew(CtMetaDataDBHelper& store, int addressBookId, std::vector<CtLocalChange>* changes, int* current) {
+int readNew(CtMetaDataDBHelper& store, int addressBookId, Changes* changes) {
     int since = 0;
     if (Kind::getLatest(store, addressBookId, &since) != kOk) return kFailed;
-    return read<Kind>(addressBookId, since, changes, current);
-}
-
-bool areOwn(const std::vector<CtLocalChange>& changes) {
-    return std::all_of(changes.begin(), changes.end(),
-                       [](const CtLocalChange& change) { return change.isOwnWrite(); });
+    return read<Kind>(addressBookId, since, changes);
 }
 
 }  // namespace
 
 template <class Kind>
 bool some(CtMetaDataDBHelper& store, int addressBookId) {
-    int current = 0;
-    std::vector<CtLocalChange> changes;
-    return readNew<Kind>(store, addressBookId, &changes, &current) == kOk && !areOwn(changes);
+    Changes changes;
+    return readNew<Kind>(store, addressBookId, &changes) == kOk && !changes.foreign.empty();
 }
 
 template <class Kind>
 int passOwn(CtMetaDataDBHelper& store, int addressBookId) {
-    int current = 0;
-    std::vector<CtLocalChange> changes;
-    if (readNew<Kind>(store, addressBookId, &changes, &current) != kOk) return kFailed;
-    return changes.empty() || !areOwn(changes) ? kOk : Kind::updateLatest(store, addressBookId, current);
+    Changes changes;
+    if (readNew<Kind>(store, addressBookId, &changes) != kOk) return kFailed;
+    return !changes.any || !changes.foreign.empty()
+               ? kOk
+               : Kind::updateLatest(store, addressBookId, changes.current);
 }
 
 template <class Kind>
 int mark(CtMetaDataDBHelper& store, int addressBookId) {
-    int current = 0;
-    std::vector<CtLocalChange> changes;
-    if (readNew<Kind>(store, addressBookId, &changes, &current) != kOk) return kFailed;
-    if (changes.empty()) return kOk;
-    std::erase_if(changes, [](const CtLocalChange& change) { return change.isOwnWrite(); });
+    Changes changes;
+    if (readNew<Kind>(store, addressBookId, &changes) != kOk) return kFailed;
+    if (!changes.any) return kOk;
     std::vector<typename Kind::Row> rows;
-    if (!changes.empty() && Kind::getAll(store, addressBookId, &rows) != kOk) return kFailed;
+    if (!changes.foreign.empty() && Kind::getAll(store, addressBookId, &rows) != kOk) return kFailed;
     std::unordered_map<int, typename Kind::Row*> known;
     for (typename Kind::Row& row : rows) known.emplace(row.*Kind::kId, &row);
 
     // The version moves only together with the marks: a walk that was cut off is walked again.
     SyncTransaction transaction(store.database());
     if (!transaction.begun()) return kFailed;
-    for (const CtLocalChange& change : changes) {
+    for (const CtLocalChange& change : changes.foreign) {
         const auto row = known.find(change.itemId);
         typename Kind::Row* knownRow = row != known.end() ? row->second : nullptr;
         if (markOne<Kind>(store, addressBookId, change, knownRow) != kOk) return kFailed;
     }
-    if (Kind::updateLatest(store, addressBookId, current) != kOk) return kFailed;
+    if (Kind::updateLatest(store, addressBookId, changes.current) != kOk) return kFailed;
     return transaction.commit();
 }
 
-template int read<CtContactKind>(int, int, std::vector<CtLocalChange>*, int*);
-template int read<CtGroupKind>(int, int, std::vector<CtLocalChange>*, int*);
+template int read<CtContactKind>(int, int, Changes*);
+template int read<CtGroupKind>(int, int, Changes*);
 template bool some<CtContactKind>(CtMetaDataDBHelper&, int);
 template bool some<CtGroupKind>(CtMetaDataDBHelper&, int);
 template int passOwn<CtContactKind>(CtMetaDataDBHelper&, int);

@@ -20,9 +20,14 @@ struct CtLocalChange {
 
 namespace ct_changes {
 
-// The feed's changes since a version, and the store's current version.
+// What others than the sync changed since a version.
+struct Changes {
+    std::vector<CtLocalChange> foreign;
+    bool any = false;  // somebody changed something, be it the sync
+    int current = 0;   // the store's version
+};
 template <class Kind>
-[[nodiscard]] int read(int addressBookId, int since, std::vector<CtLocalChange>* changes, int* current);
+[[nodiscard]] int read(int addressBookId, int since, Changes* changes);
 
 // Whether there is a change that is not the sync's own since the version that is stored for the address book.
 template <class Kind>

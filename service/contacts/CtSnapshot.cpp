@@ -67,24 +67,16 @@ int CtSnapshot<Kind>::load(CtMetaDataDBHelper& store, int addressBookId) {
 template <class Kind>
 int CtSnapshot<Kind>::readStates() {
     const std::vector<unsigned> properties = stateProperties(Kind());
-    contacts_query_h rawQuery = nullptr;
-    if (contacts_query_create(Kind::kView, &rawQuery) != PLATFORM_ERROR_NONE) return kFailed;
-    const ContactsQuery query(rawQuery);
-    contacts_list_h rawList = nullptr;
-    if (contacts_query_add_filter_int(rawQuery, Kind::kBookProperty, mAddressBookId) != PLATFORM_ERROR_NONE ||
-        contacts_query_set_projection(rawQuery, properties.data(), properties.size()) !=
-            PLATFORM_ERROR_NONE ||
-        contacts_db_get_records_with_query(rawQuery, 0, 0, &rawList) != PLATFORM_ERROR_NONE) {
-        SYNC_ERR("get_records_with_query fail");
-        return kFailed;
-    }
-    const ContactsList list(rawList);
-    contacts_read::forEach(rawList, [this](contacts_record_h record) {
-        mRecords[intOf(record, Kind::kIdProperty)] = {.version = intOf(record, Kind::kVersionProperty),
-                                                      .syncedVersion = intOf(record, Kind::kSyncedProperty),
-                                                      .groups = groupsOf(Kind(), record)};
-    });
-    return kOk;
+    const int code = contacts_read::forEachPart(Kind::kView, Kind::kBookProperty, mAddressBookId, properties,
+                                                [this](contacts_record_h record) {
+                                                    mRecords[intOf(record, Kind::kIdProperty)] = {
+                                                        .version = intOf(record, Kind::kVersionProperty),
+                                                        .syncedVersion = intOf(record, Kind::kSyncedProperty),
+                                                        .groups = groupsOf(Kind(), record)};
+                                                });
+    if (code == PLATFORM_ERROR_NONE) return kOk;
+    SYNC_ERR("get_records_with_query fail");
+    return kFailed;
 }
 
 template <class Kind>
@@ -111,14 +103,13 @@ int CtSnapshot<Kind>::readOrphans() {
 template <class Kind>
 int CtSnapshot<Kind>::readUnseenDeletions(CtMetaDataDBHelper& store) {
     int since = 0;
-    int current = 0;
-    std::vector<CtLocalChange> changes;
+    ct_changes::Changes changes;
     if (Kind::getLatest(store, mAddressBookId, &since) != kOk ||
-        ct_changes::read<Kind>(mAddressBookId, since, &changes, &current) != kOk) {
+        ct_changes::read<Kind>(mAddressBookId, since, &changes) != kOk) {
         return kFailed;
     }
-    for (const CtLocalChange& change : changes) {
-        if (change.type == RECORD_DELETED && !change.isOwnWrite()) mDeletedByUser.insert(change.itemId);
+    for (const CtLocalChange& change : changes.foreign) {
+        if (change.type == RECORD_DELETED) mDeletedByUser.insert(change.itemId);
     }
     return kOk;
 }

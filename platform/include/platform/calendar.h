@@ -174,12 +174,21 @@ int calendar_query_destroy(calendar_query_h query);
 [[nodiscard]] int calendar_db_get_all_records(const char* view, int offset, int limit, calendar_list_h* out);
 [[nodiscard]] int calendar_db_get_records_with_query(calendar_query_h query, int offset, int limit,
                                                      calendar_list_h* out);  // limit 0: all
+// Calls `use` for each record that the query finds, in no particular order (a sort is refused with
+// PLATFORM_ERROR_INVALID_PARAMETER), all of one state of the store. A record is borrowed for its call. The store is locked
+// meanwhile, `use` must not call the service. Takes little memory, however many records there are.
+using calendar_record_cb = void (*)(calendar_record_h record, void* user_data);
+[[nodiscard]] int calendar_db_for_each_record(calendar_query_h query, calendar_record_cb use,
+                                              void* user_data);
 // Per record of `view` in `book_id` its latest change after `version`, as _calendar_updated_info records in
 // version order; a record inserted and later updated is still "inserted", inserted and deleted in between is
 // nothing, unless the sync engine wrote it (it has seen what it wrote, and must learn of the deletion).
 // Exceptions are never listed. `current_version` is the store's version of the same snapshot.
 [[nodiscard]] int calendar_db_get_changes_by_version(const char* view, int book_id, int version,
                                                      calendar_list_h* out, int* current_version);
+// The same changes in the same order, one record at a time, as calendar_db_for_each_record does.
+[[nodiscard]] int calendar_db_for_each_change(const char* view, int book_id, int version,
+                                              calendar_record_cb use, void* user_data, int* current_version);
 [[nodiscard]] int calendar_db_get_current_version(int* version);
 // The version of the calling thread's own last write; the store's current version when it has made none.
 [[nodiscard]] int calendar_db_get_last_change_version(int* version);

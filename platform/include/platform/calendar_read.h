@@ -3,6 +3,7 @@
 #pragma once
 
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "platform/calendar.h"
@@ -40,6 +41,36 @@ void forEach(calendar_list_h list, Use use) {
         calendar_record_h record = nullptr;
         if (calendar_list_get_current_record_p(list, &record) == PLATFORM_ERROR_NONE) use(record);
     }
+}
+
+// Calls `use` for each record with `value` in `filtered`, of which only `properties` are read. Of the service whose functions are given.
+template <auto CreateQuery, auto ForEach, class Use>
+int forEachPartFrom(const char* view, unsigned filtered, int value, const std::vector<unsigned>& properties,
+                    Use use) {
+    calendar_query_h rawQuery = nullptr;
+    if (const int code = CreateQuery(view, &rawQuery); code != PLATFORM_ERROR_NONE) return code;
+    const CalendarQuery query(rawQuery);
+    int code = calendar_query_add_filter_int(rawQuery, filtered, value);
+    if (code == PLATFORM_ERROR_NONE)
+        code = calendar_query_set_projection(rawQuery, properties.data(), properties.size());
+    if (code != PLATFORM_ERROR_NONE) return code;
+    return ForEach(
+        rawQuery, [](calendar_record_h record, void* any) { (*static_cast<Use*>(any))(record); }, &use);
+}
+
+template <class Use>
+int forEachPart(const char* view, unsigned filtered, int value, const std::vector<unsigned>& properties,
+                Use use) {
+    return forEachPartFrom<calendar_query_create, calendar_db_for_each_record>(view, filtered, value,
+                                                                               properties, std::move(use));
+}
+
+// Calls `use` for each entry of the change feed.
+template <class Use>
+int forEachChange(const char* view, int bookId, int since, int* current, Use use) {
+    return calendar_db_for_each_change(
+        view, bookId, since, [](calendar_record_h record, void* any) { (*static_cast<Use*>(any))(record); },
+        &use, current);
 }
 
 // The record with this id and nothing but `properties` of it, so that writing it touches nothing else. It belongs to `list`.

@@ -188,9 +188,14 @@ int contacts_query_destroy(contacts_query_h query);
 [[nodiscard]] int contacts_db_get_all_records(const char* view, int offset, int limit, contacts_list_h* out);
 [[nodiscard]] int contacts_db_get_records_with_query(contacts_query_h query, int offset, int limit,
                                                      contacts_list_h* out);
+using contacts_record_cb = void (*)(contacts_record_h record, void* user_data);
+[[nodiscard]] int contacts_db_for_each_record(contacts_query_h query, contacts_record_cb use,
+                                              void* user_data);
 // `view` is _contacts_contact_updated_info or _contacts_group_updated_info.
 [[nodiscard]] int contacts_db_get_changes_by_version(const char* view, int address_book_id, int version,
                                                      contacts_list_h* out, int* current_version);
+[[nodiscard]] int contacts_db_for_each_change(const char* view, int address_book_id, int version,
+                                              contacts_record_cb use, void* user_data, int* current_version);
 [[nodiscard]] int contacts_db_get_current_version(int* version);
 [[nodiscard]] int contacts_db_get_last_change_version(int* version);
 

@@ -11,3 +11,7 @@ struct sqlite3;
 
 // Closes; a NULL handle is success.
 int db_util_close(sqlite3* handle);
+
+// Lets go of what all open connections of the process keep in memory for the next statement. Any thread; for the end of some
+// large work, after which little is to be expected.
+void db_util_release_memory();

@@ -4,6 +4,7 @@
 #include <signal.h>
 #include <sqlite3.h>
 
+#include <atomic>
 #include <fstream>
 #include <thread>
 
@@ -470,6 +471,15 @@ TEST(CalendarStore, CallbacksTellOfOthersWritesOnly) {
         R"({"summary":"theirs","start":"2026-03-01T10:00:00Z","end":"2026-03-01T11:00:00Z"})";
     ASSERT_EQ(system(("echo '" + json + "' | " + tool).c_str()), 0);
     EXPECT_TRUE(iterateUntil([&] { return events == 1; }, std::chrono::seconds(2)));
+    std::atomic<bool> isEnough = false;
+    std::thread busy([&] {
+        for (; !isEnough; std::this_thread::sleep_for(std::chrono::milliseconds(1)))
+            insert(event(book, "mine"));
+    });
+    EXPECT_EQ(system(("echo '" + json + "' | " + tool).c_str()), 0);
+    EXPECT_TRUE(iterateUntil([&] { return events == 2; }, std::chrono::seconds(2))) << "among own writes";
+    isEnough = true;
+    busy.join();
     EXPECT_EQ(books, 0);
     EXPECT_EQ(calendar_db_remove_changed_cb(_calendar_event, count, &events), 0);
     EXPECT_EQ(calendar_db_remove_changed_cb(_calendar_book, count, &books), 0);

@@ -56,7 +56,7 @@ void StoreWatch::onEvents() {
     char buffer[4096];
     bool any = false;
     while (read(mDescriptor, buffer, sizeof buffer) > 0) any = true;
-    if (!any || mTimeout != 0) return;
+    if (!any) return;
     // Until the look, more writes say nothing new, and each would cost its writer and this thread. So would each write of another
     // store in the folder if it were told apart.
     if (mWatch != -1) (void)inotify_rm_watch(mDescriptor, std::exchange(mWatch, -1));

@@ -104,6 +104,7 @@ void readAllSeries(std::vector<LocalChange>* changes) {
     for (LocalChange& change : *changes) {
         if (change.status != RECORD_DELETED) readSeries(&change);
     }
+    if (reading && reading->begun()) (void)reading->commit();
 }
 
 // Marks the rows of one book; runs inside the store's transaction and touches nothing else.

@@ -174,7 +174,15 @@ TEST(Database, OnlyDatabasesAreOpened) {
     ASSERT_EQ(db_util_open(root.at("/tmp/z.db").c_str(), &handle, 0), SQLITE_OK);
     ASSERT_EQ(sqlite3_exec(handle, "CREATE TABLE t(x)", nullptr, nullptr, nullptr), SQLITE_OK);
     EXPECT_TRUE(std::filesystem::exists(root.at("/tmp/z.db-journal"))) << "the journal stays";
+    const auto run = [&handle](const char* sql) {
+        return sqlite3_exec(handle, sql, nullptr, nullptr, nullptr);
+    };
+    EXPECT_EQ(run("BEGIN; INSERT INTO t VALUES(1)"), SQLITE_OK);
+    db_util_release_memory();
+    EXPECT_EQ(run("COMMIT; INSERT INTO t SELECT x FROM t"), SQLITE_OK) << "an open transaction is not lost";
+    EXPECT_EQ(sqlite3_changes(handle), 1);
     EXPECT_EQ(db_util_close(handle), SQLITE_OK);
+    db_util_release_memory();  // of none that was closed
     EXPECT_EQ(db_util_close(nullptr), SQLITE_OK);
 }
 

@@ -1,10 +1,10 @@
-// faultpoint: runs a program and disturbs it at one step. A step is a system call that changes a file below a folder or sends data;
-// steps are counted for each thread apart, by the thread's name, so that the same number means the same step in every run.
+// faultpoint: runs a program and disturbs it at one step. A step is a system call that changes a file below a folder or sends
+// data; steps are counted for each thread apart, by the thread's name, so that the same number means the same step in every run.
 //
 //   faultpoint --root DIR --report FILE [--thread NAME --at N --action kill|ENOSPC|EIO [--length M]] -- PROGRAM [ARGUMENT...]
 //
-// kill ends the program before the step is carried out. ENOSPC and EIO make M steps that write a file fail, of all threads, beginning
-// with this one; without M all of them until SIGUSR1. FILE has a line for the program's pid, for each step
+// kill ends the program before the step is carried out. ENOSPC and EIO make M steps that write a file fail, of all threads,
+// beginning with this one; without M all of them until SIGUSR1. FILE has a line for the program's pid, for each step
 // ("step", thread, number, call, whether it can fail, file), for the disturbance and for the end.
 #include <fcntl.h>
 #include <linux/audit.h>

@@ -15,6 +15,8 @@ from faultlab.provider import Provider, Refused, events_path, people_path, tasks
 KILLS = 30
 SHORT_KILLS = 10
 SHORT_RUNS, RUNS = 1, 4
+SERIES = "series1"
+INSTANCES = [f"202603{day}T090000Z" for day in (10, 11, 12, 14, 16, 17, 18)]  # 13 and 15 are the other side's
 BOTH_EDIT = {"event5", "task4", "contact8"}
 FIELDS = {"event": "location", "todo": "note", "contact": "nickname"}
 
@@ -97,6 +99,8 @@ class DeviceEditor(Editor):
             self._own["contact"].append((str(contact["id"]), number))
         for kind, items in self._own.items():
             self._own[kind] = [(i, uid) for i, uid in items if uid[-1] in "2468" or uid in BOTH_EDIT]
+        series = next(str(e["id"]) for e in device.json("events", "list") if e["uid"] == SERIES)
+        self._own["event"] += [((series, instance), f"{SERIES}_{instance}") for instance in INSTANCES]
 
     def _make_item(self, kind, text):
         item = {"summary": text}
@@ -115,7 +119,8 @@ class DeviceEditor(Editor):
 
     def _edit(self, kind, item, text):
         try:
-            self._device.tool(kind, "set", item, f"{FIELDS[kind]}={text}")
+            where = [item] if isinstance(item, str) else [item[0], "--instance", item[1]]
+            self._device.tool(kind, "set", *where, f"{FIELDS[kind]}={text}")
             return True
         except ToolFailed as failed:
             if "there is no" in str(failed):

@@ -57,7 +57,8 @@ class Table:
         print("|---|---|---|---|---|---|---|")
         total = _Row()
         for (name, thread, action, length), row in self._rows.items():
-            print(f"| {name} | {thread} | {_disturbance(action, length)} | {row.tried} | {row.hit} | {row.survived} | {row.again} |")
+            print(f"| {name} | {thread} | {_disturbance(action, length)} "
+                  f"| {row.tried} | {row.hit} | {row.survived} | {row.again} |")
             total.tried += row.tried
             total.hit += row.hit
             total.survived += row.survived

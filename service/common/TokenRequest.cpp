@@ -2,6 +2,7 @@
 
 #include "common/Account.h"
 #include "common/Handles.h"
+#include "common/HttpStatus.h"
 #include "common/HttpTransfer.h"
 #include "common/ServerAddress.h"
 #include "common/SyncLog.h"
@@ -36,5 +37,11 @@ int requestAccessToken(Account& account, IProgressObserver* observer, std::share
                           .timeout = timeout,
                           .observer = observer,
                           .share = std::move(share)};
-    return transfer.perform() == kOk ? kOk : kFailed;
+    if (transfer.perform() != kOk) return kFailed;
+    if (transfer.status < http_status::kServerError && transfer.status != http_status::kTooManyRequests)
+        return kOk;
+    // A server in trouble says nothing about the authorisation, whatever its error reads like.
+    SYNC_ERR("the token server answered with error %ld", transfer.status);
+    response->clear();
+    return kFailed;
 }

@@ -106,6 +106,17 @@ TEST(CalendarSync, AnExpiredTokenIsRenewedAndARevokedOneIsToldOnce) {
     pair.provider.admin("POST", "/tokens/expire");
     EXPECT_EQ(pair.device.sync(1).status, 0);
 
+    // A token server in trouble says nothing about the authorisation.
+    for (const int status : {429, 500, 503}) {
+        pair.provider.admin("POST", "/tokens/expire");
+        pair.installFault(
+            {{"path", "oauth2/token"}, {"kind", "status"}, {"status", status}, {"count", 1000}});
+        EXPECT_EQ(pair.device.sync(1).status, 1);
+        EXPECT_EQ(statusOf(pair, 1).at("state"), "ready") << status;
+        pair.provider.admin("DELETE", "/faults");
+        EXPECT_EQ(pair.device.sync(1).status, 0);
+    }
+
     const std::string email = pair.provider.accounts()[0].email;
     pair.provider.admin("POST", "/tokens/revoke", {{"email", email}});
     EXPECT_EQ(pair.device.sync(1).status, 1);

@@ -26,7 +26,6 @@ using IcuCalendar = std::unique_ptr<UCalendar, FreeWith<ucal_close>>;
 using JsonParserPtr = std::unique_ptr<JsonParser, FreeWith<g_object_unref>>;
 using JsonGeneratorPtr = std::unique_ptr<JsonGenerator, FreeWith<g_object_unref>>;
 using JsonNodePtr = std::unique_ptr<JsonNode, FreeWith<json_node_unref>>;
-using JsonArrayPtr = std::unique_ptr<JsonArray, FreeWith<json_array_unref>>;
 using JsonObjectPtr = std::unique_ptr<JsonObject, FreeWith<json_object_unref>>;
 using GErrorPtr = std::unique_ptr<GError, FreeWith<g_error_free>>;
 using GChars = std::unique_ptr<char, FreeWith<g_free>>;

@@ -1,18 +1,25 @@
 #include "common/JsonText.h"
 
-#include "common/JsonReader.h"
+#include <vector>
+
+#include "common/JsonSyntax.h"
 
 namespace json_text {
 
 namespace {
 
+// The text with the character for what cannot be shown in place of each escape that `lone` tells.
+std::string repaired(std::string_view text, const std::vector<size_t>& lone) {
+    constexpr std::string_view kReplacement = "\\uFFFD";
+    std::string copy(text);
+    for (const size_t at : lone) copy.replace(at, kReplacement.size(), kReplacement);
+    return copy;
+}
+
 // The generator leaves one of the control characters as it is, and writes ".0" behind an exponent ("1e+22.0").
 std::string corrected(std::string_view text) {
     constexpr char kUnescaped = '\x1F';
     constexpr std::string_view kFraction = ".0";
-    constexpr auto kNowhere = std::string_view::npos;
-    if (text.find(kUnescaped) == kNowhere && text.find("e+") == kNowhere && text.find("e-") == kNowhere)
-        return std::string(text);
     std::string out;
     out.reserve(text.size());
     bool isInString = false;
@@ -44,7 +51,16 @@ std::string corrected(std::string_view text) {
 }  // namespace
 
 JsonNodePtr parse(std::string_view text) {
-    return json_reader::read(text);
+    std::vector<size_t> lone;
+    if (!json_syntax::isValid(text, &lone)) return nullptr;
+    // The parser makes broken UTF-8 of half a pair, drops what follows, or refuses the document for it.
+    if (!lone.empty()) return parse(repaired(text, lone));
+    const JsonParserPtr parser(json_parser_new_immutable());
+    if (!parser || json_parser_load_from_data(parser.get(), text.data(), static_cast<gssize>(text.size()),
+                                              nullptr) == FALSE) {
+        return nullptr;
+    }
+    return JsonNodePtr(json_parser_steal_root(parser.get()));
 }
 
 std::string textOf(JsonNode* node) {

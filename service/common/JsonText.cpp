@@ -55,7 +55,7 @@ JsonNodePtr parse(std::string_view text) {
     if (!json_syntax::isValid(text, &lone)) return nullptr;
     // The parser makes broken UTF-8 of half a pair, drops what follows, or refuses the document for it.
     if (!lone.empty()) return parse(repaired(text, lone));
-    const JsonParserPtr parser(json_parser_new_immutable());
+    const JsonParserPtr parser(json_parser_new());
     if (!parser || json_parser_load_from_data(parser.get(), text.data(), static_cast<gssize>(text.size()),
                                               nullptr) == FALSE) {
         return nullptr;

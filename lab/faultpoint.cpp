@@ -110,6 +110,7 @@ std::string memoryText(pid_t thread, unsigned long long address) {
         // Not across a page: the next one need not be there.
         const size_t room = 4096 - (address + text.size()) % 4096;
         iovec local{part.data(), std::min(part.size(), room)};
+        // NOLINTNEXTLINE(performance-no-int-to-ptr): an address of the other process
         iovec remote{reinterpret_cast<void*>(address + text.size()), local.iov_len};
         const ssize_t got = process_vm_readv(thread, &local, 1, &remote, 1, 0);
         if (got <= 0) return text;

@@ -170,13 +170,6 @@ void CalUploader::sendItem(Row& row) {
         return;
     }
     const CalendarRecord record(raw);
-    const int version = intOf(raw, mKind.version);
-    // What goes up now counts as seen, with all instances: those of a later edit must be marked before. That edit asks for a run itself.
-    if (mKind.hasSeries() && version != row.version && version != intOf(raw, mKind.syncedVersion)) {
-        SYNC_INFO("%s(%d) was edited again, it waits for the next look at the device's changes",
-                  mKind.itemName, row.event_id);
-        return;
-    }
     if (row.dirty != 0 && !isParked(row)) {
         const std::string body = mKind.build(raw);
         if (body.empty()) {

@@ -217,13 +217,15 @@ void CtUploader::sendContact(CtContactSyncRow& row) {
     if (record == nullptr) return;
     // The record may be younger than its mark: what is sent now, no later look will find.
     if (intOf(record.get(), CONTACTS_CONTACT_IMAGE_VERSION) > row.version) row.image_dirty = 1;
-    if (row.dirty != 0 && (!sendFields(row, record.get()) || mIsOver)) return;
-    if (row.image_dirty != 0) {
+    const bool hasFields = row.dirty != 0 && !waitsOnlyForGroup(row, record.get());
+    if (hasFields && (!sendFields(row, record.get()) || mIsOver)) return;
+    const bool hasImage = row.image_dirty != 0;
+    if (hasImage) {
         if (!sendPhoto(row, record.get())) return;
         row.image_dirty = 0;
         store<CtContactKind>(row, {}, row.version);
     }
-    ++mSent;
+    if (hasFields || hasImage) ++mSent;
 }
 
 bool CtUploader::sendFields(CtContactSyncRow& row, contacts_record_h record) {
@@ -257,6 +259,14 @@ bool CtUploader::waitsForGroup(contacts_record_h record) const {
         waits = waits || (id > 0 && mGroups.uriOf(id).empty());
     });
     return waits;
+}
+
+bool CtUploader::waitsOnlyForGroup(const CtContactSyncRow& row, contacts_record_h record) const {
+    if (row.uri.empty() || !waitsForGroup(record)) return false;
+    const JsonNodePtr root = json_text::parse(ct_record::originOf(record));
+    JsonObject* kept = json_access::objectIn(root.get());
+    return json_access::textOr(kept, "gd$etag", "") == row.etag &&
+           mpComposer->composeFields(kept) == mpComposer->composeFields(record);
 }
 
 CtUpReply CtUploader::updateContact(const CtContactSyncRow& row, contacts_record_h record) {

@@ -77,6 +77,8 @@ private:
     void takePhotoReply(CtContactSyncRow& row, contacts_record_h record, const CtUpReply& reply);
     // Whether the contact is in a group that the server does not have yet.
     [[nodiscard]] bool waitsForGroup(contacts_record_h record) const;
+    // Likewise, and whether the server has all the rest of it.
+    [[nodiscard]] bool waitsOnlyForGroup(const CtContactSyncRow& row, contacts_record_h record) const;
 
     CtMetaDataDBHelper* const mpStore;
     const int mAddressBookId;

@@ -78,6 +78,9 @@ TEST_F(ContactSync, AContactWaitsForAGroupThatIsRefused) {
     EXPECT_EQ(mUp.run(), kFailed);
     ASSERT_EQ(serverNames(), std::set<std::string>{"member"}) << "its other fields go up";
     EXPECT_TRUE(manager().hasSomethingToSend(mAccount.getAccountId()));
+    (void)mServer.takeWrites();
+    EXPECT_EQ(mUp.run(), kOk);
+    EXPECT_EQ(mServer.takeWrites(), 0) << "it is not sent over and over while it waits";
     mServer.groupWriteStatus = 0;
     mUp.forgetRefusals();  // as a client that asks for a sync does
     sync();

@@ -71,6 +71,29 @@ TEST_F(ContactSync, AMembershipSurvivesUntilItsGroupIsThere) {
     expectQuiet();
 }
 
+TEST_F(ContactSync, AGroupThatIsRenamedWhileItsPageComesKeepsNothingBack) {
+    mServer.put("groups", "g1", {{"title", {{"$t", "Friends"}}}});
+    sync();
+    int group = 0;
+    ASSERT_EQ(manager().getGroupId("g1", mBook, &group), kOk);
+    mServer.put("groups", "g1", {{"title", {{"$t", "The server's"}}}});
+    mServer.put("contacts", "a", named("a"));
+    mServer.onGroupsRead = [&] {
+        contacts_record_h raw = nullptr;
+        ASSERT_EQ(contacts_db_get_record(_contacts_group, group, &raw), 0);
+        const ContactsRecord record(raw);
+        ASSERT_EQ(contacts_record_set_str(raw, CONTACTS_GROUP_NAME, "Mine"), 0);
+        ASSERT_EQ(contacts_db_update_record(raw), 0);
+    };
+    ASSERT_EQ(mDown.run(), kOk);
+    mServer.onGroupsRead = nullptr;
+    EXPECT_EQ(deviceNames(), std::set<std::string>{"a"}) << "the contacts are not kept from coming";
+    sync();
+    EXPECT_EQ(mServer.all("groups").begin()->second["title"]["$t"], "Mine");
+    sync();
+    expectQuiet();
+}
+
 TEST_F(ContactSync, AContactWaitsForAGroupThatIsRefused) {
     const int group = addGroup(mBook, "Choir");
     add("member", group);
@@ -131,25 +154,60 @@ TEST_F(ContactSync, AChangeOfTheServerWhileAPhotoGoesUpComesDown) {
 TEST_F(ContactSync, AnEditWhileItsContactGoesUpIsSentToo) {
     mServer.put("contacts", "a", named("a"));
     mServer.put("contacts", "b", named("b"));
+    mServer.put("contacts", "c", named("c"));
     sync();
     const auto device = deviceContacts();
     for (const char* name : {"a", "b"}) setImage(device.at(name), "first");
-    // Both come after the mark; one before the contact is read, one after.
+    rename(device.at("c"), "c edited");
+    // All come after the marks; one after its contact was read, two before, of which one has no mark for its image.
     mServer.onPhotoWritten = [&](std::map<std::string, Json>&) {
         mServer.onPhotoWritten = nullptr;
         setImage(device.at("b"), "second");
         rename(device.at("b"), "b edited");
         rename(device.at("a"), "a edited");
+        setImage(device.at("c"), "late");
     };
     ASSERT_EQ(mUp.run(), kOk);
     EXPECT_TRUE(manager().hasSomethingToSend(mAccount.getAccountId()))
         << "nobody has taken the edit of \"a\"";
     sync();
-    EXPECT_EQ(serverNames(), (std::set<std::string>{"a edited", "b edited"}));
+    EXPECT_EQ(serverNames(), (std::set<std::string>{"a edited", "b edited", "c edited"}));
     EXPECT_EQ(mServer.photo("b"), "second");
+    EXPECT_EQ(mServer.photo("c"), "late");
     expectSame();
     sync();
     expectQuiet();
+}
+
+TEST_F(ContactSync, APhotoThatTheServerRemovedGoesAlthoughTheDevicesChangeWon) {
+    mServer.put("contacts", "a", named("a"));
+    mServer.putPhoto("a", "photo");
+    sync();
+    mServer.erasePhoto("a");
+    rename(deviceContacts()["a"], "a edited");
+    sync();
+    sync();
+    EXPECT_EQ(serverNames(), std::set<std::string>{"a edited"});
+    EXPECT_EQ(imageOf(deviceContacts()["a edited"]), "");
+    expectQuiet();
+}
+
+TEST_F(ContactSync, AnImageThatTheSyncWroteIsNoChangeOfTheUser) {
+    for (const char* id : {"a", "b", "c"}) {
+        mServer.put("contacts", id, named(id));
+        mServer.putPhoto(id, std::string("photo of ") + id);
+    }
+    // The first page is written when the photo of the second is fetched.
+    mServer.onPhotoRead = [&] {
+        const auto device = deviceContacts();
+        if (device.contains("a")) rename(device.at("a"), "a edited");
+    };
+    ASSERT_EQ(mDown.run(), kOk);
+    mServer.onPhotoRead = nullptr;
+    (void)mServer.takeWrites();
+    ASSERT_EQ(mUp.run(), kOk);
+    EXPECT_EQ(serverNames(), (std::set<std::string>{"a edited", "b", "c"}));
+    EXPECT_EQ(mServer.takeWrites(), 1) << "the name, and no photo";
 }
 
 TEST_F(ContactSync, TextThatXmlCannotCarryKeepsNothingBack) {

@@ -59,6 +59,12 @@ void FeedServer::putPhoto(const std::string& id, const std::string& bytes) {
     mEntries["contacts"][id]["gd$etag"] = nextEtag();
 }
 
+void FeedServer::erasePhoto(const std::string& id) {
+    const std::lock_guard lock(mMutex);
+    mPhotos.erase(id);
+    mEntries["contacts"][id]["gd$etag"] = nextEtag();
+}
+
 std::map<std::string, Json> FeedServer::all(const std::string& feed) {
     const std::lock_guard lock(mMutex);
     std::map<std::string, Json> entries = mEntries[feed];
@@ -114,6 +120,7 @@ void FeedServer::serveFeeds(const std::string& feed) {
         }
         const bool isEmpty = feed == "contacts" && start == 0 && emptyLists > 0;
         if (isEmpty) --emptyLists;
+        if (const auto hook = onGroupsRead; hook && feed == "groups") hook();
         if (feed == "groups" && start == 0) mHidesGroup = hiddenLists-- > 0;
         Json shown = {{"entry", Json::array()}, {"link", Json::array()}};
         size_t at = 0;
@@ -192,6 +199,7 @@ void FeedServer::servePhotos() {
     const std::string one = std::string(kHost) + "photos/media/[^/]+/(.+)";
     mServer.Get(one, [this](const httplib::Request& request, httplib::Response& response) {
         const std::lock_guard lock(mMutex);
+        if (const auto hook = onPhotoRead) hook();
         response.status = photoStatus;
         if (photoStatus == 200) response.set_content(mPhotos[request.matches[1]].second, "image/jpeg");
     });

@@ -23,6 +23,7 @@ public:
     void put(const std::string& feed, const std::string& id, const Json& fields);
     void erase(const std::string& feed, const std::string& id);
     void putPhoto(const std::string& id, const std::string& bytes);
+    void erasePhoto(const std::string& id);
     [[nodiscard]] std::map<std::string, Json> all(const std::string& feed);
     [[nodiscard]] std::string photo(const std::string& id);
     // Requests that wrote since the last call.
@@ -41,6 +42,9 @@ public:
     int photoWriteStatus = 0;  // likewise
     // Runs once a photo is written, with the contacts at hand; their etags stay as they are afterwards.
     std::function<void(std::map<std::string, Json>& contacts)> onPhotoWritten;
+    // Before they are answered.
+    std::function<void()> onPhotoRead;
+    std::function<void()> onGroupsRead;
     int profileStatus = 200;
     int profileImageStatus = 200;
 

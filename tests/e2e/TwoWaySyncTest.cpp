@@ -219,6 +219,27 @@ TEST_F(TwoWay, AnInstanceEditedWhileItsSeriesGoesUpIsSentToo) {
     expectSameAndQuiet();
 }
 
+TEST_F(TwoWay, ASeriesEditedBeforeItsInstanceGoesUpIsSentToo) {
+    const std::string first = std::to_string(add("event", mBook, kMeeting));
+    const std::string series = std::to_string(add("event", mBook, kDaily));
+    expectSameAndQuiet();
+    // Both are marked; the series is edited while the first goes up.
+    run({"daemon", "stop"});
+    run({"event", "set", first, "location=Hall"});
+    run({"event", "set", series, "--instance", "20260603T080000Z", "summary=Moved"});
+    mPair.provider.admin("POST", "/hold", {{"method", "GET"}, {"path", "fields=etag%2Cid$"}});
+    run({"daemon", "start"});
+    mPair.provider.admin("GET", "/hold?atLeast=1&timeoutMs=10000");
+    run({"event", "set", series, "location=Garden"});
+    mPair.provider.admin("POST", "/release");
+    expectSoon("the series", [&] {
+        const std::vector<Json> found = eventsNamed("Daily");
+        return eventsNamed("Moved").size() == 1 && found.size() == 1 &&
+               found[0].value("location", "") == "Garden";
+    });
+    expectSameAndQuiet();
+}
+
 TEST_F(TwoWay, AKilledDaemonSendsNothingTwice) {
     mPair.provider.admin("POST", "/faults",
                          {{"method", "POST"},

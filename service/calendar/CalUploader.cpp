@@ -9,7 +9,6 @@
 #include "common/SyncLog.h"
 #include "platform/calendar_read.h"
 
-using calendar_read::intOf;
 using sync_result::kFailed;
 using sync_result::kOk;
 using sync_result::kStopped;

@@ -84,7 +84,10 @@ int CtItemWriter::prepare(std::vector<BulkItem> items, const CtJsonEntryConverte
     out->list.reset(rawList);
     for (BulkItem& item : items) {
         ContactsRecord record;
-        if (!convert(item, converter, &record)) continue;
+        if (!convert(item, converter, &record)) {
+            SYNC_ERR("convert fail");
+            continue;
+        }
         if (contacts_list_add(rawList, record.get()) != PLATFORM_ERROR_NONE) return kFailed;
         out->records.push_back(record.release());
         out->ids.push_back(item.row.contact_id);

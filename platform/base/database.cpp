@@ -31,7 +31,8 @@ int configure(sqlite3* handle) {
         return code;
     }
     // The kernel caches the files too: pages kept beyond a page of the account's items would only be held twice.
-    return sqlite3_exec(handle, "PRAGMA journal_mode=PERSIST; PRAGMA cache_size=-1024", nullptr, nullptr, nullptr);
+    return sqlite3_exec(handle, "PRAGMA journal_mode=PERSIST; PRAGMA cache_size=-1024", nullptr, nullptr,
+                        nullptr);
 }
 
 }  // namespace

@@ -1,6 +1,9 @@
 #include "platform/log.h"
 
 #include <sys/stat.h>
+#include <sys/uio.h>
+// The place in the source stands in the message: the journal would be told of this file.
+#define SD_JOURNAL_SUPPRESS_LOCATION
 #include <systemd/sd-journal.h>
 #include <unistd.h>
 
@@ -12,6 +15,7 @@
 #include <ctime>
 #include <mutex>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -72,6 +76,27 @@ bool goesToJournal() {
            inode == info.st_ino;
 }
 
+thread_local const LogContext* context = nullptr;
+
+// "[7 calendar] "; nothing where a line is about the whole program.
+std::string contextText() {
+    if (context == nullptr) return {};
+    return "[" + std::to_string(context->accountId()) + " " + context->kind() + "] ";
+}
+
+void writeToJournal(log_priority priority, const char* tag, const std::string& message) {
+    std::vector<std::string> fields{"PRIORITY=" + std::to_string(nameOf(priority).syslog),
+                                    "MESSAGE=" + contextText() + message, std::string("TAG=") + tag};
+    if (context != nullptr) {
+        fields.push_back("VANTOR_PIM_SYNC_ACCOUNT=" + std::to_string(context->accountId()));
+        fields.push_back(std::string("VANTOR_PIM_SYNC_KIND=") + context->kind());
+    }
+    std::vector<iovec> parts;
+    parts.reserve(fields.size());
+    for (std::string& field : fields) parts.push_back({field.data(), field.size()});
+    sd_journal_sendv(parts.data(), static_cast<int>(parts.size()));
+}
+
 // Length of the colour sequence at `text` ("ESC [ digits and semicolons m"), 0 when there is none.
 size_t colourLength(const char* text) {
     if (text[0] != '\033' || text[1] != '[') return 0;
@@ -102,7 +127,7 @@ int writeToStandardError(log_priority priority, const char* tag, const std::stri
         std::snprintf(head, sizeof head, "%02d-%02d %02d:%02d:%02d.%03ld %c/%s(%d): ", parts.tm_mon + 1,
                       parts.tm_mday, parts.tm_hour, parts.tm_min, parts.tm_sec, now.tv_nsec / 1'000'000,
                       nameOf(priority).letter, tag, getpid());
-    const std::string line = std::string(head, static_cast<size_t>(length)) + message + "\n";
+    const std::string line = std::string(head, static_cast<size_t>(length)) + contextText() + message + "\n";
     // One write a line: lines of several threads and processes stay whole.
     return static_cast<int>(write(STDERR_FILENO, line.data(), line.size()));
 }
@@ -126,9 +151,17 @@ int dlog_print(log_priority priority, const char* tag, const char* format, ...) 
         if (sink().write != nullptr) sink().write(priority, tag, message.c_str(), sink().userData);
     }
     if (!goesToJournal()) return writeToStandardError(priority, tag, message);
-    sd_journal_send("PRIORITY=%d", nameOf(priority).syslog, "MESSAGE=%s", message.c_str(), "TAG=%s", tag,
-                    nullptr);
+    writeToJournal(priority, tag, message);
     return static_cast<int>(message.size());
+}
+
+LogContext::LogContext(int accountId, const char* kind)
+    : mAccountId(accountId), mKind(kind), mOuter(context) {
+    context = this;
+}
+
+LogContext::~LogContext() {
+    context = mOuter;
 }
 
 void dlog_set_threshold(log_priority lowestShown) {

@@ -1,12 +1,17 @@
 #include "common/DirectedSyncAgent.h"
 
+#include "common/Account.h"
+#include "common/SyncLog.h"
 #include "common/SyncResult.h"
+#include "common/SyncRunStatus.h"
 
 using sync_result::kOk;
 using sync_result::kTokenFailed;
 
 DirectedSyncAgent::DirectedSyncAgent(Account* account, vantor_pim_sync_type_e type)
-    : SyncAgent(account, type), mType(type), mpWorker(std::make_unique<SyncWorker>()) {}
+    : SyncAgent(account, type),
+      mType(type),
+      mpWorker(std::make_unique<SyncWorker>(account->getAccountId(), SyncRunStatus::nameOf(type))) {}
 
 DirectedSyncAgent::~DirectedSyncAgent() {
     mpWorker.reset();
@@ -36,6 +41,7 @@ int DirectedSyncAgent::doStop() {
 }
 
 void DirectedSyncAgent::onSyncCompleted(SyncDirector* director, int result) {
+    const LogContext context(mpAccount->getAccountId(), SyncRunStatus::nameOf(mType));
     noteHalf(isDown(director), result, director->lastFailure());
     noteServer(result, director->isInTrouble());
     if (result == kTokenFailed) onRequestsDropped();
@@ -45,6 +51,7 @@ void DirectedSyncAgent::onSyncCompleted(SyncDirector* director, int result) {
 }
 
 void DirectedSyncAgent::onSyncStopped(SyncDirector* director, int result) {
+    const LogContext context(mpAccount->getAccountId(), SyncRunStatus::nameOf(mType));
     noteHalf(isDown(director), result, director->lastFailure());
     onRequestsDropped();
     continueSync(result);

@@ -321,6 +321,7 @@ int SyncAgent::waitForResult(long timeoutMs) {
 }
 
 void SyncAgent::onSchedule() {
+    const LogContext context(mpAccount->getAccountId(), SyncRunStatus::nameOf(getType()));
     if (is_storage_full() < 0) {
         SYNC_ERR("storage fail");
         return;

@@ -3,6 +3,7 @@
 #include "common/NotificationSendManager.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
+#include "common/SyncRunStatus.h"
 #include "common/SyncService.h"
 #include "common/SyncUtil.h"
 #include "common/vantor_pim_sync.h"
@@ -12,6 +13,8 @@ using sync_result::kOk;
 using sync_result::kStorageFull;
 
 namespace {
+
+constexpr const char* kWholeAccount = "account";
 
 bool isStorageFull() {
     if (is_storage_full() >= 0) return false;
@@ -33,14 +36,17 @@ int vantor_pim_sync_finalize(void) {
 }
 
 int vantor_pim_sync_add_account(const vantor_pim_sync_account_s* account) {
+    const LogContext context(account != nullptr ? account->account_id : 0, kWholeAccount);
     return isStorageFull() ? kStorageFull : SyncService::getInstance().addAccount(account);
 }
 
 int vantor_pim_sync_remove_account(int account_id) {
+    const LogContext context(account_id, kWholeAccount);
     return SyncService::getInstance().removeAccount(account_id);
 }
 
 int vantor_pim_sync_update_account(const vantor_pim_sync_account_s* account) {
+    const LogContext context(account != nullptr ? account->account_id : 0, kWholeAccount);
     return isStorageFull() ? kStorageFull : SyncService::getInstance().updateAccount(account);
 }
 
@@ -49,10 +55,12 @@ int vantor_pim_sync_get_account(int account_id, vantor_pim_sync_account_s** acco
 }
 
 int vantor_pim_sync_start(int account_id, vantor_pim_sync_type_e type) {
+    const LogContext context(account_id, SyncRunStatus::nameOf(type));
     return isStorageFull() ? kStorageFull : SyncService::getInstance().startSync(account_id, type);
 }
 
 int vantor_pim_sync_stop(int account_id, vantor_pim_sync_type_e type) {
+    const LogContext context(account_id, SyncRunStatus::nameOf(type));
     return SyncService::getInstance().stopSync(account_id, type);
 }
 

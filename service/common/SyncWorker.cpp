@@ -18,6 +18,8 @@ struct SyncWorker::SyncRequest {
     SyncWorker* worker;  // NULL once the worker is gone
     SyncDirector* director;
     IResultListener* listener;
+    int accountId;
+    const char* kind;
     int result;
 };
 
@@ -48,7 +50,7 @@ void freeFromSource(gpointer data) {
 
 }  // namespace
 
-SyncWorker::SyncWorker() {
+SyncWorker::SyncWorker(int accountId, const char* kind) : mAccountId(accountId), mKind(kind) {
     initialize();
 }
 
@@ -107,7 +109,8 @@ int SyncWorker::addRequest() {
         SYNC_ERR("g_idle_source_new failed : %s", g_strerror(errno));
         return kFailed;
     }
-    mpRequest = std::make_shared<SyncRequest>(SyncRequest{this, mpSyncDirector, mpResultListener, kFailed});
+    mpRequest = std::make_shared<SyncRequest>(
+        SyncRequest{this, mpSyncDirector, mpResultListener, mAccountId, mKind, kFailed});
     g_source_set_callback(source, runRequest, toSource(mpRequest), freeFromSource<SyncRequest>);
     const guint srcId = g_source_attach(source, g_main_loop_get_context(mpLoop));
     SYNC_ASSERT(srcId != 0);
@@ -117,6 +120,7 @@ int SyncWorker::addRequest() {
 
 gboolean SyncWorker::runRequest(gpointer data) {
     const std::shared_ptr<SyncRequest> request = fromSource<SyncRequest>(data);
+    const LogContext context(request->accountId, request->kind);
     request->result = request->director->run();
     // What the run needed goes back: the next one may be hours away.
     db_util_release_memory();

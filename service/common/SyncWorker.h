@@ -23,7 +23,8 @@ public:
         virtual void onSyncStopped(SyncDirector* director, int result) = 0;
     };
 
-    SyncWorker();
+    // What the lines that are logged during a run begin with. `kind` is not copied.
+    SyncWorker(int accountId, const char* kind);
     ~SyncWorker() override;
     SyncWorker(const SyncWorker&) = delete;
     SyncWorker& operator=(const SyncWorker&) = delete;
@@ -47,6 +48,8 @@ private:
     static void addResponse(std::shared_ptr<SyncRequest> request);
     static gboolean onResponse(gpointer request);
 
+    const int mAccountId;
+    const char* const mKind;
     std::atomic<bool> mIsInProgress{false};
     SyncDirector* mpSyncDirector = nullptr;
     IResultListener* mpResultListener = nullptr;

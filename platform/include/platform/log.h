@@ -17,6 +17,26 @@ enum log_priority {
 int dlog_print(log_priority priority, const char* tag, const char* format, ...)
     __attribute__((format(printf, 3, 4)));
 
+// What the lines of this thread are about while the object lives: an account and a kind of its data. They begin with
+// "[ACCOUNT KIND] ", and carry both as fields (VANTOR_PIM_SYNC_ACCOUNT, VANTOR_PIM_SYNC_KIND) in the journal. Of several the
+// youngest holds.
+class LogContext {
+public:
+    // `kind` is not copied.
+    LogContext(int accountId, const char* kind);
+    ~LogContext();
+    LogContext(const LogContext&) = delete;
+    LogContext& operator=(const LogContext&) = delete;
+
+    [[nodiscard]] int accountId() const { return mAccountId; }
+    [[nodiscard]] const char* kind() const { return mKind; }
+
+private:
+    const int mAccountId;
+    const char* const mKind;
+    const LogContext* const mOuter;
+};
+
 // Sets the threshold of this process; lines below it are hidden.
 void dlog_set_threshold(log_priority lowestShown);
 

@@ -57,7 +57,7 @@ struct Listener : SyncWorker::IResultListener {
 }  // namespace
 
 TEST(SyncWorker, RunsElsewhereAndAnswersOnTheMainLoopOnce) {
-    SyncWorker worker;
+    SyncWorker worker(7, "calendar");
     HeldDirector director(-1);
     Listener listener;
     EXPECT_TRUE(worker.isStopped());
@@ -76,7 +76,7 @@ TEST(SyncWorker, RunsElsewhereAndAnswersOnTheMainLoopOnce) {
 }
 
 TEST(SyncWorker, AStoppedRunStillReportsItsResult) {
-    SyncWorker worker;
+    SyncWorker worker(7, "calendar");
     Listener listener;
     EXPECT_EQ(worker.stop(&listener), -1) << "idle";
     HeldDirector director(-5);
@@ -94,7 +94,7 @@ TEST(SyncWorker, AStoppedRunStillReportsItsResult) {
 TEST(SyncWorker, DestructionStopsTheRunAndNobodyHearsOfIt) {
     Listener listener;
     {
-        auto worker = std::make_unique<SyncWorker>();
+        auto worker = std::make_unique<SyncWorker>(7, "calendar");
         HeldDirector director(0, worker.get());
         ASSERT_EQ(worker->start(&director, &listener), 0);
         ASSERT_TRUE(iterateUntil([&] { return director.running.load(); }));
@@ -105,7 +105,7 @@ TEST(SyncWorker, DestructionStopsTheRunAndNobodyHearsOfIt) {
         HeldDirector director(0);
         director.release();
         iterateReady();
-        SyncWorker worker;
+        SyncWorker worker(7, "calendar");
         ASSERT_EQ(worker.start(&director, &listener), 0);
         const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(10);
         while (g_main_context_pending(nullptr) == FALSE && std::chrono::steady_clock::now() < deadline) {

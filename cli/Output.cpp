@@ -5,6 +5,9 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <numeric>
+#include <sstream>
+#include <utility>
 
 #include "Failure.h"
 #include "Handles.h"
@@ -12,6 +15,10 @@
 namespace output {
 
 namespace {
+
+constexpr std::string_view kGap = "  ";
+constexpr size_t kNarrowest = 4;  // of a column that is cut
+constexpr const char* kCut = "…";
 
 void write(std::string_view text) {
     if (std::fwrite(text.data(), 1, text.size(), stdout) != text.size()) {
@@ -23,6 +30,11 @@ void flush() {
     if (std::fflush(stdout) != 0) {
         throw Failure("standard output cannot be written; check its disk or its reader");
     }
+}
+
+size_t widthOf(gunichar character) {
+    if (g_unichar_iszerowidth(character) != 0) return 0;
+    return g_unichar_iswide(character) != 0 ? 2 : 1;
 }
 
 // Text that came from a database may be damaged; a list must not end in the middle because of it.
@@ -61,6 +73,11 @@ void line(std::string_view text) {
     flush();
 }
 
+void raw(std::string_view text) {
+    write(text);
+    flush();
+}
+
 void json(const Json& value) {
     line(dump(value, 2));
 }
@@ -81,37 +98,72 @@ void JsonArray::end() {
 }
 
 Table::Table(std::vector<std::string> headers) {
-    mRows.push_back(std::move(headers));
+    add(std::move(headers));
 }
 
 void Table::add(std::vector<std::string> cells) {
     for (std::string& cell : cells) cell = printable(cell);
-    mRows.push_back(std::move(cells));
+    std::vector<terminal::Colour> colours(cells.size(), terminal::Colour::kNone);
+    mRows.push_back({std::move(cells), std::move(colours)});
 }
 
-std::string Table::text() const {
-    std::vector<size_t> widths(mRows.front().size(), 0);
-    for (const auto& row : mRows) {
-        for (size_t column = 0; column < row.size(); ++column) {
-            widths[column] = std::max(widths[column], displayWidth(row[column]));
+void Table::colour(size_t column, terminal::Colour colour) {
+    mRows.back().colours.at(column) = colour;
+}
+
+std::vector<size_t> Table::widths(size_t columns) const {
+    std::vector<size_t> widths(mRows.front().cells.size(), 0);
+    for (const Row& row : mRows) {
+        for (size_t column = 0; column < row.cells.size(); ++column) {
+            widths[column] = std::max(widths[column], displayWidth(row.cells[column]));
         }
     }
+    const auto total = [&widths] {
+        return std::accumulate(widths.begin(), widths.end(), kGap.size() * (widths.size() - 1));
+    };
+    while (columns != 0 && total() > columns) {
+        size_t& widest = *std::max_element(widths.begin(), widths.end());
+        if (widest <= kNarrowest) return {};
+        --widest;
+    }
+    return widths;
+}
+
+std::string Table::text(size_t columns) const {
+    const std::vector<size_t> widths = this->widths(columns);
+    if (widths.empty()) return lists();
     std::string text;
-    for (const auto& row : mRows) {
-        std::string rowText;
-        for (size_t column = 0; column < row.size(); ++column) {
-            rowText += row[column];
-            rowText.append(widths[column] - displayWidth(row[column]) + 2, ' ');
+    for (const Row& row : mRows) {
+        size_t blanks = 0;  // before the next cell that shows something, so that no line ends with them
+        for (size_t column = 0; column < row.cells.size(); ++column) {
+            const std::string cell = shortened(row.cells[column], widths[column]);
+            if (!cell.empty()) {
+                text.append(std::exchange(blanks, 0), ' ');
+                text += terminal::coloured(cell, row.colours[column]);
+            }
+            blanks += widths[column] - displayWidth(cell) + kGap.size();
         }
-        rowText.erase(rowText.find_last_not_of(' ') + 1);
-        text += rowText + "\n";
+        text += "\n";
+    }
+    return text;
+}
+
+std::string Table::lists() const {
+    const std::vector<std::string>& headers = mRows.front().cells;
+    std::string text;
+    for (size_t row = 1; row < mRows.size(); ++row) {
+        if (row > 1) text += "\n";
+        for (size_t column = 0; column < headers.size(); ++column) {
+            const std::string& cell = mRows[row].cells[column];
+            if (cell.empty()) continue;
+            text += headers[column] + ": " + terminal::coloured(cell, mRows[row].colours[column]) + "\n";
+        }
     }
     return text;
 }
 
 void Table::print() const {
-    write(text());
-    flush();
+    raw(text(terminal::columns()));
 }
 
 void fields(const Json& object) {
@@ -146,16 +198,65 @@ size_t displayWidth(std::string_view text) {
     const GChars valid(g_utf8_make_valid(text.data(), static_cast<gssize>(text.size())));
     size_t width = 0;
     for (const char* at = valid.get(); *at != '\0'; at = g_utf8_next_char(at)) {
-        const gunichar character = g_utf8_get_char(at);
-        if (g_unichar_iszerowidth(character) != 0) continue;
-        width += g_unichar_iswide(character) != 0 ? 2 : 1;
+        width += widthOf(g_utf8_get_char(at));
     }
     return width;
 }
 
-void progress(std::string_view text) {
+std::string shortened(const std::string& text, size_t columns) {
+    if (displayWidth(text) <= columns) return text;
+    const GChars valid(g_utf8_make_valid(text.data(), static_cast<gssize>(text.size())));
+    const char* at = valid.get();
+    size_t width = displayWidth(kCut);
+    for (; *at != '\0'; at = g_utf8_next_char(at)) {
+        width += widthOf(g_utf8_get_char(at));
+        if (width > columns) break;
+    }
+    return columns == 0 ? std::string() : std::string(static_cast<const char*>(valid.get()), at) + kCut;
+}
+
+std::string wrapped(std::string_view text, size_t columns, size_t indent) {
+    const std::string margin(indent, ' ');
+    std::string out = margin;
+    size_t width = indent;
+    std::istringstream words{std::string(text)};
+    for (std::string word; words >> word;) {
+        const size_t wide = displayWidth(word);
+        const bool isFirst = width == indent;
+        if (!isFirst && columns != 0 && width + 1 + wide > columns) {
+            out.append("\n").append(margin).append(word);
+            width = indent + wide;
+            continue;
+        }
+        out += (isFirst ? "" : " ") + word;
+        width += wide + (isFirst ? 0 : 1);
+    }
+    return out;
+}
+
+namespace {
+
+bool isPassing = false;  // the last text on standard error is one that the next replaces
+
+void show(std::string_view text, bool passes) {
     if (isatty(STDERR_FILENO) == 0) return;
-    std::fprintf(stderr, "%.*s\n", static_cast<int>(text.size()), text.data());
+    const std::string line = printable(text);
+    // The line is cleared only where something stands that is to be replaced.
+    std::fprintf(stderr, "%s%s%s", isPassing ? "\r\033[K" : "", line.c_str(), passes ? "" : "\n");
+    std::fflush(stderr);
+    isPassing = passes && !line.empty();
+}
+
+}  // namespace
+
+void progress(std::string_view text) {
+    show(text, /*passes=*/false);
+}
+
+void passingProgress(std::string_view text) {
+    const size_t columns = terminal::columns();
+    // A line that wraps could not be replaced.
+    show(columns > 1 ? shortened(std::string(text), columns - 1) : std::string(text), /*passes=*/true);
 }
 
 }  // namespace output

@@ -10,9 +10,9 @@ SyncState::SyncState(int accountId, vantor_pim_sync_type_e kind)
       mPrefix("memory/vantor-pim-sync/" + std::to_string(accountId) + "/" + sync_client::kindName(kind) +
               "/") {}
 
-std::string SyncState::failure() const {
+std::string SyncState::text(const char* name) const {
     std::string text;
-    const int code = vconf_get_str((mPrefix + "failure").c_str(), &text);
+    const int code = vconf_get_str((mPrefix + name).c_str(), &text);
     return code == PLATFORM_ERROR_NONE ? text : std::string();
 }
 

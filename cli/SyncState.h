@@ -18,7 +18,9 @@ public:
     [[nodiscard]] int downResult() const { return number("down_result").value_or(0); }
     [[nodiscard]] int upResult() const { return number("up_result").value_or(0); }
     // Text of the last failure, "" for none.
-    [[nodiscard]] std::string failure() const;
+    [[nodiscard]] std::string failure() const { return text("failure"); }
+    // How far a running sync is, "" when it has nothing to say.
+    [[nodiscard]] std::string progress() const { return text("progress"); }
     // Records that wait to go up; nothing when the daemon has not counted them.
     [[nodiscard]] std::optional<int> dirty() const { return number("dirty"); }
     [[nodiscard]] std::optional<int> deleted() const { return number("deleted"); }
@@ -31,6 +33,7 @@ public:
 
 private:
     [[nodiscard]] std::optional<int> number(const char* name) const;
+    [[nodiscard]] std::string text(const char* name) const;
 
     int mAccountId;
     vantor_pim_sync_type_e mKind;

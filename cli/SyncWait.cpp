@@ -7,6 +7,7 @@
 
 #include "DaemonLink.h"
 #include "Failure.h"
+#include "Output.h"
 #include "SyncClient.h"
 #include "SyncState.h"
 #include "platform/error.h"
@@ -54,6 +55,14 @@ private:
     guint mSource;
 };
 
+// Whatever comes next on the terminal begins on a line of its own.
+struct PassingProgress {
+    PassingProgress() = default;
+    ~PassingProgress() { output::passingProgress(""); }
+    PassingProgress(const PassingProgress&) = delete;
+    PassingProgress& operator=(const PassingProgress&) = delete;
+};
+
 }  // namespace
 
 SyncWait::SyncWait() : mDaemonPid(daemon_link::servingPid()) {}
@@ -66,6 +75,7 @@ bool SyncWait::isSameDaemon() const {
 void SyncWait::untilEnded(const SyncState& state, int run) const {
     const Watch watch(state.endedKey());
     Ticker ticker;
+    const PassingProgress cleared;
     bool isAlive = true;
     int silentLooks = 0;
     while (state.ended() < run) {
@@ -74,6 +84,8 @@ void SyncWait::untilEnded(const SyncState& state, int run) const {
         // Looked at before the key is read again: a daemon may end right after a sync that ended well.
         if (!ticker.take()) continue;
         isAlive = isSameDaemon();
+        if (const std::string progress = state.progress(); !progress.empty())
+            output::passingProgress(sync_client::kindName(state.kind()) + ": " + progress);
         const bool isRunning =
             isAlive && sync_client::state(state.accountId(), state.kind()) == SYNC_AGENT_STATE_IN_PROGRESS;
         silentLooks = isRunning ? 0 : silentLooks + 1;

@@ -30,12 +30,14 @@ CalDownSyncDirector::CalDownSyncDirector(Account* account, IStopQuery* stopQuery
       mpStopQuery(stopQuery),
       mpShare(std::make_shared<HttpShare>()),
       mEvents(account, this, mpShare),
-      mTodos(account, this, mpShare) {}
+      mTodos(account, this, mpShare),
+      mProgress(account->getAccountId(), VANTOR_PIM_SYNC_TYPE_CALENDAR) {}
 
 CalDownSyncDirector::~CalDownSyncDirector() = default;
 
 int CalDownSyncDirector::run() {
     mFailure.clear();
+    mProgress.beginRun();
     const int calendars = syncCalendar();
     if (calendars == kStopped || calendars == kTokenFailed || (calendars != kOk && mEvents.unreachable()))
         return calendars;
@@ -199,6 +201,7 @@ int CalDownSyncDirector::insertBooks(CalSyncSide& side, const BookPlan& plan) {
 int CalDownSyncDirector::syncItems(CalSyncSide& side, const CalList& books, PageMode mode) {
     int first = kOk;
     for (const CalListInfoPtr& entry : books) {
+        mProgress.beginPart(entry->summary);
         const int result = syncPage(side, entry->id, mode);
         if (result == kStopped || result == kTokenFailed) return result;
         if (result == kOk) continue;
@@ -247,6 +250,7 @@ int CalDownSyncDirector::writePages(CalSyncSide& side, const std::string& bookUr
             if (result == kTokenFailed || (result != kOk && side.unreachable())) return result;
             if (result != kOk) content = result;
             if (writer->writePage(page) != kOk) *written = kFailed;
+            mProgress.addPage(page.entries.size());
             return kOk;
         },
         [this] { return isStopped(); });

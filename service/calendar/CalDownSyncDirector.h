@@ -16,6 +16,7 @@
 #include "calendar/CalSyncSide.h"
 #include "common/SyncCurl.h"
 #include "common/SyncDirector.h"
+#include "common/SyncProgress.h"
 
 class Account;
 class CalItemWriter;
@@ -70,5 +71,6 @@ private:
     std::shared_ptr<HttpShare> mpShare;
     CalEventSide mEvents;
     CalTodoSide mTodos;
+    SyncProgress mProgress;
     std::string mFailure;  // worker thread while a run is going on, main thread after it
 };

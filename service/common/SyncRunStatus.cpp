@@ -19,10 +19,15 @@ const char* SyncRunStatus::nameOf(vantor_pim_sync_type_e type) {
     return kKindNames[type == VANTOR_PIM_SYNC_TYPE_CALENDAR ? 0 : 1];
 }
 
+std::string SyncRunStatus::keyOf(int accountId, vantor_pim_sync_type_e type, const char* name) {
+    return "memory/vantor-pim-sync/" + std::to_string(accountId) + "/" + nameOf(type) + "/" + name;
+}
+
 SyncRunStatus::SyncRunStatus(int accountId, vantor_pim_sync_type_e type)
-    : mPrefix("memory/vantor-pim-sync/" + std::to_string(accountId) + "/" + nameOf(type) + "/") {
+    : mPrefix(keyOf(accountId, type, "")) {
     mRun = number("run");
     if (mRun == number("ended")) return;
+    clearProgress();
     setNumber("down_result", kFailed);
     setText("failure", "the daemon ended during the sync");
     setNumber("ended", mRun);
@@ -49,6 +54,7 @@ void SyncRunStatus::endHalf(bool isDown, int result, const std::string& failure)
 void SyncRunStatus::end() {
     if (!mIsRunning) return;
     mIsRunning = false;
+    clearProgress();
     setNumber("down_result", mDownResult);
     setNumber("up_result", mUpResult);
     setText("failure", mFailure);
@@ -66,6 +72,12 @@ void SyncRunStatus::setNextAlarm(int secondsSince1970) {
 
 std::string SyncRunStatus::key(const char* name) const {
     return mPrefix + name;
+}
+
+void SyncRunStatus::clearProgress() {
+    std::string text;
+    if (vconf_get_str(key("progress").c_str(), &text) == PLATFORM_ERROR_NONE && !text.empty())
+        setText("progress", "");
 }
 
 int SyncRunStatus::number(const char* name) const {

@@ -8,6 +8,7 @@
 //   failure       str  why, for people; empty after a run that ended well
 //   dirty         int  changes that wait to be sent
 //   deleted       int  deletions that wait to be sent
+//   progress      str  how far a running sync is, when it takes long (SyncProgress.h); empty when none is running
 //   next_alarm    int  when the next scheduled sync is due, in seconds since 1970; 0 when none is
 //
 // The keys outlive the daemon, so numbers go on after a restart, and a run that was cut off is ended then.
@@ -32,11 +33,13 @@ public:
 
     // Of the kind, as in the keys: "calendar" or "contacts".
     static const char* nameOf(vantor_pim_sync_type_e type);
+    static std::string keyOf(int accountId, vantor_pim_sync_type_e type, const char* name);
 
 private:
     [[nodiscard]] std::string key(const char* name) const;
     [[nodiscard]] int number(const char* name) const;
     void setNumber(const char* name, int value);
+    void clearProgress();
     void setText(const char* name, const std::string& value);
 
     const std::string mPrefix;

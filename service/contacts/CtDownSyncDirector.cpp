@@ -29,10 +29,12 @@ CtDownSyncDirector::CtDownSyncDirector(Account* account, IStopQuery* stopQuery)
       mCurl(account, this, std::make_shared<HttpShare>()),
       mContactTask(&mCurl),
       mGroupTask(&mCurl),
-      mPhotoTask(&mCurl) {}
+      mPhotoTask(&mCurl),
+      mProgress(account->getAccountId(), VANTOR_PIM_SYNC_TYPE_CONTACTS) {}
 
 int CtDownSyncDirector::run() {
     mFailure.clear();
+    mProgress.beginRun();
     if (isStopped()) return kStopped;
     const int accountId = mpAccount->getAccountId();
     // The device's changes are marked before anything is compared, so that no write of ours can hide one.
@@ -119,6 +121,7 @@ int CtDownSyncDirector::syncContacts(Feed feed) {
         return fail(kFailed, kStoresUnreadable);
     }
     mHasPeople = true;
+    mProgress.beginPart("contacts");
     const ContactComposer composer = groups.composer(mCurl.feedBase());
     CtListing<CtContactKind> listing(store, &snapshot);
     CtSentRows<CtContactKind> sent = readSentContacts(snapshot, composer);
@@ -133,8 +136,10 @@ int CtDownSyncDirector::syncContacts(Feed feed) {
         fetch,
         [&](CtContactPage& page) {
             listing.take(&page);
+            const size_t listed = page.entries.size();
             CtContactBatch batch = planContacts(page, snapshot, groups, composer, &sent);
             if (const int photos = fetchPhotos(&batch, groups); photos != kOk) return photos;
+            mProgress.addPage(listed);
             if (writeBatch(&batch, feed, &inserted, &updated) != kOk) written = kFailed;
             return kOk;
         },

@@ -8,6 +8,7 @@
 #include <string>
 
 #include "common/SyncDirector.h"
+#include "common/SyncProgress.h"
 #include "contacts/CtBulkItem.h"
 #include "contacts/CtCurl.h"
 #include "contacts/CtDownSyncTasks.h"
@@ -55,6 +56,7 @@ private:
     CtDownSyncTask mContactTask;
     CtDownSyncGroupListTask mGroupTask;
     CtDownSyncContactPhotoTask mPhotoTask;
+    SyncProgress mProgress;
     bool mHasPeople = true;  // false once the people server did not answer
     std::string mFailure;
 };

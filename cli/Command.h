@@ -34,6 +34,9 @@ bool readNumber(const std::string& text, int least, int most, int* out);
 
 // The builders, one file a noun.
 Action buildInit(CLI::App& app);
+Action buildDoctor(CLI::App& app);
+Action buildWatch(CLI::App& app);
+Action buildLog(CLI::App& app);
 Action buildKeySet(CLI::App& app);
 Action buildSettingGet(CLI::App& app);
 Action buildSettingSet(CLI::App& app);

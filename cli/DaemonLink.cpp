@@ -121,9 +121,12 @@ bool isAnswering(int timeoutMs) {
 
 void requireRunning() {
     if (servingPid()) return;
-    throw Failure(device::isPrivate()
-                      ? "the daemon does not run; start it with: vantor-pim-syncctl daemon start"
-                      : "the daemon does not run; start it with: systemctl start vantor-pim-sync");
+    throw Failure("the daemon does not run; " + startAdvice());
+}
+
+std::string startAdvice() {
+    return device::isPrivate() ? "start it with: vantor-pim-syncctl daemon start"
+                               : "start it with: systemctl start vantor-pim-sync";
 }
 
 bool start() {

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <optional>
+#include <string>
 
 namespace daemon_link {
 
@@ -13,6 +14,8 @@ bool isAnswering(int timeoutMs);
 
 // A Failure that tells how to start it, when it does not run.
 void requireRunning();
+// How a person starts it here.
+std::string startAdvice();
 
 // Starts the daemon of a private root, detached from the tool, and returns when it answers. A Failure when it ends
 // early (it does so without any account), or on a system install. Returns false when it ran already.

@@ -18,11 +18,6 @@ namespace device {
 
 namespace {
 
-struct Folder {
-    const char* path;
-    mode_t mode;
-    bool isOfTheSystem;  // there in every real root, and not ours to change there
-};
 constexpr Folder kFolders[] = {
     {"/tmp", 01777, true},
     {kStoreFolder, 0770, false},
@@ -31,7 +26,6 @@ constexpr Folder kFolders[] = {
 };
 // Clients watch them, the daemon alone writes.
 constexpr const char* kNotificationFiles[] = {"/.notificationPathCalendar", "/.notificationPathContacts"};
-constexpr mode_t kNotificationMode = 0644;
 
 void makeFolder(const Folder& folder) {
     const std::string path = platform::rootedPath(folder.path);
@@ -62,13 +56,21 @@ bool isPrivate() {
     return !platform::rootFolder().empty();
 }
 
+std::span<const Folder> folders() {
+    return kFolders;
+}
+
+std::array<std::string, 2> notificationFiles() {
+    return {std::string(kDataFolder) + kNotificationFiles[0],
+            std::string(kDataFolder) + kNotificationFiles[1]};
+}
+
 void prepare() {
     for (const Folder& folder : kFolders) {
         if (folder.isOfTheSystem && !isPrivate()) continue;
         makeFolder(folder);
     }
-    for (const char* name : kNotificationFiles)
-        makeNotificationFile(platform::rootedPath(kDataFolder) + name);
+    for (const std::string& path : notificationFiles()) makeNotificationFile(platform::rootedPath(path));
     check(account_connect(), "the account store");
     account_disconnect();
     const CalendarStore calendars;

@@ -50,8 +50,7 @@ std::string kindName(vantor_pim_sync_type_e kind) {
 std::string refusal(int code, int id, vantor_pim_sync_type_e kind) {
     const std::string number = std::to_string(id);
     if (code == kStorageFull) return kStorageFullText;
-    if (!daemon_link::servingPid())
-        return "the daemon has ended; start it with: vantor-pim-syncctl daemon start";
+    if (!daemon_link::servingPid()) return "the daemon has ended; " + daemon_link::startAdvice();
     if (state(id, kind) == SYNC_AGENT_STATE_UNAVAILABLE) {
         return "the account's authorisation is no longer accepted; renew the token with: account update " +
                number + " --refresh-token-file FILE";

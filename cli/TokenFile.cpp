@@ -86,6 +86,16 @@ void write(int accountId, const std::string& token) {
     fsync(folder.get());
 }
 
+std::string path(int accountId) {
+    return platform::rootedPath(device::kTrustedFolder) + "/" + nameOf(accountId);
+}
+
+Access access(int accountId) {
+    struct stat info {};
+    if (lstat(path(accountId).c_str(), &info) != 0) return {};
+    return {info.st_mode & 07777, info.st_uid == geteuid() || geteuid() == 0};
+}
+
 void remove(int accountId) {
     const std::string name = nameOf(accountId);
     const Descriptor folder = openFolder();

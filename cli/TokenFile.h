@@ -11,6 +11,14 @@ namespace token_file {
 std::optional<std::string> read(int accountId);
 // Replaced whole, mode 0600.
 void write(int accountId, const std::string& token);
+// Where it is, below the root.
+std::string path(int accountId);
+struct Access {
+    unsigned mode = 0;
+    bool isOwn = false;  // belongs to this user, or this is root
+};
+// Who may read it; the default when there is none.
+Access access(int accountId);
 // None is success.
 void remove(int accountId);
 

@@ -10,9 +10,12 @@
 
 #include <chrono>
 #include <filesystem>
+#include <fstream>
+#include <set>
 #include <thread>
 
 #include "AccountService.h"
+#include "Device.h"
 #include "SyncState.h"
 #include "TokenFile.h"
 #include "cli/ToolRoot.h"
@@ -166,6 +169,80 @@ TEST_F(DaemonTool, AWaitTellsThatTheSyncFailed) {
         EXPECT_THAT(result.error, HasSubstr("calendar: "));
     }
     EXPECT_NE(mTool.json({"status", "7", "--json"})[0]["failure"], "");
+}
+
+TEST_F(DaemonTool, TheLogShowsWhatTheDaemonWroteOfAnAccount) {
+    const SilentServer refusing(/*isOpen=*/false);
+    ASSERT_EQ(add(refusing.url()).status, 0);
+    ASSERT_EQ(add(refusing.url(), 8).status, 0);
+    EXPECT_EQ(mTool.run({"sync", "7", "--wait"}).status, 1);
+    EXPECT_THAT(mTool.run({"log", "7"}).output,
+                testing::AllOf(HasSubstr("[7 calendar] "), HasSubstr("[7 contacts] ")));
+    EXPECT_THAT(mTool.run({"log", "8"}).output, testing::Not(HasSubstr("[7 ")));
+    EXPECT_EQ(mTool.json({"log", "7", "--lines", "2", "--json"}).size(), 2U);
+    EXPECT_THAT(mTool.run({"log"}).output, testing::Not(HasSubstr("token-7")));
+}
+
+TEST_F(DaemonTool, AWatchTellsOfEachChangeUntilItIsEnded) {
+    const SilentServer silent;
+    ASSERT_EQ(add(silent.url()).status, 0);
+    Process watch({binary(), "watch", "7", "--json"}, {});
+    const auto nextState = [&watch] {
+        const auto line = watch.readLine(kLimitMs);
+        return line ? Json::parse(*line)[0]["state"].get<std::string>() : "nothing";
+    };
+    EXPECT_EQ(nextState(), "ready");
+    ASSERT_EQ(mTool.run({"sync", "7", "calendar"}).status, 0);
+    EXPECT_EQ(nextState(), "in progress");
+    ASSERT_EQ(mTool.run({"daemon", "stop"}).status, 0);
+    std::string state = nextState();
+    while (state == "in progress" || state == "ready")
+        state = nextState();  // what its end leaves behind on the way
+    EXPECT_EQ(state, "none");
+    watch.kill(SIGINT);
+    EXPECT_EQ(watch.wait(kLimitMs), 0);
+}
+
+TEST_F(DaemonTool, TheDoctorFindsWhatIsBroken) {
+    const SilentServer refusing(/*isOpen=*/false);
+    ASSERT_EQ(add(refusing.url()).status, 0);
+    const auto write = [this](const char* path, const char* text) {
+        std::ofstream(mTool.root().at(path), std::ios::trunc) << text;
+    };
+    constexpr const char* kTrusted = "/opt/usr/apps/com.morvane.vantor-service-account-lite/shared/trusted";
+    constexpr const char* kNotification = "/opt/usr/data/vantor-pim-sync/.notificationPathCalendar";
+    const std::string token = std::string(kTrusted) + "/7_file";
+    std::set<std::string> found;
+    const auto look = [&] {
+        const CommandResult result = mTool.run({"doctor", "--json"});
+        EXPECT_EQ(result.status, 1);
+        EXPECT_THAT(result.output + result.error, testing::Not(HasSubstr("token-7")));
+        found.clear();
+        for (const Json& finding : Json::parse(result.output)) {
+            if (finding["health"] != "problem") continue;
+            found.insert(finding["check"]);
+            EXPECT_NE(finding["advice"], "") << finding["text"];
+        }
+    };
+    look();
+    EXPECT_EQ(found, (std::set<std::string>{"folders", "servers"})) << "the test's root is open to everybody";
+    for (const device::Folder& folder : device::folders())
+        chmod(mTool.root().at(folder.path).c_str(), folder.mode);
+    look();
+    EXPECT_EQ(found, (std::set<std::string>{"servers"}));
+
+    chmod(mTool.root().at(token.c_str()).c_str(), 0644);
+    chmod(mTool.root().at("/opt/usr/data/key-storage/vantor.tovik.client.secret").c_str(), 0644);
+    std::filesystem::remove(mTool.root().at(kNotification));
+    ASSERT_EQ(mTool.run({"daemon", "stop"}).status, 0);
+    write("/opt/usr/dbspace/.vantor_pim_sync_todo.db", "no database");
+    look();
+    EXPECT_EQ(found, (std::set<std::string>{"daemon", "folders", "keys", "servers", "stores", "tokens"}));
+    // A link where a file should be is not followed.
+    std::filesystem::remove(mTool.root().at(token.c_str()));
+    std::filesystem::create_symlink("/etc/hostname", mTool.root().at(token.c_str()));
+    look();
+    EXPECT_TRUE(found.contains("tokens"));
 }
 
 TEST_F(DaemonTool, AWaitJoinsTheSyncThatIsGoingOnAndEndsWithIt) {

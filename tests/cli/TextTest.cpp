@@ -1,10 +1,12 @@
 // The conversions between stored values and the texts that people and scripts see.
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include "EventFields.h"
 #include "Output.h"
 #include "RruleText.h"
 #include "ServerUrl.h"
+#include "SyncStatus.h"
 #include "TextFields.h"
 #include "TimeText.h"
 
@@ -171,6 +173,49 @@ TEST(Output, ColumnsFitWhateverTheTextIs) {
               "日本      x\n"
               "e\u0301te       y\n"
               "a [31m \ufffd  z\n");
+    // Cut in the middle of no character; a list where even that does not help.
+    EXPECT_EQ(table.text(8),
+              "A     B\n"
+              "日…   x\n"
+              "e\u0301te   y\n"
+              "a [3…  z\n");
+    EXPECT_THAT(table.text(6), testing::HasSubstr("A: 日本\nB: x\n\n"));
+    EXPECT_EQ(output::wrapped("what to do about it", 12, 2), "  what to do\n  about it");
+}
+
+TEST(SyncStatus, APersonIsToldWhatIsWrongAndWhatToDo) {
+    constexpr int64_t kNow = 1'400'000'000;
+    SyncStatus status;
+    status.account = 7;
+    status.isServed = status.isEnabled = true;
+    status.state = SYNC_AGENT_STATE_READY;
+    status.lastSyncSec = kNow - 7300;
+    status.nextSyncSec = kNow + 1900;
+    status.pending = {3, 0};
+    EXPECT_EQ(sync_status::toText({status}, 0, kNow),
+              "ACCOUNT  KIND      STATE  LAST SYNC  NEXT SYNC  TO SEND  TO DELETE\n"
+              "7        calendar  ready  2 h ago    in 31 min  3\n");
+
+    struct AdviceRow {
+        const char* name;
+        void (*change)(SyncStatus&);
+        const char* problem;
+        const char* advice;
+    };
+    const AdviceRow rows[] = {
+        {"token", [](SyncStatus& s) { s.state = SYNC_AGENT_STATE_UNAVAILABLE; }, "unavailable",
+         "--refresh-token-file"},
+        {"daemon", [](SyncStatus& s) { s.isServed = false; }, "no daemon", "start"},
+        {"failure", [](SyncStatus& s) { s.failure = "no\nroute"; }, "calendar: no route", "doctor"},
+        {"off", [](SyncStatus& s) { s.isEnabled = false; }, "off", ""},
+    };
+    for (const AdviceRow& row : rows) {
+        SyncStatus changed = status;
+        row.change(changed);
+        EXPECT_THAT(sync_status::toText({changed}, 0, kNow), testing::HasSubstr(row.problem)) << row.name;
+        EXPECT_THAT(sync_status::adviceFor(changed), testing::HasSubstr(row.advice)) << row.name;
+        EXPECT_EQ(sync_status::adviceFor(changed).empty(), *row.advice == '\0') << row.name;
+    }
 }
 
 }  // namespace

@@ -24,6 +24,7 @@ class Device:
         self.root = pathlib.Path(folder) / "root"
         self.log_path = pathlib.Path(folder) / "daemon.log"
         self.report_path = pathlib.Path(folder) / "steps"
+        self.wrapper = []  # a command that the daemon is started with
         self._daemon = None
         self._traced = False
 
@@ -67,7 +68,7 @@ class Device:
     def start(self, fault=None):
         """Alone, or with `fault` (options of the tracer; an empty list only counts). Waits until it answers or is gone."""
         (self.root / SOCKET).unlink(missing_ok=True)
-        command = [paths.binary("vantor-pim-sync")]
+        command = [*self.wrapper, paths.binary("vantor-pim-sync")]
         self._traced = fault is not None
         if self._traced:
             command = [paths.binary("faultpoint"), "--root", str(self.root), "--report", str(self.report_path), *fault,
@@ -118,6 +119,9 @@ class Device:
             self._signal(signal.SIGKILL)
             self._daemon.wait()
             return False
+
+    def exit_status(self):
+        return self._daemon.returncode
 
     def log(self):
         return self.log_path.read_text(errors="replace") if self.log_path.exists() else ""

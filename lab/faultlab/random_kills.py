@@ -61,13 +61,13 @@ class Editor(threading.Thread):
         text = f"text {self._count} of the {self.side}."
         kind = self._random.choice(list(FIELDS))
         if choice < 0.3:
-            item = self._make_item(kind, text)
+            item = self.make_item(kind, text)
             self._made.append((kind, item))
             self._texts[kind, item] = text
             self._history.wrote(text)
         elif choice < 0.4 and self._made:
             kind, item = self._made.pop(self._random.randrange(len(self._made)))
-            if self._remove_item(kind, item):
+            if self.remove_item(kind, item):
                 self._history.removed(self._texts.pop((kind, item)))
         else:
             self._edit_one(kind, text)
@@ -79,7 +79,7 @@ class Editor(threading.Thread):
         before = self._texts.get((kind, item))
         if before:
             self._history.may_be_lost(before)
-        if self._edit(kind, item, text):
+        if self.edit(kind, item, text):
             self._texts[kind, item] = text
             self._history.wrote(text, uid)
 
@@ -102,7 +102,7 @@ class DeviceEditor(Editor):
         series = next(str(e["id"]) for e in device.json("events", "list") if e["uid"] == SERIES)
         self._own["event"] += [((series, instance), f"{SERIES}_{instance}") for instance in INSTANCES]
 
-    def _make_item(self, kind, text):
+    def make_item(self, kind, text):
         item = {"summary": text}
         if kind == "event":
             item.update(start="2026-04-01T09:00:00Z", end="2026-04-01T10:00:00Z")
@@ -110,14 +110,14 @@ class DeviceEditor(Editor):
             return self._device.tool("contact", "add", "--account", "1", "-", text=json.dumps({"name": {"first": text}}))
         return self._device.tool(kind, "add", "--calendar", self._books[kind], "-", text=json.dumps(item))
 
-    def _remove_item(self, kind, item):
+    def remove_item(self, kind, item):
         self._device.tool(kind, "delete", item)
         return True
 
     def _known(self, kind):
         return self._random.choice(self._own[kind])
 
-    def _edit(self, kind, item, text):
+    def edit(self, kind, item, text):
         try:
             where = [item] if isinstance(item, str) else [item[0], "--instance", item[1]]
             self._device.tool(kind, "set", *where, f"{FIELDS[kind]}={text}")
@@ -139,13 +139,13 @@ class ServerEditor(Editor):
         super().__init__(seed, history)
         self._provider = provider
 
-    def _make_item(self, kind, text):
+    def make_item(self, kind, text):
         body = {"event": {"summary": text, "start": {"dateTime": "2026-03-20T09:00:00Z"},
                           "end": {"dateTime": "2026-03-20T10:00:00Z"}},
                 "todo": {"title": text}, "contact": {"gd$name": {"gd$givenName": {"$t": text}}}}[kind]
         return self._provider.admin("POST", self.PATHS[kind], body)["id"]
 
-    def _remove_item(self, kind, item):
+    def remove_item(self, kind, item):
         self._provider.admin("DELETE", f"{self.PATHS[kind]}/{item}")
         return True
 
@@ -153,7 +153,7 @@ class ServerEditor(Editor):
         item = self._random.choice(self.KNOWN[kind])
         return item, item
 
-    def _edit(self, kind, item, text):
+    def edit(self, kind, item, text):
         body = {"event": {"description": text}, "todo": {"title": text}, "contact": {"content": {"$t": text}}}[kind]
         try:
             self._provider.admin("PATCH", f"{self.PATHS[kind]}/{item}", body)

@@ -1,7 +1,8 @@
 """The scenarios that are not a disturbance at a step."""
-from faultlab import accounts, random_kills, replies
+from faultlab import accounts, long_run, random_kills, replies
 
-SCENARIOS = {"replies": replies.run, "accounts": accounts.run, "random-kills": random_kills.run}
+SCENARIOS = {"replies": replies.run, "accounts": accounts.run, "random-kills": random_kills.run,
+             "long-run": long_run.run}
 
 
 def run(workers, table, arguments):

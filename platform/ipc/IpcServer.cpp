@@ -25,6 +25,8 @@ namespace {
 constexpr const char* kTag = "PLATFORM_IPC";
 constexpr guint kAcceptPauseMs = 200;
 constexpr size_t kReadChunkBytes = 16 * 1024;
+constexpr size_t kMostUnfinishedBytes =
+    16 * kMaxFrameBytes;  // of all clients' requests that are not whole yet
 
 class Service;
 
@@ -39,6 +41,8 @@ public:
     }
     Connection(const Connection&) = delete;
     Connection& operator=(const Connection&) = delete;
+
+    [[nodiscard]] size_t unfinishedBytes() const { return mInput.size(); }
 
 private:
     void watch(GIOCondition condition) {
@@ -123,6 +127,13 @@ public:
     }
 
     void drop(Connection* connection) { mConnections.erase(connection); }
+
+    // Whether the requests that are not whole yet leave room for another long one.
+    [[nodiscard]] bool hasRoom() const {
+        size_t bytes = 0;
+        for (const auto& [connection, owned] : mConnections) bytes += connection->unfinishedBytes();
+        return bytes <= kMostUnfinishedBytes;
+    }
 
     // Composes the reply to one request; empty when the request breaks the format.
     std::string answer(const std::string& payload) {
@@ -217,7 +228,11 @@ bool Connection::receive() {
     if (count == 0) return false;
     if (count < 0) return errno == EAGAIN || errno == EINTR;
     mInput.append(chunk, static_cast<size_t>(count));
-    return answerNext();
+    if (!answerNext()) return false;
+    if (mInput.empty()) mInput.shrink_to_fit();  // a long request leaves nothing behind
+    if (mInput.size() <= kReadChunkBytes || mService->hasRoom()) return true;
+    dlog_print(DLOG_ERROR, kTag, "too many long requests are not whole yet, a client is disconnected");
+    return false;
 }
 
 bool Connection::answerNext() {

@@ -8,6 +8,8 @@ namespace {
 
 // Readers look within seconds; a reader that finds a gap takes it that everything was written.
 constexpr int kKeptWrites = 4096;
+// More than any account holds, so that no reader misses a deletion between two looks; some 14 MB.
+constexpr int kKeptDeletions = 256 * 1024;
 
 }  // namespace
 
@@ -70,8 +72,15 @@ int Store::Write::finish(int result) {
                 noted != SQLITE_DONE) {
                 return noted;
             }
-            return connection.prepare("DELETE FROM writes WHERE version <= ?")
-                .bind(int64_t{mVersion} - kKeptWrites)
+            if (const int dropped = connection.prepare("DELETE FROM writes WHERE version <= ?")
+                                        .bind(int64_t{mVersion} - kKeptWrites)
+                                        .step();
+                dropped != SQLITE_DONE) {
+                return dropped;
+            }
+            return connection
+                .prepare("DELETE FROM tombstones WHERE rowid <= (SELECT max(rowid) FROM tombstones) - ?")
+                .bind(int64_t{kKeptDeletions})
                 .step();
         }();
         if (const int stored = mStore.codeOf(code); stored != PLATFORM_ERROR_NONE) return stored;

@@ -103,7 +103,9 @@ void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, c
         return removeGone(row, version);
     }
     if (before.answer != UpAnswer::kAccepted) return endWith(row, before, End::kDirtyOfBook);
-    if (hasOwnUri && !row.etag.empty() && before.etag != row.etag) {
+    // What the server has no exception for is shown with its series' etag.
+    const std::string& known = hasOwnUri ? row.etag : series.etag;
+    if (!known.empty() && before.etag != known) {
         SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName, uri.c_str());
     }
     std::string etag = before.etag;

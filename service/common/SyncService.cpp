@@ -129,11 +129,10 @@ int SyncService::initialize() {
 void SyncService::setUpCryptoLocks() {
 #pragma GCC diagnostic push
 #pragma GCC diagnostic ignored "-Wunused-value"
-    static std::vector<std::mutex>* const locks =
-        new std::vector<std::mutex>(static_cast<size_t>(CRYPTO_num_locks()));
+    static std::vector<std::mutex> locks(static_cast<size_t>(CRYPTO_num_locks()));
     [[maybe_unused]] const auto identify = [] { return static_cast<unsigned long>(pthread_self()); };
     [[maybe_unused]] const auto lock = [](int mode, int index, const char*, int) {
-        std::mutex& mutex = (*locks)[static_cast<size_t>(index)];
+        std::mutex& mutex = locks[static_cast<size_t>(index)];
         (mode & CRYPTO_LOCK) != 0 ? mutex.lock() : mutex.unlock();
     };
     CRYPTO_set_id_callback(+identify);

@@ -47,6 +47,20 @@ json Provider::attempt(const std::string& method, const std::string& path, const
     return json::parse(result->body, nullptr, /*allow_exceptions=*/false);
 }
 
+json Provider::read(const std::string& path) {
+    httplib::Client client(mUrl);
+    const httplib::Params grant = {{"client_id", mClientId},
+                                   {"client_secret", mClientSecret},
+                                   {"refresh_token", mAccounts.at(0).refreshToken},
+                                   {"grant_type", "refresh_token"}};
+    const httplib::Result token = client.Post("/o/oauth2/token", grant);
+    if (!token) return nullptr;
+    const std::string bearer = "Bearer " + json::parse(token->body).value("access_token", "");
+    const httplib::Result result = client.Get(path, {{"Authorization", bearer}, {"XData-Version", "3.0"}});
+    EXPECT_TRUE(result && result->status == 200) << path << ": " << (result ? result->body : "no answer");
+    return result ? json::parse(result->body, nullptr, /*allow_exceptions=*/false) : json();
+}
+
 std::string Provider::bytes(const std::string& path) {
     httplib::Client client(mUrl);
     const httplib::Result result = client.Get(path);

@@ -28,6 +28,8 @@ public:
     // The same for what may have gone meanwhile: `mayFail` says whether this answer is none of the test's business.
     nlohmann::json attempt(const std::string& method, const std::string& path, const nlohmann::json& body,
                            bool (*mayFail)(int status, const std::string& answer));
+    // What a client of the first account reads at `path`.
+    nlohmann::json read(const std::string& path);
     // The body of a GET; a failure fails the test.
     std::string bytes(const std::string& path);
     // Writes bytes with their content type.

@@ -294,17 +294,20 @@ TEST_F(TwoWay, AnEditThatGoesOverAnUnseenOneIsNamedInTheLog) {
     run({"event", "set", series, "--instance", "20260605T080000Z", "summary=Late"});
     expectSoon("the instance", [&] { return eventsNamed("Late").size() == 1; });
     expectSameAndQuiet();
+    EXPECT_THAT(mPair.device.daemonLog(), testing::Not(testing::HasSubstr("both sides")));
     run({"daemon", "stop"});
+    // An event of each: a series, an exception that both know, and a day that each side changes on its own.
     const std::string path = "/calendars/" + pathText(mCalendar) + "/events/";
-    for (const char* summary : {"Daily", "Late"}) {
-        const std::string id = eventsNamed(summary).at(0)["id"];
-        mPair.provider.admin("PATCH", path + id, {{"location", "the server's"}});
-    }
+    const std::string uri = eventsNamed("Daily").at(0)["id"];
+    for (const char* instance : {"", "_20260605T080000Z", "_20260606T080000Z"})
+        mPair.provider.admin("PATCH", path + uri + instance, {{"location", "the server's"}});
     run({"event", "set", series, "location=the device's"});
-    run({"event", "set", series, "--instance", "20260605T080000Z", "location=the device's"});
+    for (const char* instance : {"20260605T080000Z", "20260606T080000Z"})
+        run({"event", "set", series, "--instance", instance, "location=the device's"});
+    run({"event", "set", series, "--instance", "20260606T080000Z", "summary=New"});
     run({"daemon", "start"});
     expectSameAndQuiet();
-    for (const char* summary : {"Daily", "Late"}) {
+    for (const char* summary : {"Daily", "Late", "New"}) {
         const Json event = eventsNamed(summary).at(0);
         EXPECT_EQ(event["location"], "the device's");
         EXPECT_THAT(mPair.device.daemonLog(), testing::HasSubstr("event(" + event["id"].get<std::string>() +

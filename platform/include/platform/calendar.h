@@ -183,7 +183,7 @@ using calendar_record_cb = void (*)(calendar_record_h record, void* user_data);
 // Per record of `view` in `book_id` its latest change after `version`, as _calendar_updated_info records in
 // version order; a record inserted and later updated is still "inserted", inserted and deleted in between is
 // nothing, unless the sync engine wrote it (it has seen what it wrote, and must learn of the deletion).
-// Exceptions are never listed. `current_version` is the store's version of the same snapshot.
+// Exceptions are never listed, and of the store's deletions the last 262,144. `current_version` is the store's version of the same snapshot.
 [[nodiscard]] int calendar_db_get_changes_by_version(const char* view, int book_id, int version,
                                                      calendar_list_h* out, int* current_version);
 // The same changes in the same order, one record at a time, as calendar_db_for_each_record does.

@@ -4,7 +4,8 @@
 // the data items. A reply repeats the sequence, then one uint32 item: 0 (handled; the data items follow),
 // 1 (handled, without reply data) or 2 (unknown module or command).
 // Limits: a frame is at most kMaxFrameBytes, an item at most kMaxItemBytes; a peer that breaks the format or
-// a limit is disconnected, others are not affected. A client that connects and says nothing costs a descriptor.
+// a limit is disconnected, others are not affected. A client that connects and says nothing costs a descriptor. Requests that
+// are not whole yet may take 16 frames' room in all; who makes it more is disconnected.
 // Peers: the socket's owner, root, and members of the socket's group; others are disconnected.
 #pragma once
 

@@ -1,6 +1,7 @@
 // Reading records one at a time, through the public functions.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 
 #include <string>
 #include <vector>
@@ -131,4 +132,31 @@ TEST_F(RecordVisit, TheFeedTellsTheSameInTheSameOrder) {
     EXPECT_EQ(contacts_read::forEachChange(_contacts_contact_updated_info, book, version, &current, note), 0);
     EXPECT_THAT(entries, IsEmpty());
     EXPECT_NE(contacts_read::forEachChange(_contacts_contact, book, 0, &current, note), 0) << "no feed";
+}
+
+TEST_F(RecordVisit, TheFeedForgetsTheOldestOfVeryManyDeletions) {
+    const int first = contact(book, "a");
+    const int second = contact(book, "b");
+    EXPECT_EQ(contacts_db_delete_record(_contacts_contact, first), 0);
+    sqlite3* other = nullptr;
+    ASSERT_EQ(sqlite3_open(root.at("/opt/usr/data/records/contacts.db").c_str(), &other), SQLITE_OK);
+    EXPECT_EQ(sqlite3_exec(other,
+                           "WITH RECURSIVE n(x) AS (SELECT 1 UNION ALL SELECT x + 1 FROM n WHERE x < 262143) "
+                           "INSERT INTO tombstones SELECT 'gone', x, 1, 1, 1, 1 FROM n",
+                           nullptr, nullptr, nullptr),
+              SQLITE_OK);
+    sqlite3_close(other);
+    const auto listed = [this] {
+        std::vector<int> ids;
+        int current = 0;
+        EXPECT_EQ(contacts_read::forEachChange(_contacts_contact_updated_info, book, 0, &current,
+                                               [&ids](contacts_record_h change) {
+                                                   ids.push_back(intOf(change, CONTACTS_UPDATED_INFO_ID));
+                                               }),
+                  0);
+        return ids;
+    };
+    EXPECT_THAT(listed(), testing::Contains(first)) << "the most that is kept";
+    EXPECT_EQ(contacts_db_delete_record(_contacts_contact, second), 0);
+    EXPECT_THAT(listed(), ElementsAre(second));
 }

@@ -1,6 +1,8 @@
 // The daemon program over its socket: the commands, bad clients, its life and death.
 #include <gtest/gtest.h>
+#include <poll.h>
 #include <signal.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <unistd.h>
@@ -8,6 +10,7 @@
 #include <climits>
 #include <ctime>
 
+#include "../../../platform/ipc/IpcData.h"
 #include "common/AccountDBHelper.h"
 #include "platform/error.h"
 #include "platform/keys.h"
@@ -48,6 +51,25 @@ int rawConnection() {
     const int fd = socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
     EXPECT_EQ(connect(fd, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
     return fd;
+}
+
+// Sends the same bytes again and again, until the daemon takes no more or `most` went.
+void fill(int fd, const std::string& bytes, size_t most) {
+    size_t sent = 0;
+    pollfd writable{.fd = fd, .events = POLLOUT, .revents = 0};
+    while (sent < most && poll(&writable, 1, 20) == 1) {
+        const ssize_t count =
+            send(fd, bytes.data(), std::min(bytes.size(), most - sent), MSG_NOSIGNAL | MSG_DONTWAIT);
+        if (count < 0 && errno != EAGAIN) return;
+        if (count > 0) sent += static_cast<size_t>(count);
+    }
+}
+
+size_t memoryMb(const std::string& process) {
+    std::ifstream status(process + "/statm");
+    size_t pages = 0;
+    status >> pages >> pages;
+    return (pages * static_cast<size_t>(getpagesize())) >> 20U;
 }
 
 }  // namespace
@@ -125,6 +147,55 @@ TEST(Daemon, BadClientsDisturbNobody) {
     EXPECT_EQ(write(silent[0], "\x20", 1), 1);  // half a length, for ever
     EXPECT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers.size(), 2U);
     for (const int fd : silent) close(fd);
+}
+
+TEST(Daemon, AThousandClientsOfWhomMostAreRudeKeepNobodyWaiting) {
+    rlimit limit{};
+    ASSERT_EQ(getrlimit(RLIMIT_NOFILE, &limit), 0);
+    limit.rlim_cur = limit.rlim_max;
+    ASSERT_EQ(setrlimit(RLIMIT_NOFILE, &limit), 0);
+    const TestRoot root;
+    addDeviceAccount(root, 7);
+    Daemon daemon(root);
+    const Ipc ipc = daemon.connect();
+    ASSERT_TRUE(ipc) << daemon.log();
+    ASSERT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers.size(), 2U) << "it has started";
+    const std::string process = "/proc/" + std::to_string(daemon.process->pid());
+    const auto descriptors = [&] {
+        return std::distance(std::filesystem::directory_iterator(process + "/fd"), {});
+    };
+    const size_t memoryBefore = memoryMb(process);
+    const auto descriptorsBefore = descriptors();
+
+    const std::string request = platform::ipc::composeFrame(1, {kServiceModule, "get_state"}, nullptr);
+    std::string many;
+    while (many.size() < 64U * 1024) many += request;
+    std::string half;
+    platform::ipc::appendUint32(&half, kMaxFrameBytes);
+    half.resize(kMaxFrameBytes);
+    std::vector<int> asking;
+    std::vector<int> rude;
+    std::chrono::steady_clock::duration longest{};
+    for (int i = 0; i < 1000; ++i) {
+        const int fd = rawConnection();
+        ASSERT_NE(fd, -1);
+        (i % 5 < 2 ? asking : rude).push_back(fd);
+        if (i % 5 < 2) fill(fd, request, request.size());
+        if (i % 5 == 2) fill(fd, half, half.size());  // a frame that never ends
+        if (i % 50 == 3) fill(fd, many, SIZE_MAX);    // reads no answer
+        const auto begun = std::chrono::steady_clock::now();
+        ASSERT_EQ(call(ipc.get(), "get_state", {7, 0}).numbers.size(), 2U);
+        longest = std::max(longest, std::chrono::steady_clock::now() - begun);
+    }
+    EXPECT_LT(longest, std::chrono::seconds(1));
+    EXPECT_LT(memoryMb(process) - memoryBefore, 40U) << "MiB";
+    for (const int fd : asking) {
+        char length[4];
+        EXPECT_EQ(recv(fd, length, sizeof length, MSG_WAITALL), 4) << "everybody is answered";
+        close(fd);
+    }
+    for (const int fd : rude) close(fd);
+    EXPECT_TRUE(eventually([&] { return descriptors() == descriptorsBefore; }));
 }
 
 TEST(Daemon, NoArgumentBringsItDown) {

@@ -17,6 +17,8 @@ constexpr Reason kReasons[] = {
     {PLATFORM_ERROR_INVALID_PARAMETER, "the value was refused"},
     {PLATFORM_ERROR_NO_SPACE, "the disk is full; make room and try again"},
     {PLATFORM_ERROR_DATABASE, "the database could not be read or written; check its file and its folder"},
+    {PLATFORM_ERROR_NEWER,
+     "it was written by a newer version of this software and is left alone; install that version again"},
     {PLATFORM_ERROR_CONFLICT, "another program keeps changing it; try again"},
     {PLATFORM_ERROR_TIMED_OUT, "no answer in time; try again"},
 };

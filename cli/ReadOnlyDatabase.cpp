@@ -7,7 +7,8 @@
 
 namespace {
 constexpr int kBusyTimeoutMs = 10000;
-}
+constexpr int kNewestSchema = 1;  // of the daemon's stores
+}  // namespace
 
 ReadOnlyDatabase::ReadOnlyDatabase(const char* path) : mPath(platform::rootedPath(path)) {
     if (access(mPath.c_str(), F_OK) != 0) return;
@@ -20,6 +21,10 @@ ReadOnlyDatabase::ReadOnlyDatabase(const char* path) : mPath(platform::rootedPat
         if (code == SQLITE_OK) break;
     }
     sqlite3_busy_timeout(mHandle.get(), kBusyTimeoutMs);
+    const SqliteStatement version = prepare("PRAGMA user_version");
+    if (step(version) && number(version, 0) > kNewestSchema)
+        throw Failure("the store " + mPath +
+                      " was written by a newer version of this software; install that version again");
     // journal_mode=PERSIST keeps the journal file in place, as the daemon's own connections do.
     for (const char* sql : {"PRAGMA query_only=1", "PRAGMA journal_mode=PERSIST"}) {
         sqlite3_exec(mHandle.get(), sql, nullptr, nullptr, nullptr);

@@ -18,11 +18,10 @@ struct AccountRow {
 inline SqlStore& store() {
     static SqlStore* const instance = new SqlStore(
         "/opt/usr/data/accounts/accounts.db",
-        "CREATE TABLE IF NOT EXISTS accounts(id INTEGER PRIMARY KEY, package TEXT NOT NULL, email TEXT NOT "
-        "NULL, "
-        "sync_status INTEGER NOT NULL);"
-        "CREATE TABLE IF NOT EXISTS events(sequence INTEGER PRIMARY KEY AUTOINCREMENT, type TEXT NOT NULL, "
-        "account_id INTEGER NOT NULL);");
+        db_schema_s{"CREATE TABLE accounts(id INTEGER PRIMARY KEY, package TEXT NOT NULL, email TEXT NOT "
+                    "NULL, sync_status INTEGER NOT NULL);"
+                    "CREATE TABLE events(sequence INTEGER PRIMARY KEY AUTOINCREMENT, type TEXT NOT NULL, "
+                    "account_id INTEGER NOT NULL)"});
     return *instance;
 }
 

@@ -151,8 +151,8 @@ private:
 
     SqlStore mStore{
         "/opt/usr/data/alarms/alarms.db",
-        "CREATE TABLE IF NOT EXISTS alarms(id INTEGER PRIMARY KEY AUTOINCREMENT, application TEXT NOT NULL, "
-        "interval INTEGER NOT NULL, due INTEGER NOT NULL, boot TEXT NOT NULL);"};
+        db_schema_s{"CREATE TABLE alarms(id INTEGER PRIMARY KEY AUTOINCREMENT, application TEXT NOT NULL, "
+                    "interval INTEGER NOT NULL, due INTEGER NOT NULL, boot TEXT NOT NULL)"}};
     std::string mApplication;
     alarm_cb_t mCallback = nullptr;
     void* mUserParam = nullptr;

@@ -1,6 +1,7 @@
 #include "SqlStore.h"
 
-#include "platform/database.h"
+#include <sys/stat.h>
+
 #include "platform/error.h"
 #include "platform/log.h"
 #include "platform/root.h"
@@ -10,6 +11,7 @@ namespace platform {
 namespace {
 
 constexpr int kBusyTimeoutMs = 10'000;
+constexpr mode_t kFileMode = 0660;
 
 struct Finalize {
     void operator()(sqlite3_stmt* statement) const noexcept { sqlite3_finalize(statement); }
@@ -39,9 +41,14 @@ int SqlStore::open() {
     db_util_close(std::exchange(mHandle, nullptr));
     if (const int code = makeFolder(mFile.substr(0, mFile.rfind('/')), 0770); code != PLATFORM_ERROR_NONE)
         return code;
-    if (db_util_open(wanted.c_str(), &mHandle, 0) != SQLITE_OK) return PLATFORM_ERROR_DATABASE;
+    if (const int code = db_util_open(wanted.c_str(), &mHandle, mSchema.version()); code != SQLITE_OK)
+        return code == kDatabaseIsNewer ? PLATFORM_ERROR_NEWER : PLATFORM_ERROR_DATABASE;
     mOpenPath = wanted;
-    return codeOf(sqlite3_exec(mHandle, mSchema, nullptr, nullptr, nullptr));
+    const int code = codeOf(db_util_apply_schema(mHandle, mSchema));
+    if (code != PLATFORM_ERROR_NONE) db_util_close(std::exchange(mHandle, nullptr));
+    // Only its owner may, and needs to: whoever made the file.
+    for (const std::string& file : {wanted, wanted + "-journal"}) (void)chmod(file.c_str(), kFileMode);
+    return code;
 }
 
 int SqlStore::step(const char* sql, std::initializer_list<Param> params,

@@ -12,14 +12,16 @@
 #include <utility>
 #include <variant>
 
+#include "platform/database.h"
+
 namespace platform {
 
 class SqlStore {
 public:
     using Param = std::variant<int64_t, std::string>;
 
-    // `file` is absolute, the root is applied. `schema` must be harmless on a store that has it already.
-    SqlStore(std::string file, const char* schema) : mFile(std::move(file)), mSchema(schema) {}
+    // `file` is absolute, the root is applied.
+    SqlStore(std::string file, const db_schema_s& schema) : mFile(std::move(file)), mSchema(schema) {}
     ~SqlStore() { sqlite3_close_v2(mHandle); }
     SqlStore(const SqlStore&) = delete;
     SqlStore& operator=(const SqlStore&) = delete;
@@ -51,7 +53,7 @@ private:
     [[nodiscard]] int codeOf(int sqliteCode) const;
 
     const std::string mFile;
-    const char* const mSchema;
+    const db_schema_s mSchema;
     std::recursive_mutex mMutex;
     std::string mOpenPath;       // guarded by mMutex
     sqlite3* mHandle = nullptr;  // guarded by mMutex

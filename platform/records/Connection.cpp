@@ -2,8 +2,6 @@
 
 #include <cstdio>
 
-#include "platform/database.h"
-
 namespace platform::records {
 
 namespace {
@@ -88,8 +86,8 @@ Value Statement::value(int column, Type type) const {
     return int64_t{0};
 }
 
-int Connection::open(const std::string& path) {
-    return db_util_open(path.c_str(), &mpHandle, 0);
+int Connection::open(const std::string& path, int newestSchema) {
+    return db_util_open(path.c_str(), &mpHandle, newestSchema);
 }
 
 void Connection::close() {

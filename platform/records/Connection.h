@@ -10,6 +10,7 @@
 #include <utility>
 
 #include "Record.h"
+#include "platform/database.h"
 
 namespace platform::records {
 
@@ -47,7 +48,8 @@ public:
     ~Connection() { close(); }
 
     // SQLite's code.
-    [[nodiscard]] int open(const std::string& path);
+    [[nodiscard]] int open(const std::string& path, int newestSchema);
+    [[nodiscard]] int apply(const db_schema_s& schema) { return db_util_apply_schema(mpHandle, schema); }
     void close();
     [[nodiscard]] bool isOpen() const { return mpHandle != nullptr; }
 

@@ -15,7 +15,6 @@ namespace platform::records {
 namespace {
 
 constexpr const char* kTag = "PLATFORM_RECORDS";
-constexpr int kSchemaVersion = 1;
 constexpr mode_t kFolderMode = 0770;
 constexpr mode_t kFileMode = 0660;
 
@@ -35,8 +34,9 @@ std::unordered_map<const Store*, int>& lastVersions() {
     return versions;
 }
 
-Store::Store(const char* file, std::span<const View* const> views, const char* filesFolder)
-    : mFile(file), mViews(views), mWriterId(randomId()), mFiles(filesFolder) {}
+Store::Store(const char* file, std::span<const View* const> views, const char* filesFolder,
+             std::span<const char* const> upgrades)
+    : mFile(file), mViews(views), mUpgrades(upgrades), mWriterId(randomId()), mFiles(filesFolder) {}
 
 Store::~Store() = default;
 
@@ -89,14 +89,18 @@ int Store::open() {
         return code;
     }
     mPath = rootedPath(file);
-    if (const int code = mConnection.open(mPath); code != SQLITE_OK) return codeOf(code);
-    const int code = makeSchema();
-    if (code != PLATFORM_ERROR_NONE) {
+    const std::string tables = tablesText();
+    const db_schema_s schema{tables.c_str(), mUpgrades};
+    if (const int code = mConnection.open(mPath, schema.version()); code != SQLITE_OK)
+        return code == kDatabaseIsNewer ? PLATFORM_ERROR_NEWER : codeOf(code);
+    if (const int code = codeOf(mConnection.apply(schema)); code != PLATFORM_ERROR_NONE) {
         mConnection.close();
         return code;
     }
+    // Only its owner may, and needs to: whoever made the file.
+    for (const std::string& path : {mPath, mPath + "-journal"}) (void)chmod(path.c_str(), kFileMode);
     sweepFiles();
-    return code;
+    return PLATFORM_ERROR_NONE;
 }
 
 void Store::sweepFiles() {
@@ -117,47 +121,24 @@ const View& Store::filesOf(const View& view) const {
     return *viewOf(view.properties[static_cast<size_t>(view.indexOf(view.filesProperty))].childView);
 }
 
-int Store::makeSchema() {
-    int version = 0;
-    {
-        Statement statement = mConnection.prepare("PRAGMA user_version");
-        if (const int code = statement.step(); code != SQLITE_ROW) return codeOf(code);
-        version = static_cast<int>(statement.integer(0));
-    }
-    if (version == kSchemaVersion) return PLATFORM_ERROR_NONE;
-    if (version > kSchemaVersion) {
-        dlog_print(DLOG_ERROR, kTag,
-                   "%s was written by a newer version (%d, this one knows %d), it is left alone",
-                   mPath.c_str(), version, kSchemaVersion);
-        return PLATFORM_ERROR_DATABASE;
-    }
-    std::string schema = "BEGIN IMMEDIATE;";
+std::string Store::tablesText() const {
+    std::string text;
     for (const View* view : mViews) {
-        if (view->table != nullptr) schema += tableText(*view);
+        if (view->table != nullptr) text += tableText(*view);
     }
-    schema +=
-        "CREATE TABLE IF NOT EXISTS store(version INTEGER NOT NULL);"
-        "INSERT INTO store SELECT 0 WHERE NOT EXISTS (SELECT 1 FROM store);"
-        "CREATE TABLE IF NOT EXISTS writes(version INTEGER PRIMARY KEY, writer INTEGER NOT NULL, views "
-        "INTEGER NOT NULL);"
-        "CREATE TABLE IF NOT EXISTS tombstones(view TEXT NOT NULL, id INTEGER NOT NULL, book INTEGER NOT "
-        "NULL, created "
-        "INTEGER NOT NULL, deleted INTEGER NOT NULL, synced INTEGER NOT NULL);"
-        "CREATE INDEX IF NOT EXISTS tombstones_feed ON tombstones(book, deleted);"
-        "PRAGMA user_version=" +
-        std::to_string(kSchemaVersion) + ";COMMIT;";
-    if (const int code = mConnection.run(schema); code != SQLITE_OK) {
-        const int result = codeOf(code);
-        if (mConnection.inTransaction()) (void)mConnection.run("ROLLBACK");
-        return result;
-    }
-    for (const std::string& path : {mPath, mPath + "-journal"}) (void)chmod(path.c_str(), kFileMode);
-    return PLATFORM_ERROR_NONE;
+    return text +
+           "CREATE TABLE store(version INTEGER NOT NULL);"
+           "INSERT INTO store VALUES(0);"
+           "CREATE TABLE writes(version INTEGER PRIMARY KEY, writer INTEGER NOT NULL, views INTEGER NOT "
+           "NULL);"
+           "CREATE TABLE tombstones(view TEXT NOT NULL, id INTEGER NOT NULL, book INTEGER NOT NULL, created "
+           "INTEGER NOT NULL, deleted INTEGER NOT NULL, synced INTEGER NOT NULL);"
+           "CREATE INDEX tombstones_feed ON tombstones(book, deleted)";
 }
 
 std::string Store::tableText(const View& view) const {
     const std::string table = view.table;
-    std::string text = "CREATE TABLE IF NOT EXISTS " + table + "(id INTEGER PRIMARY KEY";
+    std::string text = "CREATE TABLE " + table + "(id INTEGER PRIMARY KEY";
     // Nobody outside knows a child by its id: that may come again.
     text += view.role == Role::kChild ? ", parent INTEGER NOT NULL" : " AUTOINCREMENT";
     if (view.role != Role::kChild)
@@ -172,29 +153,26 @@ std::string Store::tableText(const View& view) const {
     }
     text += ");";
     if (view.role == Role::kChild) {
-        return text + "CREATE INDEX IF NOT EXISTS " + table + "_parent ON " + table + "(parent);";
+        return text + "CREATE INDEX " + table + "_parent ON " + table + "(parent);";
     }
     if (view.bookProperty != 0) {
         const std::string book = view.columnOf(view.bookProperty);
-        text += "CREATE INDEX IF NOT EXISTS " + table + "_feed ON " + table + "(" + book + ", version);";
+        text += "CREATE INDEX " + table + "_feed ON " + table + "(" + book + ", version);";
     }
     if (view.hasSeries()) {
         const std::string series = view.columnOf(view.seriesProperty);
-        text += "CREATE UNIQUE INDEX IF NOT EXISTS " + table + "_instance ON " + table + "(" + series + ", " +
+        text += "CREATE UNIQUE INDEX " + table + "_instance ON " + table + "(" + series + ", " +
                 view.columnOf(view.instanceProperty) + ") WHERE " + series + " <> 0;";
     }
     if (view.onDelete != nullptr) {
-        text.append("CREATE TRIGGER IF NOT EXISTS ")
-            .append(table)
-            .append("_gone AFTER DELETE ON ")
-            .append(table);
+        text.append("CREATE TRIGGER ").append(table).append("_gone AFTER DELETE ON ").append(table);
         text.append(" BEGIN ").append(view.onDelete).append("; END;");
     }
     // What an item owns goes with it.
     for (const Property& property : view.properties) {
         const View* child = property.childView != nullptr ? viewOf(property.childView) : nullptr;
         if (child == nullptr || child == &view) continue;
-        text.append("CREATE TRIGGER IF NOT EXISTS ").append(table).append("_").append(child->table);
+        text.append("CREATE TRIGGER ").append(table).append("_").append(child->table);
         text.append(" AFTER DELETE ON ").append(table).append(" BEGIN DELETE FROM ").append(child->table);
         text.append(" WHERE parent = old.id; END;");
     }

@@ -27,8 +27,10 @@ namespace platform::records {
 class Store {
 public:
     // `file` is absolute, the root is applied when the store is opened.
-    // `filesFolder` is where the files of records are kept, NULL when none has any.
-    Store(const char* file, std::span<const View* const> views, const char* filesFolder = nullptr);
+    // `filesFolder` is where the files of records are kept, NULL when none has any. `upgrades` as in db_schema_s; the tables
+    // follow from the views.
+    Store(const char* file, std::span<const View* const> views, const char* filesFolder = nullptr,
+          std::span<const char* const> upgrades = {});
     ~Store();
     Store(const Store&) = delete;
     Store& operator=(const Store&) = delete;
@@ -97,7 +99,7 @@ private:
 
     // Opening.
     [[nodiscard]] int open();
-    [[nodiscard]] int makeSchema();
+    [[nodiscard]] std::string tablesText() const;
     void sweepFiles();
     // The view of an item's files.
     [[nodiscard]] const View& filesOf(const View& view) const;
@@ -151,6 +153,7 @@ private:
 
     const char* const mFile;
     const std::span<const View* const> mViews;
+    const std::span<const char* const> mUpgrades;
     const int64_t mWriterId;
 
     std::recursive_mutex mMutex;

@@ -56,6 +56,7 @@ int CalDataManager::prepareSync() {
         return kFailed;
     }
     mpMetaData = std::make_unique<CalMetaDataDBHelper>();
+    if (mpMetaData->openDb() != kOk) SYNC_ERR("MetaDB fail, it is opened once it can be, ignoring");
     return kOk;
 }
 

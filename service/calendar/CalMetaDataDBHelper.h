@@ -19,6 +19,7 @@
 class CalMetaDataDBHelper : public CalItemStore {
 public:
     CalMetaDataDBHelper();
+    [[nodiscard]] int openDb() { return mDatabase.openDb(); }
 
     // --- events: reads
     [[nodiscard]] int hasExceptionEvent(int originalEventId);  // the number of rows, -1 on error

@@ -28,6 +28,7 @@ int CalTodoDataManager::prepareSync() {
         return kFailed;
     }
     mpMetaData = std::make_unique<CalTodoMetaDataDBHelper>();
+    if (mpMetaData->openDb() != kOk) SYNC_ERR("MetaDB fail, it is opened once it can be, ignoring");
     return kOk;
 }
 

@@ -17,6 +17,7 @@
 class CalTodoMetaDataDBHelper : public CalItemStore {
 public:
     CalTodoMetaDataDBHelper();
+    [[nodiscard]] int openDb() { return mDatabase.openDb(); }
 
     // --- to-dos
     [[nodiscard]] int getTodoId(const std::string& uri, int* todoId);

@@ -11,7 +11,6 @@
 #include <utility>
 
 #include "common/SyncLog.h"
-#include "platform/database.h"
 #include "platform/root.h"
 
 using sync_result::kFailed;
@@ -56,9 +55,9 @@ struct CloseDatabase {
 using ShortConnection = std::unique_ptr<sqlite3, CloseDatabase>;
 
 // False only for a store that nobody finished making. Nothing for one that cannot be read: it is somebody's data.
-std::optional<bool> hasTables(const std::string& path) {
+std::optional<bool> hasTables(const std::string& path, int newestSchema) {
     sqlite3* opened = nullptr;
-    if (db_util_open(path.c_str(), &opened, 0) != SQLITE_OK) return std::nullopt;
+    if (db_util_open(path.c_str(), &opened, newestSchema) != SQLITE_OK) return std::nullopt;
     const ShortConnection database(opened);
     bool found = false;
     const auto note = [](void* any, int, char**, char**) { return *static_cast<bool*>(any) = true, 0; };
@@ -66,6 +65,12 @@ std::optional<bool> hasTables(const std::string& path) {
         sqlite3_exec(database.get(), "SELECT 1 FROM sqlite_master LIMIT 1", note, &found, nullptr);
     if (code != SQLITE_OK && !found) return std::nullopt;
     return found;
+}
+
+std::string joined(std::span<const char* const> statements) {
+    std::string text;
+    for (const char* statement : statements) text.append(statement).append(";");
+    return text;
 }
 
 }  // namespace
@@ -88,8 +93,12 @@ bool SyncDatabase::Row::isNull(int column) const {
 }
 
 SyncDatabase::SyncDatabase(std::string path, std::span<const char* const> schema, const char* notOpenedText,
-                           const char* name)
-    : mPath(std::move(path)), mSchema(schema), mNotOpenedText(notOpenedText), mName(name) {}
+                           const char* name, std::span<const char* const> upgrades)
+    : mPath(std::move(path)),
+      mTables(joined(schema)),
+      mUpgrades(upgrades),
+      mNotOpenedText(notOpenedText),
+      mName(name) {}
 
 SyncDatabase::~SyncDatabase() {
     mStatements.clear();
@@ -103,7 +112,8 @@ int SyncDatabase::openDb() {
     const bool isThere = fd != -1;
     if (isThere) close(fd);
     // A daemon that was killed while it made the store left a file without tables.
-    const std::optional<bool> isMade = isThere && mpHandle == nullptr ? hasTables(path) : isThere;
+    const std::optional<bool> isMade =
+        isThere && mpHandle == nullptr ? hasTables(path, schema().version()) : isThere;
     if (!isMade) {
         // Not opened, or nobody would look again once it can be read.
         SYNC_ERR("%s cannot be read", path.c_str());
@@ -116,27 +126,31 @@ int SyncDatabase::openDb() {
         }
     }
     if (mpHandle != nullptr) return kOk;
-    if (db_util_open(path.c_str(), &mpHandle, 0) != SQLITE_OK) {
+    sqlite3* opened = nullptr;
+    if (db_util_open(path.c_str(), &opened, schema().version()) != SQLITE_OK) {
         SYNC_ERR("db_util_open fail");
         return kFailed;
     }
+    ShortConnection database(opened);
+    if (db_util_apply_schema(database.get(), schema()) != SQLITE_OK) {
+        SYNC_ERR("%s cannot be brought up", path.c_str());
+        return kFailed;
+    }
+    mpHandle = database.release();
     return kOk;
 }
 
 int SyncDatabase::makeDb() {
     const std::string path = platform::rootedPath(mPath);
     sqlite3* opened = nullptr;
-    const int code = db_util_open(path.c_str(), &opened, 0);
+    const int code = db_util_open(path.c_str(), &opened, schema().version());
     const ShortConnection database(opened);
     if (code != SQLITE_OK) {
         SYNC_ERR("db_util_open() Failed(%d)", code);
         return kFailed;
     }
     // All tables or none: a reader or the next start never sees half a store.
-    std::string schema = "BEGIN IMMEDIATE;";
-    for (const char* text : mSchema) schema.append(text).append(";");
-    schema += "COMMIT;";
-    if (sqlite3_exec(database.get(), schema.c_str(), nullptr, nullptr, nullptr) != SQLITE_OK) {
+    if (db_util_apply_schema(database.get(), schema()) != SQLITE_OK) {
         SYNC_ERR("remake %s DB file is Failed : %s", mName, sqlite3_errmsg(database.get()));
         return kFailed;  // closing undoes what was begun
     }

@@ -15,6 +15,7 @@
 
 #include "common/Handles.h"
 #include "common/SyncResult.h"
+#include "platform/database.h"
 
 class SyncDatabase {
 public:
@@ -47,10 +48,12 @@ public:
         sqlite3_stmt* mpStatement;
     };
 
-    // `path` is absolute, the root is applied here. The schema texts are executed one by one when the file is made.
+    // `path` is absolute, the root is applied here. The schema texts are executed together when the file is made; `upgrades` bring
+    // an older one up, as in db_schema_s.
     // `notOpenedText` is what a read logs when the store cannot be opened; by `name` the log calls a file that cannot be made.
     SyncDatabase(std::string path, std::span<const char* const> schema,
-                 const char* notOpenedText = "Database is not opended", const char* name = "calendar");
+                 const char* notOpenedText = "Database is not opended", const char* name = "calendar",
+                 std::span<const char* const> upgrades = {});
     ~SyncDatabase();
     SyncDatabase(const SyncDatabase&) = delete;
     SyncDatabase& operator=(const SyncDatabase&) = delete;
@@ -84,14 +87,16 @@ public:
     [[nodiscard]] int changes() const;
 
 private:
+    [[nodiscard]] db_schema_s schema() const { return {mTables.c_str(), mUpgrades}; }
     [[nodiscard]] bool isUndone() const;
     [[nodiscard]] sqlite3_stmt* prepare(std::string_view sql);
     [[nodiscard]] int execRetried(const char* sql);
     [[nodiscard]] int read(std::string_view sql, Params params, bool firstOnly,
                            const std::function<void(const Row&)>& use);
 
-    const std::string mPath;  // constant after construction, as the next three
-    const std::span<const char* const> mSchema;
+    const std::string mPath;  // constant after construction, as the next four
+    const std::string mTables;
+    const std::span<const char* const> mUpgrades;
     const char* const mNotOpenedText;
     const char* const mName;
 

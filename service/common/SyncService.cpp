@@ -19,6 +19,7 @@
 #include "common/SyncResult.h"
 #include "common/SyncScheduleManager.h"
 #include "contacts/CtDataManager.h"
+#include "platform/database.h"
 #include "platform/error.h"
 
 using sync_result::kFailed;
@@ -38,6 +39,15 @@ void queryAccounts(account_cb callback, void* userData) {
         SYNC_INFO("there is no account of the provider on this device, the daemon ends");
         exit(EXIT_SUCCESS);
     }
+}
+
+// Served by this version, a store that it does not know would be half the truth; what is on the device stays as it is.
+void endWithNewerStore() {
+    constexpr int kExitNotConfigured = 78;  // no restart can help, as the service manager is told
+    if (!db_util_met_newer()) return;
+    SYNC_ERR(
+        "a store on this device was written by a newer version, the daemon ends; install that version again");
+    exit(kExitNotConfigured);
 }
 
 }  // namespace
@@ -69,6 +79,7 @@ SyncService::SyncService() {
     initializeAccount();
     prepareDataManagers();
     (void)initialize();
+    endWithNewerStore();
     curl_global_init(CURL_GLOBAL_ALL);
     setUpCryptoLocks();
     gExists = true;
@@ -78,6 +89,7 @@ SyncService::SyncService() {
 void SyncService::initializeAccount() {
     if (const int code = account_connect(); code != PLATFORM_ERROR_NONE) {
         SYNC_ERR("account_connect error: %d", code);
+        endWithNewerStore();
         SYNC_ASSERT_TEXT(false, "ret == ACCOUNT_ERROR_NONE");
     }
     queryAccounts([](account_h, void*) { return true; }, nullptr);

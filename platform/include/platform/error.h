@@ -11,6 +11,7 @@ enum platform_error_e {
     PLATFORM_ERROR_INVALID_PARAMETER = -22,  // NULL, unknown property, wrong type, malformed name
     PLATFORM_ERROR_NO_SPACE = -28,           // the file system is full; nothing was written
     PLATFORM_ERROR_DATABASE = -71,           // SQLite refused: not a database, read-only, locked too long
+    PLATFORM_ERROR_NEWER = -75,              // the store was written by a newer version and is left alone
     PLATFORM_ERROR_CONFLICT = -85,           // a single write whose expected version did not match
     PLATFORM_ERROR_TIMED_OUT = -110,         // no answer within the limit
 };

@@ -186,6 +186,81 @@ TEST(Database, OnlyDatabasesAreOpened) {
     EXPECT_EQ(db_util_close(nullptr), SQLITE_OK);
 }
 
+namespace {
+
+// What a connection without the project's settings says of the file.
+std::string askStore(const std::string& file, const char* sql) {
+    sqlite3* handle = nullptr;
+    std::string answer;
+    EXPECT_EQ(sqlite3_open(file.c_str(), &handle), SQLITE_OK);
+    const auto note = [](void* out, int, char** values, char**) {
+        static_cast<std::string*>(out)->append(values[0] != nullptr ? values[0] : "NULL").append(";");
+        return 0;
+    };
+    EXPECT_EQ(sqlite3_exec(handle, sql, note, &answer, nullptr), SQLITE_OK) << sql;
+    sqlite3_close(handle);
+    return answer;
+}
+
+std::string bytesOf(const std::string& file) {
+    std::ifstream stream(file, std::ios::binary);
+    return {std::istreambuf_iterator<char>(stream), std::istreambuf_iterator<char>()};
+}
+
+}  // namespace
+
+TEST(Database, OlderStoresAreBroughtUpAndNewerOnesLeftAlone) {
+    const TestRoot root;
+    const char* const upgrades[] = {"ALTER TABLE t ADD COLUMN b DEFAULT 'new'", "UPDATE t SET a = a || '!'"};
+    const char* const broken[] = {upgrades[0], "UPDATE t SET a = ''; UPDATE missing SET a = 1"};
+    const char* const tables = "CREATE TABLE t(a, b DEFAULT 'new')";
+    constexpr const char* kFirst = "CREATE TABLE t(a); INSERT INTO t VALUES('kept');";
+    struct Row {
+        const char* name;
+        std::string before;
+        std::span<const char* const> upgrades;
+        int opened;
+        int applied;
+        int version;
+        const char* question;
+        const char* answer;
+    };
+    for (const Row& row : {
+             Row{"none", "", upgrades, 0, 0, 3, "SELECT count(*) FROM pragma_table_info('t')", "2;"},
+             Row{"unnumbered", kFirst, upgrades, 0, 0, 3, "SELECT a || b FROM t", "kept!new;"},
+             Row{"first", std::string(kFirst) + "PRAGMA user_version=1", upgrades, 0, 0, 3,
+                 "SELECT a || b FROM t", "kept!new;"},
+             Row{"second", std::string(kFirst) + "ALTER TABLE t ADD b DEFAULT 'x'; PRAGMA user_version=2",
+                 upgrades, 0, 0, 3, "SELECT a || b FROM t", "kept!x;"},
+             Row{"unfinished", "PRAGMA user_version=1", upgrades, 0, 0, 3,
+                 "SELECT count(*) FROM pragma_table_info('t')", "2;"},
+             Row{"upgrade fails", kFirst, broken, 0, SQLITE_ERROR, 0, "SELECT * FROM t", "kept;"},
+             Row{"newer", std::string(kFirst) + "PRAGMA user_version=4; PRAGMA journal_mode=DELETE", upgrades,
+                 kDatabaseIsNewer, 0, 4, "SELECT * FROM t", "kept;"},
+             Row{"newer, in a mode of its own",
+                 std::string(kFirst) + "PRAGMA user_version=4; PRAGMA journal_mode=WAL", upgrades,
+                 kDatabaseIsNewer, 0, 4, "PRAGMA journal_mode", "wal;"},
+         }) {
+        SCOPED_TRACE(row.name);
+        const std::string file = root.at(std::string("/tmp/") + row.name).string();
+        if (!row.before.empty()) askStore(file, row.before.c_str());
+        const std::string before = bytesOf(file);
+        const db_schema_s schema{tables, row.upgrades};
+        sqlite3* handle = nullptr;
+        ASSERT_EQ(db_util_open(file.c_str(), &handle, schema.version()), row.opened);
+        if (row.opened == SQLITE_OK) {
+            EXPECT_EQ(db_util_apply_schema(handle, schema), row.applied);
+            EXPECT_EQ(db_util_apply_schema(handle, schema), row.applied) << "again";
+        } else {
+            EXPECT_EQ(bytesOf(file), before);
+            EXPECT_TRUE(db_util_met_newer());
+        }
+        db_util_close(handle);
+        EXPECT_EQ(askStore(file, "PRAGMA user_version"), std::to_string(row.version) + ";");
+        EXPECT_EQ(askStore(file, row.question), row.answer);
+    }
+}
+
 TEST(Device, StorageAndNetwork) {
     const TestRoot root;
     struct statvfs info {};

@@ -498,5 +498,5 @@ TEST(CalendarStore, FilesThatAreNotItsOwnAreLeftAlone) {
         sqlite3_exec(newer, "CREATE TABLE future(x); PRAGMA user_version=99", nullptr, nullptr, nullptr),
         SQLITE_OK);
     sqlite3_close(newer);
-    EXPECT_EQ(calendar_connect_with_flags(0), PLATFORM_ERROR_DATABASE);
+    EXPECT_EQ(calendar_connect_with_flags(0), PLATFORM_ERROR_NEWER);
 }

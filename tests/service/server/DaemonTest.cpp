@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 #include <poll.h>
 #include <signal.h>
+#include <sqlite3.h>
 #include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/un.h>
@@ -244,6 +245,58 @@ TEST(Daemon, LivesAndDies) {
     daemon.process->kill(SIGTERM);
     EXPECT_EQ(daemon.process->wait(3000), 0);
     EXPECT_FALSE(std::filesystem::exists(root.at(kServiceSocket)));
+}
+
+namespace {
+
+int versionOf(const std::filesystem::path& store, const char* change = nullptr) {
+    sqlite3* database = nullptr;
+    int version = -1;
+    EXPECT_EQ(sqlite3_open(store.c_str(), &database), SQLITE_OK);
+    EXPECT_EQ(sqlite3_exec(database, change, nullptr, nullptr, nullptr), SQLITE_OK);
+    const auto note = [](void* out, int, char** values, char**) {
+        return *static_cast<int*>(out) = atoi(values[0]), 0;
+    };
+    EXPECT_EQ(sqlite3_exec(database, "PRAGMA user_version", note, &version, nullptr), SQLITE_OK);
+    sqlite3_close(database);
+    return version;
+}
+
+}  // namespace
+
+TEST(Daemon, TakesItsStoresAsOlderVersionsLeftThemAndLeavesNewerOnesAlone) {
+    const TestRoot root;
+    addDeviceAccount(root, 7);
+    const auto serves = [](Daemon& daemon) {
+        const bool connected = daemon.connect() != nullptr;
+        daemon.process->kill(SIGTERM);
+        return connected && daemon.process->wait(3000) == 0;
+    };
+    Daemon daemon(root);
+    EXPECT_TRUE(serves(daemon)) << daemon.log();
+    for (const char* store :
+         {"/opt/usr/data/records/calendar.db", "/opt/usr/data/records/contacts.db",
+          "/opt/usr/data/accounts/accounts.db", "/opt/usr/dbspace/.vantor_pim_sync_account.db",
+          "/opt/usr/dbspace/.vantor_pim_sync_calendar.db", "/opt/usr/dbspace/.vantor_pim_sync_todo.db",
+          "/opt/usr/dbspace/.vantor_pim_sync_contacts.db"}) {
+        SCOPED_TRACE(store);
+        const auto read = [file = root.at(store)] {
+            std::ifstream stream(file, std::ios::binary);
+            return std::string(std::istreambuf_iterator<char>(stream), {});
+        };
+        EXPECT_EQ(versionOf(root.at(store), "PRAGMA user_version=0"), 0);
+        daemon.start();
+        EXPECT_TRUE(serves(daemon));
+        EXPECT_EQ(versionOf(root.at(store)), 1);
+        EXPECT_EQ(versionOf(root.at(store), "PRAGMA user_version=99"), 99);
+        const std::string before = read();
+        daemon.start();
+        EXPECT_EQ(daemon.process->wait(5000), 78);
+        EXPECT_EQ(read(), before);
+        EXPECT_NE(daemon.log().find(std::string(store) + " was written by a newer version"),
+                  std::string::npos);
+        versionOf(root.at(store), "PRAGMA user_version=1");
+    }
 }
 
 TEST(Daemon, StartsWithWhatTheDeviceStillHas) {

@@ -128,7 +128,7 @@ private:
     Context& mContext;
 };
 
-// /admin: requests, tokens, faults and holds.
+// /admin: requests, news, tokens, faults and holds.
 class AdminControlService : public Service {
 public:
     explicit AdminControlService(Context& context) : mContext(context) {}

@@ -128,6 +128,12 @@ private:
     Context& mContext;
 };
 
+// / and /page: the page in which people look at the content and change it.
+class PageService : public Service {
+public:
+    void addRoutes(Router& router) override;
+};
+
 // /admin: requests, news, tokens, faults and holds.
 class AdminControlService : public Service {
 public:

@@ -9,6 +9,30 @@ constexpr const char* kBook = "/admin/accounts/a@x.example/contacts";
 
 using Page = ProviderFixture;
 
+TEST_F(Page, IsServedWithNothingFromElsewhere) {
+    const Answer page = get("/");
+    EXPECT_EQ(page.status, 200);
+    EXPECT_EQ(page.headers.find("Content-Type")->second, "text/html; charset=utf-8");
+    EXPECT_TRUE(page.headers.find("Content-Security-Policy")
+                    ->second.starts_with("default-src 'none'; script-src 'self'"));
+    EXPECT_EQ(page.text.find("://"), std::string::npos);
+    EXPECT_EQ(page.text.find("style="), std::string::npos);
+    // Every file that the page names is there, as what it is.
+    std::size_t files = 0;
+    for (std::size_t at = page.text.find("/page/"); at != std::string::npos;
+         at = page.text.find("/page/", at + 1)) {
+        const std::string path = page.text.substr(at, page.text.find('"', at) - at);
+        const Answer file = get(path);
+        EXPECT_EQ(file.status, 200) << path;
+        EXPECT_EQ(file.headers.find("X-Content-Type-Options")->second, "nosniff") << path;
+        ++files;
+    }
+    EXPECT_GE(files, 3U);
+    EXPECT_EQ(get("/page/none.js").status, 404);
+    EXPECT_EQ(get("/page/..%2Fmain.cpp").status, 404);
+    EXPECT_EQ(send("GET", "/admin/requests").body.at("total"), 1);  // the fixture's token
+}
+
 TEST_F(Page, OnlyItsOwnOriginAndProgramsAreLetIn) {
     const std::string own = mServer.url();
     const std::string port = own.substr(own.rfind(':'));
@@ -29,11 +53,13 @@ TEST_F(Page, OnlyItsOwnOriginAndProgramsAreLetIn) {
         {"GET", {{"Host", "[::1]" + port}}, "/admin/accounts", 200},
         {"GET", {{"Sec-Fetch-Site", "cross-site"}}, "/admin/accounts", 403},
         {"GET", {{"Sec-Fetch-Site", "same-site"}}, "/admin/accounts", 403},
+        {"GET", {{"Sec-Fetch-Site", "cross-site"}}, "/", 200},  // a link to the page
         {"POST", {{"Origin", "http://evil.example"}}, "/admin/accounts", 403},
         {"POST", {{"Origin", "null"}}, "/admin/accounts", 403},
         {"POST", {{"Origin", "http://127.0.0.1:1"}}, "/admin/accounts", 403},
         {"POST", {{"Origin", "https://127.0.0.1" + port}}, "/admin/accounts", 403},
         {"DELETE", {{"Origin", "http://evil.example"}}, "/admin/accounts/a@x.example", 403},
+        {"GET", {{"Host", "evil.example" + port}}, "/", 421},
         {"GET", {{"Host", "127.0.0.1.evil.example"}}, kEvents, 421},
         {"POST", {{"Host", "evil.example"}, {"Origin", "http://evil.example"}}, "/admin/accounts", 421},
         {"OPTIONS", {{"Origin", "http://evil.example"}}, "/admin/accounts", 403},

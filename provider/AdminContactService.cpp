@@ -1,4 +1,5 @@
 #include "FeedJson.h"
+#include "ListPart.h"
 #include "Services.h"
 
 namespace provider {
@@ -29,6 +30,31 @@ std::string chosenId(const Json& body) {
     return found->get<std::string>();
 }
 
+// Every text of the fields, without the names of members and the addresses that types and groups have.
+void addTexts(const Json& value, std::string& out) {
+    if (value.is_string()) {
+        const auto& text = value.get_ref<const std::string&>();
+        if (!text.starts_with("http://") && !text.starts_with("{base}")) out += text + '\n';
+        return;
+    }
+    if (!value.is_structured()) return;
+    for (const Json& item : value) addTexts(item, out);
+}
+
+ListItems listItems(const ContactBook::Entries& entries) {
+    const auto title = [&entries](std::size_t i) {
+        const auto found = entries[i]->fields.find("title");
+        return found == entries[i]->fields.end() ? std::string() : found->value("$t", "");
+    };
+    const auto texts = [&entries](std::size_t i) {
+        std::string out;
+        addTexts(entries[i]->fields, out);
+        return out;
+    };
+    return {entries.size(), [&entries](std::size_t i) { return !entries[i]->isDeleted; },
+            [&entries](std::size_t i) { return entries[i]->etag; }, title, texts};
+}
+
 }  // namespace
 
 void AdminContactService::addRoutes(Router& router) {
@@ -42,9 +68,14 @@ void AdminContactService::addRoutes(Router& router) {
 void AdminContactService::addFeedRoutes(Router& router, FeedKind kind, const std::string& feed) {
     router.add("GET", feed, Access::kAdmin, [this, kind](const Call& call) {
         const auto lock = mContext.store.guard();
+        const ContactBook::Entries& entries = mContext.store.contacts(call.ids[0]).entries(kind);
+        if (asksForPart(call)) {
+            return partReply(partOf(call, listItems(entries)),
+                             [&](std::size_t i) { return plainEntry(*entries[i], call.origin); });
+        }
         Json body;
         body["items"] = Json::array();
-        for (const auto& entry : mContext.store.contacts(call.ids[0]).entries(kind)) {
+        for (const auto& entry : entries) {
             if (!entry->isDeleted || entry->isListed)
                 body["items"].push_back(plainEntry(*entry, call.origin));
         }
@@ -62,7 +93,9 @@ void AdminContactService::addFeedRoutes(Router& router, FeedKind kind, const std
     router.add("PATCH", feed + "/*", Access::kAdmin, [this, kind](const Call& call) {
         const Json body = jsonBody(call);
         const auto lock = mContext.store.guard();
-        return entryReply(call, mContext.store.contacts(call.ids[0]).patch(kind, call.ids[1], body));
+        ContactBook& book = mContext.store.contacts(call.ids[0]);
+        requireMatch(call, book.get(kind, call.ids[1]).etag);
+        return entryReply(call, book.patch(kind, call.ids[1], body));
     });
     router.add("PUT", feed + "/*", Access::kAdmin, [this, kind](const Call& call) {
         const Json body = jsonBody(call);
@@ -71,7 +104,9 @@ void AdminContactService::addFeedRoutes(Router& router, FeedKind kind, const std
     });
     router.add("DELETE", feed + "/*", Access::kAdmin, [this, kind](const Call& call) {
         const auto lock = mContext.store.guard();
-        mContext.store.contacts(call.ids[0]).remove(kind, call.ids[1], call.param("deleted") == "listed");
+        ContactBook& book = mContext.store.contacts(call.ids[0]);
+        requireMatch(call, book.get(kind, call.ids[1]).etag);
+        book.remove(kind, call.ids[1], call.param("deleted") == "listed");
         return done();
     });
 }

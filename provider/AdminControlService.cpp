@@ -4,6 +4,9 @@ namespace provider {
 
 namespace {
 
+// More than a person would read.
+constexpr std::size_t kMaxNews = 200;
+
 Reply done() {
     return jsonReply(Json::object());
 }
@@ -26,6 +29,11 @@ void AdminControlService::addRoutes(Router& router) {
     add("DELETE", "/admin/requests", [this](const Call&) {
         mContext.log.clear();
         return done();
+    });
+    add("GET", "/admin/news", [this](const Call& call) {
+        Json body = {{"run", mContext.run}, {"changes", mContext.changes.load()}};
+        body.update(mContext.log.since(static_cast<std::uint64_t>(call.number("since", 0, 0)), kMaxNews));
+        return jsonReply(body);
     });
     add("POST", "/admin/tokens/expire", [this](const Call&) {
         mContext.tokens.expire();

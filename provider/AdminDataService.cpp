@@ -1,3 +1,4 @@
+#include "ListPart.h"
 #include "Seed.h"
 #include "Services.h"
 
@@ -5,7 +6,9 @@ namespace provider {
 
 namespace {
 
-const WriteOptions kAdmin{"", true};
+WriteOptions adminWrite(const Call& call) {
+    return {call.header("If-Match"), true};
+}
 
 Reply done() {
     return jsonReply(Json::object());
@@ -26,6 +29,61 @@ std::string textMember(const Json& body, const char* name) {
 
 bool isRaw(const Call& call) {
     return call.param("raw") == "true";
+}
+
+std::string textOf(const Event& event, std::string_view name) {
+    const Json value = event.text.member(name);
+    return value.is_string() ? value.get<std::string>() : "";
+}
+
+// When the event is, or would be when it was cancelled; empty for one that no check has seen.
+std::string timeOf(const Event& event) {
+    for (const char* name : {"start", "originalStartTime"}) {
+        const Json value = event.text.member(name);
+        if (value.is_null()) continue;
+        try {
+            return formatDateTime(readTime(value, name).utc(), 0);
+        } catch (const ApiError&) {
+            return "";
+        }
+    }
+    return "";
+}
+
+using Titles = std::map<std::string, std::string>;
+
+// Titles of the series by id: a cancelled instance has none of its own.
+Titles seriesTitles(const Calendar& calendar) {
+    Titles titles;
+    for (const auto& event : calendar.events()) {
+        if (event->isSeries && !event->isDeleted) titles[event->id] = textOf(*event, "summary");
+    }
+    return titles;
+}
+
+Reply eventsPart(const Call& call, const Calendar& calendar) {
+    const auto& events = calendar.events();
+    const Titles titles = seriesTitles(calendar);
+    const auto title = [&titles](const std::string& series) {
+        const auto found = titles.find(series);
+        return found == titles.end() ? std::string() : found->second;
+    };
+    const auto words = [&](std::size_t i) {
+        std::string out = title(events[i]->series);
+        for (const char* name : {"summary", "location", "description"})
+            out += "\n" + textOf(*events[i], name);
+        return out;
+    };
+    const ListPart part = partOf(call, {events.size(), [&](std::size_t i) { return !events[i]->isDeleted; },
+                                        [&](std::size_t i) { return events[i]->etag; },
+                                        [&](std::size_t i) { return timeOf(*events[i]); }, words});
+    Json series = Json::object();
+    for (const std::size_t i : part.indexes) {
+        if (!events[i]->series.empty()) series[events[i]->series] = title(events[i]->series);
+    }
+    Reply reply = partReply(part, [&](std::size_t i) { return events[i]->text.json(); });
+    reply.body.insert(1, "\"series\":" + series.dump(-1, ' ', false, Json::error_handler_t::replace) + ",");
+    return reply;
 }
 
 }  // namespace
@@ -129,10 +187,12 @@ void AdminDataService::addEventRoutes(Router& router) {
     const std::string events = "/admin/calendars/*/events";
     router.add("GET", events, Access::kAdmin, [this](const Call& call) {
         const auto lock = mContext.store.guard();
+        const Calendar& calendar = mContext.store.calendar(call.ids[0]);
+        if (asksForPart(call)) return eventsPart(call, calendar);
         Reply reply;
         reply.body = "{\"items\":[";
         bool first = true;
-        for (const auto& event : mContext.store.calendar(call.ids[0]).events()) {
+        for (const auto& event : calendar.events()) {
             if (event->isDeleted) continue;
             if (!first) reply.body += ',';
             first = false;
@@ -145,7 +205,7 @@ void AdminDataService::addEventRoutes(Router& router) {
         const Json body = jsonBody(call);
         const auto lock = mContext.store.guard();
         if (isRaw(call)) return putRaw(call, call.param("id", textMember(body, "id")), body);
-        return eventReply(mContext.store.calendar(call.ids[0]).insert(body, kAdmin).text);
+        return eventReply(mContext.store.calendar(call.ids[0]).insert(body, adminWrite(call)).text);
     });
     router.add("GET", events + "/*", Access::kAdmin, [this](const Call& call) {
         const auto lock = mContext.store.guard();
@@ -155,11 +215,12 @@ void AdminDataService::addEventRoutes(Router& router) {
         const Json body = jsonBody(call);
         const auto lock = mContext.store.guard();
         if (isRaw(call)) return putRaw(call, call.ids[1], body);
-        return eventReply(mContext.store.calendar(call.ids[0]).patch(call.ids[1], body, kAdmin).text);
+        return eventReply(
+            mContext.store.calendar(call.ids[0]).patch(call.ids[1], body, adminWrite(call)).text);
     });
     router.add("DELETE", events + "/*", Access::kAdmin, [this](const Call& call) {
         const auto lock = mContext.store.guard();
-        mContext.store.calendar(call.ids[0]).remove(call.ids[1]);
+        mContext.store.calendar(call.ids[0]).remove(call.ids[1], adminWrite(call));
         return done();
     });
 }

@@ -1,3 +1,4 @@
+#include "ListPart.h"
 #include "Services.h"
 
 namespace provider {
@@ -6,6 +7,21 @@ namespace {
 
 Reply done() {
     return jsonReply(Json::object());
+}
+
+ListItems listItems(const std::vector<std::unique_ptr<Task>>& tasks) {
+    const auto text = [&tasks](std::size_t i, const char* name) {
+        const auto found = tasks[i]->body.find(name);
+        return found != tasks[i]->body.end() && found->is_string() ? found->get<std::string>() : "";
+    };
+    // Tasks without a due date come last.
+    const auto due = [text](std::size_t i) {
+        const std::string time = text(i, "due");
+        return (time.empty() ? "~" : time) + text(i, "title");
+    };
+    return {tasks.size(), [&tasks](std::size_t i) { return !tasks[i]->isDeleted; },
+            [text](std::size_t i) { return text(i, "etag"); }, due,
+            [text](std::size_t i) { return text(i, "title") + "\n" + text(i, "notes"); }};
 }
 
 }  // namespace
@@ -41,9 +57,13 @@ void AdminTaskService::addRoutes(Router& router) {
 void AdminTaskService::addTaskRoutes(Router& router, const std::string& tasks) {
     router.add("GET", tasks, Access::kAdmin, [this](const Call& call) {
         const auto lock = mContext.store.guard();
+        const auto& all = mContext.store.taskList(call.ids[0], call.ids[1]).tasks();
+        if (asksForPart(call)) {
+            return partReply(partOf(call, listItems(all)), [&](std::size_t i) { return all[i]->body; });
+        }
         Json body;
         body["items"] = Json::array();
-        for (const auto& task : mContext.store.taskList(call.ids[0], call.ids[1]).tasks()) {
+        for (const auto& task : all) {
             if (!task->isDeleted) body["items"].push_back(task->body);
         }
         return jsonReply(body);
@@ -60,11 +80,15 @@ void AdminTaskService::addTaskRoutes(Router& router, const std::string& tasks) {
     router.add("PATCH", tasks + "/*", Access::kAdmin, [this](const Call& call) {
         const Json body = jsonBody(call);
         const auto lock = mContext.store.guard();
-        return jsonReply(mContext.store.taskList(call.ids[0], call.ids[1]).patch(call.ids[2], body).body);
+        TaskList& list = mContext.store.taskList(call.ids[0], call.ids[1]);
+        requireMatch(call, list.get(call.ids[2]).body.value("etag", ""));
+        return jsonReply(list.patch(call.ids[2], body).body);
     });
     router.add("DELETE", tasks + "/*", Access::kAdmin, [this](const Call& call) {
         const auto lock = mContext.store.guard();
-        mContext.store.taskList(call.ids[0], call.ids[1]).remove(call.ids[2]);
+        TaskList& list = mContext.store.taskList(call.ids[0], call.ids[1]);
+        requireMatch(call, list.get(call.ids[2]).body.value("etag", ""));
+        list.remove(call.ids[2]);
         return done();
     });
 }

@@ -1,6 +1,10 @@
 // Context: what the services of one provider share. Outlives them; each part guards itself.
 #pragma once
 
+#include <atomic>
+#include <chrono>
+#include <cstdint>
+
 #include "Faults.h"
 #include "RequestLog.h"
 #include "Store.h"
@@ -15,6 +19,10 @@ struct Context {
     Tokens tokens;
     Faults faults;
     RequestLog log;
+    // Counts requests that may have changed the content, so that a reader learns whether to look again.
+    std::atomic<std::uint64_t> changes{0};
+    // Tells one run of the provider from the next, whose counts begin anew.
+    const std::string run = std::to_string(std::chrono::system_clock::now().time_since_epoch().count());
 };
 
 }  // namespace provider

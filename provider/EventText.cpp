@@ -30,6 +30,15 @@ EventText::EventText(const Json& event) {
     mMembers.shrink_to_fit();
 }
 
+Json EventText::member(std::string_view name) const {
+    const std::string_view text = mText;
+    for (const Member& member : mMembers) {
+        if (text.substr(member.name + 1, member.value - member.name - 3) == name)
+            return Json::parse(text.substr(member.value, member.end - member.value));
+    }
+    return nullptr;
+}
+
 void EventText::append(std::string& out, const Fields& fields) const {
     if (fields.all()) {
         out += mText;

@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "Fields.h"
@@ -17,6 +18,8 @@ public:
 
     [[nodiscard]] const std::string& text() const { return mText; }
     [[nodiscard]] Json json() const { return Json::parse(mText); }
+    // The value of one member; null when there is none.
+    [[nodiscard]] Json member(std::string_view name) const;
     // Appends the selected part.
     void append(std::string& out, const Fields& fields) const;
 

@@ -9,6 +9,7 @@
 #include <stdexcept>
 
 #include "Certificate.h"
+#include "Guard.h"
 #include "Gzip.h"
 #include "Sockets.h"
 
@@ -213,7 +214,8 @@ void ProviderServer::answer(Call& call, Outcome& outcome) {
         missing = error;
     }
     outcome.name = route != nullptr ? route->pattern : call.path;
-    outcome.isAdmin = call.path.starts_with("/admin");
+    const bool isControl = route != nullptr && route->access == Access::kAdmin;
+    outcome.isAdmin = isControl || call.path.starts_with("/admin");
     if (outcome.isAdmin) {
         outcome.reply = run(call, route, missing);
         return;
@@ -230,13 +232,18 @@ void ProviderServer::answer(Call& call, Outcome& outcome) {
 
 Reply ProviderServer::run(Call& call, const Route* route, const ApiError& missing) {
     try {
+        checkCaller(call);
         if (route == nullptr) throw missing;
         if (route->access == Access::kToken) {
             call.account = owner(call);
             if (call.account.empty())
                 throw ApiError{401, "authError", "Invalid Credentials", "Authorization"};
         }
-        return route->handler(call);
+        Reply reply = route->handler(call);
+        const bool mayChange = call.method != "GET" && route->access != Access::kOpen;
+        if (mayChange && reply.status < 400) ++mContext.changes;
+        if (route->access != Access::kToken) protectReply(reply);
+        return reply;
     } catch (const ApiError& error) {
         return errorReply(error);
     } catch (const std::exception& error) {
@@ -317,13 +324,15 @@ void ProviderServer::deliver(Outcome& outcome, httplib::Response& response) {
 
 void ProviderServer::record(const Call& call, const Outcome& outcome, double elapsedMs) {
     const std::string target = withoutSecrets(call.target);
-    if (!mOptions.isQuiet) {
+    // A page that is open asks for news all the time, which tells nobody anything.
+    if (!mOptions.isQuiet && outcome.name != "/admin/news") {
         std::fprintf(stderr, "%s %s %d %zu %.1fms\n", call.method.c_str(), target.c_str(),
                      outcome.reply.status, outcome.reply.body.size(), elapsedMs);
     }
     if (outcome.isAdmin) return;
-    mContext.log.add(outcome.name, {call.method, target, outcome.reply.status, outcome.reply.body.size(),
-                                    !call.header("Authorization").empty(), outcome.isGzip, call.account});
+    mContext.log.add(outcome.name,
+                     {call.method, target, outcome.reply.status, outcome.reply.body.size(),
+                      !call.header("Authorization").empty(), outcome.isGzip, call.account, elapsedMs});
 }
 
 }  // namespace provider

@@ -1,7 +1,9 @@
 // RequestLog: what was asked of the provider: counts by kind of request, and the last ones in full, but for secrets.
+// Requests are numbered from 1 as they end, so that a reader can ask for what came since.
 // Threads: any.
 #pragma once
 
+#include <cstdint>
 #include <deque>
 #include <map>
 #include <mutex>
@@ -19,6 +21,7 @@ struct RequestRecord {
     bool hasAuthorization = false;
     bool isGzip = false;
     std::string account;
+    double elapsedMs = 0;
 };
 
 class RequestLog {
@@ -26,6 +29,9 @@ public:
     // name: the pattern of the route, under which the request is counted.
     void add(const std::string& name, RequestRecord record);
     [[nodiscard]] Json json() const;
+    // {"last": number, "requests"}: those after this number, the newest at most.
+    [[nodiscard]] Json since(std::uint64_t number, std::size_t atMost) const;
+    // The numbers go on.
     void clear();
 
 private:
@@ -34,6 +40,7 @@ private:
     std::map<std::string, std::size_t> mCounts;
     std::deque<RequestRecord> mLast;
     std::size_t mTotal = 0;
+    std::uint64_t mLastNumber = 0;
 };
 
 // The target as it may be logged.

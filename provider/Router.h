@@ -13,7 +13,7 @@ namespace provider {
 enum class Access {
     kOpen,   // the token endpoint
     kToken,  // needs a valid access token
-    kAdmin,  // test and demo control; no latency, no faults, not counted
+    kAdmin,  // test and demo control, and the page for it; no latency, no faults, not counted
 };
 
 struct Route {

@@ -13,6 +13,7 @@ std::vector<std::unique_ptr<Service>> makeServices(Context& context) {
     services.push_back(std::make_unique<AdminTaskService>(context));
     services.push_back(std::make_unique<AdminContactService>(context));
     services.push_back(std::make_unique<AdminControlService>(context));
+    services.push_back(std::make_unique<PageService>());
     return services;
 }
 

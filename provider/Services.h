@@ -128,7 +128,13 @@ private:
     Context& mContext;
 };
 
-// /admin: requests, tokens, faults and holds.
+// / and /page: the page in which people look at the content and change it.
+class PageService : public Service {
+public:
+    void addRoutes(Router& router) override;
+};
+
+// /admin: requests, news, tokens, faults and holds.
 class AdminControlService : public Service {
 public:
     explicit AdminControlService(Context& context) : mContext(context) {}

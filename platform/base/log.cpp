@@ -1,9 +1,11 @@
 #include "platform/log.h"
 
 #include <sys/stat.h>
+#include <sys/uio.h>
 #include <systemd/sd-journal.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <atomic>
 #include <cstdarg>
 #include <cstdio>
@@ -12,6 +14,7 @@
 #include <ctime>
 #include <mutex>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -107,28 +110,82 @@ int writeToStandardError(log_priority priority, const char* tag, const std::stri
     return static_cast<int>(write(STDERR_FILENO, line.data(), line.size()));
 }
 
-}  // namespace
+thread_local int tAccount = 0;
 
-int dlog_print(log_priority priority, const char* tag, const char* format, ...) {
-    if (!dlog_is_shown(priority)) return 0;
+class JournalFields {
+public:
+    void add(const char* name, const std::string& value) {
+        mTexts.push_back(std::string(name) + "=" + value);
+    }
+    void send() const {
+        std::vector<iovec> parts;
+        for (const std::string& text : mTexts) parts.push_back({const_cast<char*>(text.data()), text.size()});
+        sd_journal_sendv(parts.data(), static_cast<int>(parts.size()));
+    }
+
+private:
+    std::vector<std::string> mTexts;
+};
+
+void writeToJournal(log_priority priority, const char* tag, const log_place_s* place,
+                    const std::string& message) {
+    JournalFields fields;
+    fields.add("MESSAGE", message);
+    fields.add("PRIORITY", std::to_string(nameOf(priority).syslog));
+    fields.add("TAG", tag);
+    if (tAccount != 0) fields.add("ACCOUNT", std::to_string(tAccount));
+    if (place != nullptr) {
+        fields.add("CODE_FILE", place->file);
+        fields.add("CODE_FUNC", place->function);
+        fields.add("CODE_LINE", std::to_string(place->line));
+    }
+    fields.send();
+}
+
+int print(log_priority priority, const char* tag, const log_place_s* place, const char* format,
+          va_list arguments) {
     char buffer[kMaxMessageBytes];
-    va_list arguments;
-    va_start(arguments, format);
-    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the analyser does not know this va_start
-    const int length = std::vsnprintf(buffer, sizeof buffer, format, arguments);
-    va_end(arguments);
-    if (length < 0) return 0;
+    size_t length = 0;
+    if (place != nullptr) {
+        const int head =
+            std::snprintf(buffer, sizeof buffer, "%s: %s(%d) > ", place->file, place->function, place->line);
+        length = std::min(sizeof buffer - 1, static_cast<size_t>(std::max(head, 0)));
+    }
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the callers have begun the list
+    if (std::vsnprintf(buffer + length, sizeof buffer - length, format, arguments) < 0) return 0;
     std::string message(buffer);
     replaceControls(&message);
-
     {
         const std::lock_guard lock(sink().mutex);
         if (sink().write != nullptr) sink().write(priority, tag, message.c_str(), sink().userData);
     }
     if (!goesToJournal()) return writeToStandardError(priority, tag, message);
-    sd_journal_send("PRIORITY=%d", nameOf(priority).syslog, "MESSAGE=%s", message.c_str(), "TAG=%s", tag,
-                    nullptr);
+    writeToJournal(priority, tag, place, message);
     return static_cast<int>(message.size());
+}
+
+}  // namespace
+
+int dlog_print(log_priority priority, const char* tag, const char* format, ...) {
+    if (!dlog_is_shown(priority)) return 0;
+    va_list arguments;
+    va_start(arguments, format);
+    const int written = print(priority, tag, nullptr, format, arguments);
+    va_end(arguments);
+    return written;
+}
+
+int dlog_print_at(log_priority priority, const char* tag, const log_place_s& place, const char* format, ...) {
+    if (!dlog_is_shown(priority)) return 0;
+    va_list arguments;
+    va_start(arguments, format);
+    const int written = print(priority, tag, &place, format, arguments);
+    va_end(arguments);
+    return written;
+}
+
+void dlog_set_account(int account) {
+    tAccount = account;
 }
 
 void dlog_set_threshold(log_priority lowestShown) {

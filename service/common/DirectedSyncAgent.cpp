@@ -1,12 +1,15 @@
 #include "common/DirectedSyncAgent.h"
 
+#include "common/Account.h"
 #include "common/SyncResult.h"
 
 using sync_result::kOk;
 using sync_result::kTokenFailed;
 
 DirectedSyncAgent::DirectedSyncAgent(Account* account, vantor_pim_sync_type_e type)
-    : SyncAgent(account, type), mType(type), mpWorker(std::make_unique<SyncWorker>()) {}
+    : SyncAgent(account, type),
+      mType(type),
+      mpWorker(std::make_unique<SyncWorker>(account->getAccountId())) {}
 
 DirectedSyncAgent::~DirectedSyncAgent() {
     mpWorker.reset();

@@ -19,6 +19,7 @@ struct SyncWorker::SyncRequest {
     SyncDirector* director;
     IResultListener* listener;
     int result;
+    int accountId;
 };
 
 namespace {
@@ -48,7 +49,7 @@ void freeFromSource(gpointer data) {
 
 }  // namespace
 
-SyncWorker::SyncWorker() {
+SyncWorker::SyncWorker(int accountId) : mAccountId(accountId) {
     initialize();
 }
 
@@ -107,7 +108,8 @@ int SyncWorker::addRequest() {
         SYNC_ERR("g_idle_source_new failed : %s", g_strerror(errno));
         return kFailed;
     }
-    mpRequest = std::make_shared<SyncRequest>(SyncRequest{this, mpSyncDirector, mpResultListener, kFailed});
+    mpRequest = std::make_shared<SyncRequest>(
+        SyncRequest{this, mpSyncDirector, mpResultListener, kFailed, mAccountId});
     g_source_set_callback(source, runRequest, toSource(mpRequest), freeFromSource<SyncRequest>);
     const guint srcId = g_source_attach(source, g_main_loop_get_context(mpLoop));
     SYNC_ASSERT(srcId != 0);
@@ -117,6 +119,7 @@ int SyncWorker::addRequest() {
 
 gboolean SyncWorker::runRequest(gpointer data) {
     const std::shared_ptr<SyncRequest> request = fromSource<SyncRequest>(data);
+    dlog_set_account(request->accountId);
     request->result = request->director->run();
     // What the run needed goes back: the next one may be hours away.
     db_util_release_memory();

@@ -23,7 +23,8 @@ public:
         virtual void onSyncStopped(SyncDirector* director, int result) = 0;
     };
 
-    SyncWorker();
+    // The log lines of its runs are those of `accountId`; 0 for none.
+    explicit SyncWorker(int accountId = 0);
     ~SyncWorker() override;
     SyncWorker(const SyncWorker&) = delete;
     SyncWorker& operator=(const SyncWorker&) = delete;
@@ -47,6 +48,7 @@ private:
     static void addResponse(std::shared_ptr<SyncRequest> request);
     static gboolean onResponse(gpointer request);
 
+    const int mAccountId;
     std::atomic<bool> mIsInProgress{false};
     SyncDirector* mpSyncDirector = nullptr;
     IResultListener* mpResultListener = nullptr;

@@ -17,6 +17,19 @@ enum log_priority {
 int dlog_print(log_priority priority, const char* tag, const char* format, ...)
     __attribute__((format(printf, 3, 4)));
 
+// Where a line comes from. The journal gets each part as a field of its own; in the text they stand before the message, as
+// "FILE: FUNCTION(LINE) > ".
+struct log_place_s {
+    const char* file;
+    const char* function;
+    int line;
+};
+int dlog_print_at(log_priority priority, const char* tag, const log_place_s& place, const char* format, ...)
+    __attribute__((format(printf, 4, 5)));
+
+// The account that the calling thread works for, as the journal's field ACCOUNT; 0 for none.
+void dlog_set_account(int account);
+
 // Sets the threshold of this process; lines below it are hidden.
 void dlog_set_threshold(log_priority lowestShown);
 

@@ -1,13 +1,15 @@
-# A clean Debian in a folder, booted as a container. To be sourced; sets root (its folder) and work (for what the test notes).
+# A clean Debian in a folder, booted as a container. To be sourced; sets root (its folder) and work (for what the test
+# notes).
 work=$(mktemp -d)
 root=$work/root
 container=
 leader=
 
 require() {
-    local missing=() package
+    local missing=() package status
     for package in "$@"; do
-        [ "$(dpkg-query -W -f '${db:Status-Status}' "$package" 2>/dev/null || true)" = installed ] || missing+=("$package")
+        status=$(dpkg-query -W -f '${db:Status-Status}' "$package" 2>/dev/null || true)
+        [ "$status" = installed ] || missing+=("$package")
     done
     [ ${#missing[@]} -eq 0 ] ||
         DEBIAN_FRONTEND=noninteractive apt-get install -y -qq --no-install-recommends "${missing[@]}" </dev/null
@@ -48,7 +50,10 @@ shut_down() {
     container=
 }
 
-enter() { nsenter -t "$leader" -a -- env -i PATH=/usr/sbin:/usr/bin:/sbin:/bin DEBIAN_FRONTEND=noninteractive LC_ALL=C.UTF-8 "$@"; }
+enter() {
+    nsenter -t "$leader" -a -- \
+        env -i PATH=/usr/sbin:/usr/bin:/sbin:/bin DEBIAN_FRONTEND=noninteractive LC_ALL=C.UTF-8 "$@"
+}
 inside() { enter bash -c "$1"; }
 spawn_inside() { enter "$@" </dev/null 2>/dev/null & }
 
@@ -61,8 +66,9 @@ drop_in() {
 # Every file of the system, without what packaging, logging and running leave by themselves.
 files() {
     (cd "$root" && find . -xdev \( -path ./proc -o -path ./sys -o -path ./dev -o -path ./run -o -path ./packages \
-        -o -path ./var/cache -o -path ./var/log -o -path ./var/lib/apt -o -path ./var/lib/dpkg -o -path ./var/lib/systemd \
-        -o -path ./root -o -path ./var/tmp -o -path ./tmp/systemd-private-\* \) -prune -o -printf '%p %U:%G %m\n' | sort)
+        -o -path ./var/cache -o -path ./var/log -o -path ./var/lib/apt -o -path ./var/lib/dpkg \
+        -o -path ./var/lib/systemd -o -path ./root -o -path ./var/tmp -o -path ./tmp/systemd-private-\* \) -prune \
+        -o -printf '%p %U:%G %m\n' | sort)
     (cd "$root" && sort etc/passwd etc/group | grep -v '^alice\|^bob')
 }
 

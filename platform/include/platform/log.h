@@ -17,8 +17,8 @@ enum log_priority {
 int dlog_print(log_priority priority, const char* tag, const char* format, ...)
     __attribute__((format(printf, 3, 4)));
 
-// Where a line comes from. The journal gets each part as a field of its own; in the text they stand before the message, as
-// "FILE: FUNCTION(LINE) > ".
+// Where a line comes from. The journal gets each part as a field of its own; in the text they stand before the
+// message, as "FILE: FUNCTION(LINE) > ".
 struct log_place_s {
     const char* file;
     const char* function;

@@ -68,6 +68,7 @@ std::string placeToken(const AccountOptions& options, Undo& undo) {
 }
 
 void startDaemon(Undo& undo) {
+    if (!device::isPrivate()) return daemon_link::awaitService();
     if (daemon_link::ensureRunning()) undo.add([] { daemon_link::stop(); });
 }
 

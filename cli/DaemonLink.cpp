@@ -149,6 +149,18 @@ bool start() {
     return true;
 }
 
+void awaitService() {
+    const auto deadline = Clock::now() + kStartLimit;
+    while (!isAnswering(kProbeTimeoutMs)) {
+        if (Clock::now() > deadline) {
+            throw Failure(
+                "the daemon was not started; see: systemctl status vantor-pim-sync.path "
+                "vantor-pim-sync.service");
+        }
+        g_usleep(kProbePauseMs * G_TIME_SPAN_MILLISECOND);
+    }
+}
+
 bool stop() {
     if (!device::isPrivate()) throw Failure(systemctl("stop"));
     const std::optional<int> pid = servingPid();

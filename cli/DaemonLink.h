@@ -23,6 +23,10 @@ bool start();
 // Asks the daemon to end and returns when it is gone. Returns false when it did not run.
 bool stop();
 
+// Returns when the daemon of a system install answers, which its service manager starts with the first account. A
+// Failure when it does not in time.
+void awaitService();
+
 // Like start(), but a daemon that runs is enough on a system install as well.
 bool ensureRunning();
 

@@ -21,7 +21,7 @@ namespace {
 
 constexpr off_t kMostBytes = 16 * 1024 * 1024;
 constexpr const char* kUnit = "_SYSTEMD_UNIT=vantor-pim-sync.service";
-constexpr const char* kAccountField = "VANTOR_PIM_SYNC_ACCOUNT=";
+constexpr const char* kAccountField = "ACCOUNT=";
 
 bool isAbout(const std::string& line, int account) {
     return account == 0 || line.find("): [" + std::to_string(account) + " ") != std::string::npos;

@@ -47,7 +47,9 @@ void makeNotificationFile(const std::string& path) {
     const Descriptor file(
         open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, kNotificationMode));
     if (!file && errno != EEXIST) throw Failure(path + " cannot be made: " + std::strerror(errno));
-    if (file && fchmod(file.get(), kNotificationMode) != 0) throw Failure(path + ": " + std::strerror(errno));
+    if (file &&
+        (fchmod(file.get(), kNotificationMode) != 0 || !platform::giveToFolderOwner(file.get(), path)))
+        throw Failure(path + ": " + std::strerror(errno));
 }
 
 }  // namespace

@@ -13,7 +13,10 @@ struct Reason {
 constexpr Reason kReasons[] = {
     {PLATFORM_ERROR_NOT_FOUND, "there is no such thing"},
     {PLATFORM_ERROR_IO, "a file could not be read or written; check the root folder and its disk"},
-    {PLATFORM_ERROR_PERMISSION_DENIED, "permission denied; run it as the owner of the root folder"},
+    {PLATFORM_ERROR_PERMISSION_DENIED,
+     "permission denied; run it as the owner of the root folder, or on a system install as root (for records "
+     "also as a "
+     "member of the group vantor-pim-sync)"},
     {PLATFORM_ERROR_INVALID_PARAMETER, "the value was refused"},
     {PLATFORM_ERROR_NO_SPACE, "the disk is full; make room and try again"},
     {PLATFORM_ERROR_DATABASE, "the database could not be read or written; check its file and its folder"},

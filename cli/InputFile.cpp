@@ -8,6 +8,7 @@
 
 #include "Failure.h"
 #include "Handles.h"
+#include "platform/service_manager.h"
 
 namespace input_file {
 
@@ -45,6 +46,7 @@ std::string read(const std::string& path, size_t mostBytes) {
 }
 
 std::string readSecret(const std::string& path, const std::string& what) {
+    platform::protectMemory();
     std::string value = read(path, kMostSecretBytes);
     if (value.ends_with('\n')) value.pop_back();
     if (value.ends_with('\r')) value.pop_back();

@@ -12,6 +12,7 @@
 #include "Failure.h"
 #include "Handles.h"
 #include "platform/root.h"
+#include "platform/service_manager.h"
 
 namespace token_file {
 
@@ -51,6 +52,7 @@ bool writeAll(int fd, const std::string& text) {
 }  // namespace
 
 std::optional<std::string> read(int accountId) {
+    platform::protectMemory();
     const std::string name = nameOf(accountId);
     const Descriptor folder = openFolder();
     if (!folder) return std::nullopt;
@@ -76,7 +78,8 @@ void write(int accountId, const std::string& token) {
     const Descriptor file(
         openat(folder.get(), fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, kMode));
     if (!file) fail(name, "written");
-    if (!writeAll(file.get(), token) ||
+    const std::string path = platform::rootedPath(device::kTrustedFolder) + "/" + fresh;
+    if (!platform::giveToFolderOwner(file.get(), path) || !writeAll(file.get(), token) ||
         renameat(folder.get(), fresh.c_str(), folder.get(), name.c_str()) != 0) {
         const int error = errno;
         unlinkat(folder.get(), fresh.c_str(), 0);

@@ -11,6 +11,10 @@ if(VPS_SANITIZE)
     target_link_options(vps_options INTERFACE -fsanitize=${VPS_SANITIZE})
 endif()
 
+if(NOT BUILD_TESTING)
+    return()
+endif()
+
 # vps_add_test(NAME SOURCES ... LIBS ...): one GoogleTest program, each of its cases a CTest test.
 include(GoogleTest)
 function(vps_add_test name)

@@ -1,11 +1,20 @@
 // The account service's records and queries.
 #include "platform/account.h"
 
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
 #include <memory>
+#include <string>
 #include <vector>
 
 #include "AccountStore.h"
 #include "platform/error.h"
+#include "platform/log.h"
+#include "platform/root.h"
 
 using platform::SqlStore;
 using platform::account::AccountRow;
@@ -29,10 +38,64 @@ constexpr const char* kAddEvent = "INSERT INTO events(type, account_id) VALUES(?
 constexpr const char* kPruneEvents =
     "DELETE FROM events WHERE sequence <= (SELECT max(sequence) FROM events) - 1000";
 
+constexpr const char* kPackagesFolder = "/opt/usr/data/accounts/packages";
+constexpr mode_t kPackagesMode = 0770;
+constexpr mode_t kMarkMode = 0664;
+
+// The file that is there while a package has accounts; empty for a name that is none of a file.
+std::string markOf(const std::string& package) {
+    if (package.empty() || package.front() == '.' || package.find('/') != std::string::npos) return {};
+    return platform::rootedPath(kPackagesFolder) + "/" + package;
+}
+
+// Makes the mark, or gives the one that is there a new time. What is only told is no reason for a call to fail.
+void setMark(const std::string& package) {
+    const std::string path = markOf(package);
+    if (path.empty() || platform::makeFolder(kPackagesFolder, kPackagesMode) != PLATFORM_ERROR_NONE) return;
+    const int fd = open(path.c_str(), O_WRONLY | O_CREAT | O_NOFOLLOW | O_CLOEXEC, kMarkMode);
+    if (fd == -1 || !platform::giveToFolderOwner(fd, path) || futimens(fd, nullptr) != 0)
+        dlog_print(DLOG_ERROR, "PLATFORM_ACCOUNT", "%s: %s, ignoring", path.c_str(), std::strerror(errno));
+    if (fd != -1) close(fd);
+}
+
+bool hasAccounts(const std::string& package) {
+    bool found = false;
+    const int code =
+        store().read("SELECT 1 FROM accounts WHERE package = ?", {package}, [&found](sqlite3_stmt*) {
+            found = true;
+            return false;
+        });
+    return found || code != PLATFORM_ERROR_NONE;
+}
+
+void clearMark(const std::string& package) {
+    const std::string path = markOf(package);
+    if (path.empty() || hasAccounts(package)) return;
+    unlink(path.c_str());
+    if (hasAccounts(package)) setMark(package);  // registered by another process meanwhile
+}
+
+// A process that ended between its registration and the mark has left none.
+void makeMissingMarks() {
+    std::vector<std::string> packages;
+    const int code =
+        store().read("SELECT DISTINCT package FROM accounts", {}, [&packages](sqlite3_stmt* row) {
+            packages.push_back(SqlStore::text(row, 0));
+            return true;
+        });
+    if (code != PLATFORM_ERROR_NONE) return;
+    for (const std::string& package : packages) {
+        const std::string path = markOf(package);
+        if (!path.empty() && access(path.c_str(), F_OK) != 0) setMark(package);
+    }
+}
+
 }  // namespace
 
 int account_connect() {
-    return store().open();
+    const int code = store().open();
+    if (code == PLATFORM_ERROR_NONE) makeMissingMarks();
+    return code;
 }
 
 int account_disconnect() {
@@ -101,11 +164,14 @@ int account_get_sync_support(account_h account, account_sync_state_e* status) {
 int account_insert(int account_id, const char* package_name, const char* email) {
     if (account_id <= 0 || package_name == nullptr || *package_name == '\0')
         return PLATFORM_ERROR_INVALID_PARAMETER;
-    return store().write({{"INSERT INTO accounts(id, package, email, sync_status) VALUES(?, ?, ?, ?)",
-                           {int64_t{account_id}, std::string(package_name),
-                            std::string(email != nullptr ? email : ""), int64_t{ACCOUNT_SYNC_STATUS_OFF}}},
-                          {kAddEvent, {std::string("insert"), int64_t{account_id}}},
-                          {kPruneEvents, {}}});
+    const int code =
+        store().write({{"INSERT INTO accounts(id, package, email, sync_status) VALUES(?, ?, ?, ?)",
+                        {int64_t{account_id}, std::string(package_name),
+                         std::string(email != nullptr ? email : ""), int64_t{ACCOUNT_SYNC_STATUS_OFF}}},
+                       {kAddEvent, {std::string("insert"), int64_t{account_id}}},
+                       {kPruneEvents, {}}});
+    if (code == PLATFORM_ERROR_NONE) setMark(package_name);
+    return code;
 }
 
 namespace {
@@ -127,7 +193,17 @@ int writeOne(const char* event, int accountId, const SqlStore::Statement& statem
 }  // namespace
 
 int account_delete(int account_id) {
-    return writeOne("delete", account_id, {"DELETE FROM accounts WHERE id = ?", {int64_t{account_id}}});
+    std::string package;
+    const int known = store().read("SELECT package FROM accounts WHERE id = ?", {int64_t{account_id}},
+                                   [&package](sqlite3_stmt* row) {
+                                       package = SqlStore::text(row, 0);
+                                       return false;
+                                   });
+    if (known != PLATFORM_ERROR_NONE) return known;
+    const int code =
+        writeOne("delete", account_id, {"DELETE FROM accounts WHERE id = ?", {int64_t{account_id}}});
+    if (code == PLATFORM_ERROR_NONE) clearMark(package);
+    return code;
 }
 
 int account_update_sync_status_by_id(int account_id, int status) {

@@ -138,7 +138,8 @@ int write(const std::string& key, const Value& value) {
     std::string temporary = folder + "/.XXXXXX";
     const int fd = mkostemp(temporary.data(), O_CLOEXEC);
     if (fd == -1) return codeOfErrno(errno);
-    bool written = writeAll(fd, contentOf(key, value)) && fchmod(fd, 0644) == 0;
+    bool written =
+        writeAll(fd, contentOf(key, value)) && fchmod(fd, 0644) == 0 && giveToFolderOwner(fd, temporary);
     if (written && !isMemory(key)) written = fsync(fd) == 0;
     int error = written ? 0 : errno;
     close(fd);

@@ -2,6 +2,7 @@
 
 #include <sys/stat.h>
 
+#include "OpenCode.h"
 #include "platform/error.h"
 #include "platform/log.h"
 #include "platform/root.h"
@@ -42,7 +43,7 @@ int SqlStore::open() {
     if (const int code = makeFolder(mFile.substr(0, mFile.rfind('/')), 0770); code != PLATFORM_ERROR_NONE)
         return code;
     if (const int code = db_util_open(wanted.c_str(), &mHandle, mSchema.version()); code != SQLITE_OK)
-        return code == kDatabaseIsNewer ? PLATFORM_ERROR_NEWER : PLATFORM_ERROR_DATABASE;
+        return codeOfOpen(code, wanted);
     mOpenPath = wanted;
     const int code = codeOf(db_util_apply_schema(mHandle, mSchema));
     if (code != PLATFORM_ERROR_NONE) db_util_close(std::exchange(mHandle, nullptr));

@@ -33,8 +33,8 @@ std::string pathOf(const char* name) {
 // A key that others could read or exchange is not trusted.
 bool isPrivate(int fd) {
     struct stat info {};
-    return fstat(fd, &info) == 0 && S_ISREG(info.st_mode) && info.st_uid == geteuid() &&
-           (info.st_mode & kOthersMask) == 0;
+    const bool isOwn = fstat(fd, &info) == 0 && (info.st_uid == geteuid() || geteuid() == 0);
+    return isOwn && S_ISREG(info.st_mode) && (info.st_mode & kOthersMask) == 0;
 }
 
 }  // namespace
@@ -67,8 +67,8 @@ int key_storage_set(const char* name, const char* value) {
     const int fd = mkostemp(temporary.data(), O_CLOEXEC);  // mode 0600
     if (fd == -1) return platform::codeOfErrno(errno);
     errno = EIO;
-    const bool written =
-        write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) && fsync(fd) == 0;
+    const bool written = write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) &&
+                         platform::giveToFolderOwner(fd, temporary) && fsync(fd) == 0;
     int error = written ? 0 : errno;
     close(fd);
     if (error == 0 && rename(temporary.c_str(), pathOf(name).c_str()) != 0) error = errno;

@@ -2,11 +2,10 @@
 
 #include <sys/stat.h>
 #include <sys/uio.h>
-// The place in the source stands in the message: the journal would be told of this file.
-#define SD_JOURNAL_SUPPRESS_LOCATION
 #include <systemd/sd-journal.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <atomic>
 #include <cstdarg>
 #include <cstdio>
@@ -84,19 +83,6 @@ std::string contextText() {
     return "[" + std::to_string(context->accountId()) + " " + context->kind() + "] ";
 }
 
-void writeToJournal(log_priority priority, const char* tag, const std::string& message) {
-    std::vector<std::string> fields{"PRIORITY=" + std::to_string(nameOf(priority).syslog),
-                                    "MESSAGE=" + contextText() + message, std::string("TAG=") + tag};
-    if (context != nullptr) {
-        fields.push_back("VANTOR_PIM_SYNC_ACCOUNT=" + std::to_string(context->accountId()));
-        fields.push_back(std::string("VANTOR_PIM_SYNC_KIND=") + context->kind());
-    }
-    std::vector<iovec> parts;
-    parts.reserve(fields.size());
-    for (std::string& field : fields) parts.push_back({field.data(), field.size()});
-    sd_journal_sendv(parts.data(), static_cast<int>(parts.size()));
-}
-
 // Length of the colour sequence at `text` ("ESC [ digits and semicolons m"), 0 when there is none.
 size_t colourLength(const char* text) {
     if (text[0] != '\033' || text[1] != '[') return 0;
@@ -132,27 +118,79 @@ int writeToStandardError(log_priority priority, const char* tag, const std::stri
     return static_cast<int>(write(STDERR_FILENO, line.data(), line.size()));
 }
 
-}  // namespace
+class JournalFields {
+public:
+    void add(const char* name, const std::string& value) {
+        mTexts.push_back(std::string(name) + "=" + value);
+    }
+    void send() const {
+        std::vector<iovec> parts;
+        for (const std::string& text : mTexts) parts.push_back({const_cast<char*>(text.data()), text.size()});
+        sd_journal_sendv(parts.data(), static_cast<int>(parts.size()));
+    }
 
-int dlog_print(log_priority priority, const char* tag, const char* format, ...) {
-    if (!dlog_is_shown(priority)) return 0;
+private:
+    std::vector<std::string> mTexts;
+};
+
+void writeToJournal(log_priority priority, const char* tag, const log_place_s* place,
+                    const std::string& message) {
+    JournalFields fields;
+    fields.add("MESSAGE", contextText() + message);
+    fields.add("PRIORITY", std::to_string(nameOf(priority).syslog));
+    fields.add("TAG", tag);
+    if (context != nullptr) {
+        fields.add("ACCOUNT", std::to_string(context->accountId()));
+        fields.add("KIND", context->kind());
+    }
+    if (place != nullptr) {
+        fields.add("CODE_FILE", place->file);
+        fields.add("CODE_FUNC", place->function);
+        fields.add("CODE_LINE", std::to_string(place->line));
+    }
+    fields.send();
+}
+
+int print(log_priority priority, const char* tag, const log_place_s* place, const char* format,
+          va_list arguments) {
     char buffer[kMaxMessageBytes];
-    va_list arguments;
-    va_start(arguments, format);
-    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the analyser does not know this va_start
-    const int length = std::vsnprintf(buffer, sizeof buffer, format, arguments);
-    va_end(arguments);
-    if (length < 0) return 0;
+    size_t length = 0;
+    if (place != nullptr) {
+        const int head =
+            std::snprintf(buffer, sizeof buffer, "%s: %s(%d) > ", place->file, place->function, place->line);
+        length = std::min(sizeof buffer - 1, static_cast<size_t>(std::max(head, 0)));
+    }
+    // NOLINTNEXTLINE(clang-analyzer-valist.Uninitialized): the callers have begun the list
+    if (std::vsnprintf(buffer + length, sizeof buffer - length, format, arguments) < 0) return 0;
     std::string message(buffer);
     replaceControls(&message);
-
     {
         const std::lock_guard lock(sink().mutex);
         if (sink().write != nullptr) sink().write(priority, tag, message.c_str(), sink().userData);
     }
     if (!goesToJournal()) return writeToStandardError(priority, tag, message);
-    writeToJournal(priority, tag, message);
+    writeToJournal(priority, tag, place, message);
     return static_cast<int>(message.size());
+}
+
+}  // namespace
+
+int dlog_print(log_priority priority, const char* tag, const char* format, ...) {
+    if (!dlog_is_shown(priority)) return 0;
+    va_list arguments;
+    va_start(arguments, format);
+    const int written = print(priority, tag, nullptr, format, arguments);
+    va_end(arguments);
+    return written;
+}
+
+int dlog_print_at(log_priority priority, const char* tag, const log_place_s& place, const char* format, ...) {
+    if (!dlog_is_shown(priority)) return 0;
+    va_list arguments;
+    va_start(arguments, format);
+    const int written = print(priority, tag, &place, format, arguments);
+    va_end(arguments);
+    return written;
 }
 
 LogContext::LogContext(int accountId, const char* kind)

@@ -1,6 +1,8 @@
 #include "platform/root.h"
 
+#include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <cerrno>
 #include <cstdlib>
@@ -21,12 +23,33 @@ std::string rootedPath(std::string_view absolute) {
     return rootFolder().append(absolute);
 }
 
+bool giveToFolderOwner(int fd, const std::string& path) {
+    if (geteuid() != 0) return true;
+    struct stat folder {};
+    const size_t end = path.rfind('/');
+    if (stat(end == 0 ? "/" : path.substr(0, end).c_str(), &folder) != 0) return false;
+    return fchown(fd, folder.st_uid, folder.st_gid) == 0;
+}
+
+namespace {
+
+bool giveFolderAway(const std::string& path) {
+    const int fd = open(path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC);
+    if (fd == -1) return geteuid() != 0;  // a mode that keeps its own user out
+    const bool given = giveToFolderOwner(fd, path);
+    close(fd);
+    return given;
+}
+
+}  // namespace
+
 int makeFolder(std::string_view absolute, unsigned mode) {
     const std::string path = rootedPath(absolute);
     for (size_t end = path.find('/', 1);; end = path.find('/', end + 1)) {
         const bool last = end == std::string::npos;
         const std::string part = path.substr(0, end);
-        if (mkdir(part.c_str(), last ? mode : 0755) != 0 && errno != EEXIST) return codeOfErrno(errno);
+        const bool made = mkdir(part.c_str(), last ? mode : 0755) == 0;
+        if ((!made && errno != EEXIST) || (made && !giveFolderAway(part))) return codeOfErrno(errno);
         if (last) break;
     }
     struct stat info {};

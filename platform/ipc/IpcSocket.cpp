@@ -89,7 +89,9 @@ int openService(const std::string& path, unsigned group, unsigned mode) {
         close(fd);
         return PLATFORM_ERROR_IO;
     }
-    if (lchown(address.sun_path, static_cast<uid_t>(-1), group) != 0) {
+    struct stat made {};
+    const bool isOfGroup = lstat(address.sun_path, &made) == 0 && made.st_gid == group;
+    if (!isOfGroup && lchown(address.sun_path, static_cast<uid_t>(-1), group) != 0) {
         dlog_print(DLOG_ERROR, kTag, "%s cannot be given to group %u (%s), it keeps its own, ignoring",
                    address.sun_path, group, std::strerror(errno));
     }

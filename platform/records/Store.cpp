@@ -5,6 +5,7 @@
 #include <random>
 #include <unordered_map>
 
+#include "../base/OpenCode.h"
 #include "StoreWrite.h"
 #include "platform/error.h"
 #include "platform/log.h"
@@ -92,7 +93,7 @@ int Store::open() {
     const std::string tables = tablesText();
     const db_schema_s schema{tables.c_str(), mUpgrades};
     if (const int code = mConnection.open(mPath, schema.version()); code != SQLITE_OK)
-        return code == kDatabaseIsNewer ? PLATFORM_ERROR_NEWER : codeOf(code);
+        return codeOfOpen(code, mPath);
     if (const int code = codeOf(mConnection.apply(schema)); code != PLATFORM_ERROR_NONE) {
         mConnection.close();
         return code;

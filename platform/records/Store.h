@@ -27,8 +27,8 @@ namespace platform::records {
 class Store {
 public:
     // `file` is absolute, the root is applied when the store is opened.
-    // `filesFolder` is where the files of records are kept, NULL when none has any. `upgrades` as in db_schema_s; the tables
-    // follow from the views.
+    // `filesFolder` is where the files of records are kept, NULL when none has any. `upgrades` as in db_schema_s; the
+    // tables follow from the views.
     Store(const char* file, std::span<const View* const> views, const char* filesFolder = nullptr,
           std::span<const char* const> upgrades = {});
     ~Store();

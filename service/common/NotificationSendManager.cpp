@@ -6,6 +6,7 @@
 #include "platform/account.h"
 #include "platform/device.h"
 #include "platform/error.h"
+#include "platform/service_manager.h"
 #include "platform/settings.h"
 
 namespace {
@@ -65,6 +66,7 @@ int NotificationSendManager::notifyChange(int accountId, vantor_pim_sync_type_e 
 void NotificationSendManager::setVconfSyncState(sync_state state) {
     if (state == SYNC_STATE_STARTED) ++mRunningSyncCount;
     if (state == SYNC_STATE_ENDED) --mRunningSyncCount;
+    platform::tellStatus(mRunningSyncCount > 0 ? "Syncing" : "Idle");
     if (mRunningSyncCount != 0 && mRunningSyncCount != 1) return;
     if (vconf_set_int("memory/sync/vantor-pim-sync", mRunningSyncCount) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("vconf_set_int is failed !!");

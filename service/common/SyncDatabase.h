@@ -48,8 +48,8 @@ public:
         sqlite3_stmt* mpStatement;
     };
 
-    // `path` is absolute, the root is applied here. The schema texts are executed together when the file is made; `upgrades` bring
-    // an older one up, as in db_schema_s.
+    // `path` is absolute, the root is applied here. The schema texts are executed together when the file is made;
+    // `upgrades` bring an older one up, as in db_schema_s.
     // `notOpenedText` is what a read logs when the store cannot be opened; by `name` the log calls a file that cannot be made.
     SyncDatabase(std::string path, std::span<const char* const> schema,
                  const char* notOpenedText = "Database is not opended", const char* name = "calendar",

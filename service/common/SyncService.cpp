@@ -21,6 +21,7 @@
 #include "contacts/CtDataManager.h"
 #include "platform/database.h"
 #include "platform/error.h"
+#include "platform/service_manager.h"
 
 using sync_result::kFailed;
 using sync_result::kOk;
@@ -37,6 +38,9 @@ std::atomic<bool> gExists{false};
 void queryAccounts(account_cb callback, void* userData) {
     if (account_query_account_by_package_name(callback, kPackage, userData) != PLATFORM_ERROR_NONE) {
         SYNC_INFO("there is no account of the provider on this device, the daemon ends");
+        // An end before it was ready would count as a failure.
+        platform::tellReady("There is no account");
+        platform::tellStopping();
         exit(EXIT_SUCCESS);
     }
 }

@@ -1,8 +1,10 @@
 // The daemon's entry: opens the service socket, brings the service up, runs the main loop until SIGTERM or SIGINT.
 #include <glib-object.h>
+#include <grp.h>
 #include <malloc.h>
 #include <sys/stat.h>
 
+#include <csignal>
 #include <cstdio>
 #include <string_view>
 
@@ -10,11 +12,13 @@
 #include "common/SyncService.h"
 #include "common/vantor_pim_sync_ipc_marshal.h"
 #include "platform/root.h"
+#include "platform/service_manager.h"
 #include "server/vantor_pim_sync_server_ipc.h"
 
 namespace {
 
-constexpr unsigned kSocketGroup = 6005;
+constexpr const char* kSocketGroupName = "vantor-pim-sync";
+constexpr unsigned kSocketGroup = 6005;  // the device's own, where no group has the name
 constexpr unsigned kSocketMode = 0660;
 // Whoever starts the daemon: the modes that the stores ask for hold, and nobody else may ever write.
 constexpr mode_t kFileCreationMask = 0002;
@@ -28,6 +32,11 @@ void tuneMemory() {
     mallopt(M_TOP_PAD, kKeptBytes / 4);
 }
 
+unsigned socketGroup() {
+    const group* named = getgrnam(kSocketGroupName);
+    return named != nullptr ? named->gr_gid : kSocketGroup;
+}
+
 void initializeTypes() {
     // Done by the library itself today; kept for older ones.
 #pragma GCC diagnostic push
@@ -39,15 +48,20 @@ void initializeTypes() {
 }  // namespace
 
 static int __server_main() {
+    platform::protectMemory();
     tuneMemory();
+    std::signal(SIGHUP, SIG_IGN);  // there is nothing to read again: settings and accounts are watched
     umask(kFileCreationMask);
     initializeTypes();
-    (void)pims_ipc_svc_init(kServiceSocket, kSocketGroup, kSocketMode);
+    (void)pims_ipc_svc_init(kServiceSocket, socketGroup(), kSocketMode);
     if (!vantor_pim_sync_server_ipc_register()) return 0;
     const std::string root = platform::rootFolder();
     SYNC_INFO("serving %s", root.empty() ? "the system" : root.c_str());
     (void)vantor_pim_sync_initialize();
+    platform::watchMainLoop();
+    platform::tellReady("Idle");
     pims_ipc_svc_run_main_loop(nullptr);
+    platform::tellStopping();
     (void)vantor_pim_sync_finalize();
     // Running syncs are told to stop and waited for: nothing may run into the end of the process.
     if (SyncService::exists()) SyncService::getInstance().quiesce();

@@ -37,6 +37,9 @@ int account_destroy(account_h account);
 [[nodiscard]] int account_get_email_address(account_h account, const char** email);
 [[nodiscard]] int account_get_sync_support(account_h account, account_sync_state_e* status);
 
+// While a package has accounts the file "/opt/usr/data/accounts/packages/PACKAGE" is there; a registration gives it a
+// new time. A service manager that watches it starts what serves the accounts. What a process left undone is made up
+// for by account_connect.
 // For account applications and the tool. An id that is taken is PLATFORM_ERROR_INVALID_PARAMETER.
 [[nodiscard]] int account_insert(int account_id, const char* package_name, const char* email);
 [[nodiscard]] int account_delete(int account_id);

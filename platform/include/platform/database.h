@@ -1,6 +1,7 @@
 // database.h: how every SQLite file of the device is opened.
 // A connection has a busy timeout of 10 s and a rollback journal that stays on disk between transactions.
-// A store carries the version of its schema (SQLite's user_version): an older store is brought up, a newer one is left alone.
+// A store carries the version of its schema (SQLite's user_version): an older store is brought up, a newer one is
+// left alone.
 #pragma once
 
 #include <span>
@@ -23,8 +24,9 @@ struct db_schema_s {
     [[nodiscard]] int version() const { return static_cast<int>(upgrades.size()) + 1; }
 };
 
-// Brings an open store to `schema`: an empty one gets its tables, an older one the upgrades that it lacks, as one transaction.
-// A store with tables and without a version is of version 1. Returns 0 or SQLite's error code; the store is then as before.
+// Brings an open store to `schema`: an empty one gets its tables, an older one the upgrades that it lacks, as one
+// transaction. A store with tables and without a version is of version 1. Returns 0 or SQLite's error code; the store
+// is then as before.
 [[nodiscard]] int db_util_apply_schema(sqlite3* handle, const db_schema_s& schema);
 
 // Closes; a NULL handle is success.

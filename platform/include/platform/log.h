@@ -17,8 +17,18 @@ enum log_priority {
 int dlog_print(log_priority priority, const char* tag, const char* format, ...)
     __attribute__((format(printf, 3, 4)));
 
+// Where a line comes from. The journal gets each part as a field of its own; in the text they stand before the
+// message, as "FILE: FUNCTION(LINE) > ".
+struct log_place_s {
+    const char* file;
+    const char* function;
+    int line;
+};
+int dlog_print_at(log_priority priority, const char* tag, const log_place_s& place, const char* format, ...)
+    __attribute__((format(printf, 4, 5)));
+
 // What the lines of this thread are about while the object lives: an account and a kind of its data. They begin with
-// "[ACCOUNT KIND] ", and carry both as fields (VANTOR_PIM_SYNC_ACCOUNT, VANTOR_PIM_SYNC_KIND) in the journal. Of several the
+// "[ACCOUNT KIND] ", and carry both as fields (ACCOUNT, KIND) in the journal. Of several the
 // youngest holds.
 class LogContext {
 public:

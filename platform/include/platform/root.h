@@ -19,4 +19,9 @@ std::string rootedPath(std::string_view absolute);
 // Returns PLATFORM_ERROR_NONE, PLATFORM_ERROR_PERMISSION_DENIED, PLATFORM_ERROR_NO_SPACE or PLATFORM_ERROR_IO.
 [[nodiscard]] int makeFolder(std::string_view absolute, unsigned mode = 0755);
 
+// Gives what the superuser has just made at `path` (of the machine) to the owner of the folder that it lies in: the
+// daemon has a user of its own, and the administrator's tool writes what it reads. Does nothing for other users.
+// False with errno.
+[[nodiscard]] bool giveToFolderOwner(int fd, const std::string& path);
+
 }  // namespace platform

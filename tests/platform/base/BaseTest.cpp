@@ -3,7 +3,10 @@
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sqlite3.h>
+#include <sys/prctl.h>
+#include <sys/ptrace.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
 
 #include <filesystem>
 #include <fstream>
@@ -14,6 +17,7 @@
 #include "platform/keys.h"
 #include "platform/log.h"
 #include "platform/root.h"
+#include "platform/service_manager.h"
 #include "platform/settings.h"
 #include "platform/support.h"
 #include "service/common/MainLoop.h"
@@ -259,6 +263,24 @@ TEST(Database, OlderStoresAreBroughtUpAndNewerOnesLeftAlone) {
         EXPECT_EQ(askStore(file, "PRAGMA user_version"), std::to_string(row.version) + ";");
         EXPECT_EQ(askStore(file, row.question), row.answer);
     }
+}
+
+TEST(Memory, IsKeptFromOthers) {
+    const auto protect = [] {
+        platform::protectMemory();
+        exit(prctl(PR_GET_DUMPABLE, 0, 0, 0, 0));
+    };
+    EXPECT_EXIT(protect(), testing::ExitedWithCode(0), "");
+    const auto protectTraced = [&protect] {
+        if (fork() == 0) {
+            ptrace(PTRACE_TRACEME, 0, nullptr, nullptr);
+            protect();
+        }
+        int status = 0;
+        wait(&status);
+        exit(WEXITSTATUS(status));
+    };
+    EXPECT_EXIT(protectTraced(), testing::ExitedWithCode(1), "") << "a debugger that started it may look";
 }
 
 TEST(Device, StorageAndNetwork) {

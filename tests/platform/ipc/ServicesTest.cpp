@@ -52,6 +52,27 @@ TEST(Accounts, EventsReachEveryProcessTheWriterIncluded) {
     EXPECT_EQ(account_unsubscribe_notification(subscription), 0);
 }
 
+TEST(Accounts, AMarkIsThereWhileAPackageHasAccounts) {
+    const TestRoot root;
+    const auto mark = root.at("/opt/usr/data/accounts/packages/p");
+    ASSERT_EQ(account_connect(), 0);
+    EXPECT_FALSE(std::filesystem::exists(mark));
+    ASSERT_EQ(account_insert(1, "p", ""), 0);
+    ASSERT_EQ(account_insert(2, "../p", ""), 0) << "a name that is none of a file has no mark";
+    std::filesystem::remove(mark);
+    ASSERT_EQ(account_connect(), 0);
+    EXPECT_TRUE(std::filesystem::exists(mark)) << "what a killed process left undone";
+
+    const auto before = std::filesystem::file_time_type::clock::now() - std::chrono::hours(1);
+    std::filesystem::last_write_time(mark, before);
+    ASSERT_EQ(account_insert(3, "p", ""), 0);
+    EXPECT_GT(std::filesystem::last_write_time(mark), before) << "each registration is news";
+    ASSERT_EQ(account_delete(1), 0);
+    EXPECT_TRUE(std::filesystem::exists(mark)) << "one is left";
+    ASSERT_EQ(account_delete(3), 0);
+    EXPECT_FALSE(std::filesystem::exists(mark));
+}
+
 TEST(Alarms, KeepTheirPhase) {
     struct Row {
         int64_t due, interval, now, next;

@@ -378,6 +378,70 @@ TEST(Daemon, SyncsWhatIsOverdueAndWhatASettingAsksForAndEndsInTheMiddleOfIt) {
     EXPECT_EQ(daemon.process->wait(3000), 0) << "however many syncs there are";
 }
 
+namespace {
+
+// The side of the service manager: a socket that takes what the daemon tells.
+class ServiceManager {
+public:
+    explicit ServiceManager(const TestRoot& root)
+        : path(root.at("/tmp/notify")), mSocket(socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0)) {
+        sockaddr_un address{};
+        address.sun_family = AF_UNIX;
+        path.copy(address.sun_path, sizeof address.sun_path - 1);
+        EXPECT_EQ(bind(mSocket, reinterpret_cast<const sockaddr*>(&address), sizeof address), 0);
+        const timeval limit{.tv_sec = 5, .tv_usec = 0};
+        EXPECT_EQ(setsockopt(mSocket, SOL_SOCKET, SO_RCVTIMEO, &limit, sizeof limit), 0);
+    }
+    ~ServiceManager() { close(mSocket); }
+    ServiceManager(const ServiceManager&) = delete;
+    ServiceManager& operator=(const ServiceManager&) = delete;
+
+    // The next message that begins with `wanted`, empty when none comes in time.
+    std::string await(std::string_view wanted) const {
+        std::string message(512, '\0');
+        ssize_t length = 0;
+        while ((length = recv(mSocket, message.data(), message.size(), 0)) > 0) {
+            if (std::string_view(message.data(), static_cast<size_t>(length)).starts_with(wanted))
+                return message.substr(0, static_cast<size_t>(length));
+        }
+        return {};
+    }
+    std::string path;
+
+private:
+    int mSocket;
+};
+
+}  // namespace
+
+TEST(Daemon, TellsTheServiceManagerHowItStands) {
+    const TestRoot root;
+    const ServiceManager manager(root);
+    Daemon daemon(root);
+    const auto start = [&] {
+        daemon.process = std::make_unique<Process>(
+            std::vector<std::string>{VPS_BIN_DIR "/vantor-pim-sync"},
+            Environment{{"NOTIFY_SOCKET", manager.path}, {"WATCHDOG_USEC", "200000"}});
+    };
+    start();
+    EXPECT_EQ(manager.await("READY=1"), "READY=1\nSTATUS=There is no account")
+        << "an end before that is a failure";
+    EXPECT_EQ(daemon.process->wait(5000), 0);
+
+    addDeviceAccount(root, 7);
+    start();
+    EXPECT_EQ(manager.await("READY=1"), "READY=1\nSTATUS=Idle");
+    daemon.process->kill(SIGHUP);
+    const auto begin = std::chrono::steady_clock::now();
+    for (int beat = 0; beat < 4; ++beat) EXPECT_FALSE(manager.await("WATCHDOG=1").empty());
+    EXPECT_GT(std::chrono::steady_clock::now() - begin, std::chrono::milliseconds(200))
+        << "not without a pause";
+    EXPECT_TRUE(daemon.connect()) << "a hang-up is nothing to it";
+    daemon.process->kill(SIGTERM);
+    EXPECT_FALSE(manager.await("STOPPING=1").empty());
+    EXPECT_EQ(daemon.process->wait(3000), 0);
+}
+
 TEST(Daemon, PowerSavingTakesTheScheduleAwayAndGivesItBack) {
     const TestRoot root;
     storeAccount(root, 7, "127.0.0.1", 15, time(nullptr));

@@ -73,3 +73,7 @@ Action buildGroupShow(CLI::App& app);
 Action buildGroupAdd(CLI::App& app);
 Action buildGroupSet(CLI::App& app);
 Action buildGroupDelete(CLI::App& app);
+Action buildExportEvents(CLI::App& app);
+Action buildExportTodos(CLI::App& app);
+Action buildExportContacts(CLI::App& app);
+Action buildImport(CLI::App& app);

@@ -30,6 +30,7 @@ constexpr Noun kNouns[] = {
     {"contact", "One contact"},
     {"groups", "Groups of contacts of this device"},
     {"group", "One group of contacts"},
+    {"export", "Events and to-dos as iCalendar, contacts as vCard"},
 };
 
 constexpr Command kCommands[] = {
@@ -105,6 +106,16 @@ constexpr Command kCommands[] = {
      "group add group.json\ngroup add --account 7 - < group.json", buildGroupAdd},
     {"group", "set", "Change a group's name", "group set 3 name=Choir", buildGroupSet},
     {"group", "delete", "Delete a group; its contacts stay", "group delete 3", buildGroupDelete},
+    {"export", "events", "Write events as iCalendar (RFC 5545)",
+     "export events --calendar 3 work.ics\nexport events --account 7 > events.ics", buildExportEvents},
+    {"export", "todos", "Write to-dos as iCalendar (RFC 5545)",
+     "export todos --calendar 4 tasks.ics\nexport todos > todos.ics", buildExportTodos},
+    {"export", "contacts", "Write contacts with their photos as vCard 4.0 (RFC 6350)",
+     "export contacts --account 7 contacts.vcf\nexport contacts > contacts.vcf", buildExportContacts},
+    {"import", nullptr, "Add the events or to-dos of an iCalendar file, or the contacts of a vCard file",
+     "import work.ics --calendar 3\nimport contacts.vcf --account 7 --dry-run\n"
+     "import - --calendar 3 --replace --json < work.ics",
+     buildImport},
 };
 
 const std::string kExamplesTitle = "Examples:\n";

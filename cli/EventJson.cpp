@@ -121,6 +121,16 @@ void setOrganizer(NewEvent& event, const Json& value) {
                            textFrom(value.value("email", none), "organizer.email"), "organizer.email");
 }
 
+void removeChildren(NewEvent& event, unsigned property) {
+    std::vector<calendar_record_h> children;
+    record_access::forEachChild(event.record.get(), property,
+                                [&children](calendar_record_h child) { children.push_back(child); });
+    for (const calendar_record_h child : children) {
+        check(calendar_record_remove_child_record(event.record.get(), property, child), "changing a record");
+        const CalendarRecord removed(child);
+    }
+}
+
 void addChild(NewEvent& event, unsigned property, CalendarRecord child, const std::string& member) {
     check(calendar_record_add_child_record(event.record.get(), property, child.get()), "\"" + member + "\"");
     static_cast<void>(child.release());  // the event has taken it over
@@ -128,6 +138,7 @@ void addChild(NewEvent& event, unsigned property, CalendarRecord child, const st
 
 void setAttendees(NewEvent& event, const Json& value) {
     const Json none;
+    removeChildren(event, CALENDAR_EVENT_ATTENDEES);
     for (const Json& person : listFrom(value, "attendees")) {
         refuseUnknown(person, {"name", "email", "status"}, "attendees");
         CalendarRecord attendee = record_access::create(_calendar_attendee);
@@ -146,6 +157,7 @@ void setAttendees(NewEvent& event, const Json& value) {
 }
 
 void setReminders(NewEvent& event, const Json& value) {
+    removeChildren(event, CALENDAR_EVENT_ALARMS);
     for (const Json& minutes : listFrom(value, "reminders")) {
         CalendarRecord alarm = record_access::create(_calendar_alarm);
         record_access::setInt(alarm.get(), CALENDAR_ALARM_TICK,
@@ -231,10 +243,10 @@ std::span<const unsigned> scalarProjection() {
     return std::span(kProjection).first(kScalarPropertyCount);
 }
 
-NewEvent parse(const Json& object) {
+NewEvent parse(const Json& object, CalendarRecord onto) {
     if (!object.is_object()) throw Failure("the file must hold one event as a JSON object");
     NewEvent event;
-    event.record = record_access::create(_calendar_event);
+    event.record = onto != nullptr ? std::move(onto) : record_access::create(_calendar_event);
     for (const char* required : {"start", "end"}) {
         if (!object.contains(required) || object[required].is_null()) refuse(required, "is missing");
     }

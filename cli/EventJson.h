@@ -31,7 +31,8 @@ struct NewEvent {
     std::optional<int> originalEvent;
     std::string recurrenceId;
 };
-NewEvent parse(const Json& object);
+// Onto a record that is there, when one is given: the members of the file take the place of its own, the rest stays.
+NewEvent parse(const Json& object, CalendarRecord onto = nullptr);
 
 // What holds between fields: all-day events have two dates, no event ends before its start.
 void checkTimes(calendar_record_h event);

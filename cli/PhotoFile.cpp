@@ -16,8 +16,7 @@ namespace {
 
 constexpr const char* kFolder = "/tmp";
 constexpr const char* kPattern = "/vantor-pim-syncctl-XXXXXX";
-constexpr size_t kMostBytes = size_t{32} * 1024 * 1024;  // what the store takes
-constexpr mode_t kNewFileMode = 0666;                    // less the user's mask
+constexpr mode_t kNewFileMode = 0666;  // less the user's mask
 
 void writeAll(int fd, const std::string& bytes, const std::string& target) {
     for (size_t done = 0; done < bytes.size();) {
@@ -32,8 +31,12 @@ void writeAll(int fd, const std::string& bytes, const std::string& target) {
 
 StagedPhoto::StagedPhoto(const std::string& source) {
     if (source.empty()) return;
-    const std::string bytes = input_file::read(source, kMostBytes);
+    const std::string bytes = photo_file::read(source);
     if (bytes.empty()) throw Failure(source + " is empty; it is no photo");
+    stage(bytes);
+}
+
+void StagedPhoto::stage(const std::string& bytes) {
     check(platform::makeFolder(kFolder), "the folder for photos");
     std::string path = platform::rootedPath(std::string(kFolder) + kPattern);
     const Descriptor file(mkostemp(path.data(), O_CLOEXEC));
@@ -53,8 +56,12 @@ StagedPhoto::~StagedPhoto() {
 
 namespace photo_file {
 
+std::string read(const std::string& source) {
+    return input_file::read(source, kMostBytes);
+}
+
 void save(const std::string& source, const std::string& target) {
-    const std::string bytes = input_file::read(source, kMostBytes);
+    const std::string bytes = read(source);
     if (target == "-") {
         writeAll(STDOUT_FILENO, bytes, "standard output");
         return;

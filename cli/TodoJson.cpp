@@ -44,10 +44,10 @@ Json compose(calendar_record_h todo) {
     return object;
 }
 
-NewTodo parse(const Json& object) {
+NewTodo parse(const Json& object, CalendarRecord onto) {
     if (!object.is_object()) throw Failure("the file must hold one to-do as a JSON object");
     NewTodo todo;
-    todo.record = record_access::create(_calendar_todo);
+    todo.record = onto != nullptr ? std::move(onto) : record_access::create(_calendar_todo);
     for (const auto& member : object.items()) {
         if (const ScalarField* field = record_json::findScalar(kScalars, member.key())) {
             record_json::setFromJson(todo.record.get(), *field, member.value());

@@ -21,6 +21,7 @@ struct NewTodo {
     CalendarRecord record;
     std::optional<int> calendar;
 };
-NewTodo parse(const Json& object);
+// Onto a record that is there, when one is given.
+NewTodo parse(const Json& object, CalendarRecord onto = nullptr);
 
 }  // namespace todo_json

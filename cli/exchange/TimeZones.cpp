@@ -1,0 +1,158 @@
+#include "exchange/TimeZones.h"
+
+#include <unicode/strenum.h>
+#include <unicode/ucal.h>
+#include <unicode/vtzone.h>
+
+#include <vector>
+
+#include "EventFields.h"
+#include "Failure.h"
+
+namespace exchange {
+
+namespace {
+
+constexpr double kMsPerSecond = 1000;
+constexpr double kMsPerYear = 366 * 86400 * kMsPerSecond;
+constexpr size_t kMostDefinitions = 1000;
+constexpr size_t kMostDefinitionBytes = 65536;
+
+std::string utf8(const icu::UnicodeString& text) {
+    std::string out;
+    return text.toUTF8String(out);
+}
+
+std::unique_ptr<TimeZone> ofDatabase(const std::string& name) {
+    if (!event_fields::isTimeZone(name)) return nullptr;
+    std::unique_ptr<icu::TimeZone> zone(icu::TimeZone::createTimeZone(icu::UnicodeString::fromUTF8(name)));
+    auto* basic = dynamic_cast<icu::BasicTimeZone*>(zone.get());
+    if (basic == nullptr || *zone == icu::TimeZone::getUnknown()) return nullptr;
+    static_cast<void>(zone.release());  // the same object
+    return std::make_unique<TimeZone>(std::unique_ptr<icu::BasicTimeZone>(basic), name);
+}
+
+// "W. Europe Standard Time" and the like.
+std::string databaseNameOf(const std::string& id) {
+    UErrorCode error = U_ZERO_ERROR;
+    icu::UnicodeString name;
+    icu::TimeZone::getIDForWindowsID(icu::UnicodeString::fromUTF8(id), nullptr, name, error);
+    return U_SUCCESS(error) ? utf8(name) : std::string();
+}
+
+// "/example.org/Tzfile/Europe/Berlin": the longest end that is a name.
+std::unique_ptr<TimeZone> fromPath(const std::string& id) {
+    for (size_t slash = id.find('/'); slash != std::string::npos; slash = id.find('/', slash + 1)) {
+        const std::string end = id.substr(slash + 1);
+        if (end.find('/') == std::string::npos) return nullptr;
+        if (auto zone = ofDatabase(end)) return zone;
+    }
+    return nullptr;
+}
+
+// A zone of the database that has the same offset on every day around now, so that a series goes on with it.
+std::string nameLike(const FileZone& wanted) {
+    constexpr int64_t kDaySec = 86400;
+    constexpr int kDays = 2 * 366;
+    const int64_t first = static_cast<int64_t>(ucal_getNow() / kMsPerSecond) - kDays / 2 * kDaySec;
+    std::vector<int> offsets;
+    for (int day = 0; day < kDays; ++day) offsets.push_back(wanted.offsetOfUtc(first + day * kDaySec));
+    UErrorCode error = U_ZERO_ERROR;
+    const std::unique_ptr<icu::StringEnumeration> names(icu::TimeZone::createTimeZoneIDEnumeration(
+        UCAL_ZONE_TYPE_CANONICAL_LOCATION, nullptr, nullptr, error));
+    while (U_SUCCESS(error)) {
+        const icu::UnicodeString* name = names->snext(error);
+        if (name == nullptr) break;
+        const std::unique_ptr<TimeZone> zone = ofDatabase(utf8(*name));
+        bool isLike = zone != nullptr;
+        for (int day = 0; isLike && day < kDays; ++day) {
+            const int64_t at = first + day * kDaySec;
+            isLike = zone->toWall(at) - at == offsets[static_cast<size_t>(day)];
+        }
+        if (isLike) return utf8(*name);
+    }
+    return {};
+}
+
+std::unique_ptr<TimeZone> ofFile(const std::string& component) {
+    FileZone zone(component);
+    if (!zone) return nullptr;
+    std::string name = nameLike(zone);
+    return std::make_unique<TimeZone>(std::move(zone), std::move(name));
+}
+
+std::string machineZone() {
+    const std::unique_ptr<icu::TimeZone> zone(icu::TimeZone::createDefault());
+    icu::UnicodeString id;
+    return utf8(zone->getID(id));
+}
+
+}  // namespace
+
+TimeZone::TimeZone(std::unique_ptr<icu::BasicTimeZone> zone, std::string name)
+    : mZone(std::move(zone)), mName(std::move(name)) {}
+
+TimeZone::TimeZone(FileZone zone, std::string name) : mFileZone(std::move(zone)), mName(std::move(name)) {}
+
+int64_t TimeZone::toUtc(int64_t wallSec) const {
+    if (mFileZone) return wallSec - mFileZone.offsetOfWall(wallSec);
+    int32_t raw = 0;
+    int32_t saving = 0;
+    UErrorCode error = U_ZERO_ERROR;
+    mZone->getOffsetFromLocal(static_cast<double>(wallSec) * kMsPerSecond, UCAL_TZ_LOCAL_FORMER,
+                              UCAL_TZ_LOCAL_FORMER, raw, saving, error);
+    return U_SUCCESS(error) ? wallSec - (raw + saving) / static_cast<int>(kMsPerSecond) : wallSec;
+}
+
+int64_t TimeZone::toWall(int64_t utcSec) const {
+    if (mFileZone) return utcSec + mFileZone.offsetOfUtc(utcSec);
+    int32_t raw = 0;
+    int32_t saving = 0;
+    UErrorCode error = U_ZERO_ERROR;
+    mZone->getOffset(static_cast<double>(utcSec) * kMsPerSecond, /*local=*/0, raw, saving, error);
+    return U_SUCCESS(error) ? utcSec + (raw + saving) / static_cast<int>(kMsPerSecond) : utcSec;
+}
+
+std::string TimeZone::component(int64_t sinceSec) const {
+    const std::unique_ptr<icu::VTimeZone> zone(
+        icu::VTimeZone::createVTimeZoneByID(icu::UnicodeString::fromUTF8(mName)));
+    if (zone == nullptr) return {};
+    UErrorCode error = U_ZERO_ERROR;
+    icu::UnicodeString text;
+    zone->write(static_cast<double>(sinceSec) * kMsPerSecond - kMsPerYear, text, error);
+    return U_SUCCESS(error) ? utf8(text) : std::string();
+}
+
+TimeZones::TimeZones(const std::string& floating) {
+    mpFloating = find(floating.empty() ? machineZone() : floating);
+    if (mpFloating == nullptr && !floating.empty())
+        throw Misuse("\"" + floating + "\" is no time zone as Europe/Berlin");
+    if (mpFloating == nullptr) mpFloating = find("UTC");
+    if (mpFloating == nullptr) throw Failure("the time zone database cannot be read; check the ICU library");
+}
+
+void TimeZones::define(const std::string& id, std::string component, const std::string& location) {
+    if (mDefinitions.size() >= kMostDefinitions || component.size() > kMostDefinitionBytes) return;
+    mDefinitions[id] = {std::move(component), location};
+}
+
+std::unique_ptr<TimeZone> TimeZones::make(const std::string& id) {
+    if (auto zone = ofDatabase(id)) return zone;
+    if (auto zone = ofDatabase(databaseNameOf(id))) return zone;
+    const auto definition = mDefinitions.find(id);
+    if (definition != mDefinitions.end()) {
+        if (auto zone = ofDatabase(definition->second.location)) return zone;
+    }
+    if (auto zone = fromPath(id)) return zone;
+    return definition != mDefinitions.end() ? ofFile(definition->second.component) : nullptr;
+}
+
+const TimeZone* TimeZones::find(const std::string& id) {
+    const auto known = mZones.find(id);
+    // One that was not known may have been defined since; what is known stays as it is.
+    if (known != mZones.end() && (known->second != nullptr || !mDefinitions.contains(id)))
+        return known->second.get();
+    return (mZones[id] = make(id)).get();
+}
+
+}  // namespace exchange

@@ -69,6 +69,10 @@ CalCurl::CalCurl(Account* account, IProgressObserver* observer, std::shared_ptr<
     mpTransport->setTimeout(kTimeoutSeconds);
 }
 
+void CalCurl::setTimeout(long seconds) {
+    mpTransport->setTimeout(seconds);
+}
+
 bool CalCurl::isAskedToWait() const {
     return mpAccount->retryGate(VANTOR_PIM_SYNC_TYPE_CALENDAR).isAskedToWait();
 }

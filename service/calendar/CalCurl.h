@@ -13,6 +13,9 @@ class CalCurl {
 public:
     CalCurl(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share = nullptr);
 
+    // How long one attempt may take; a minute unless told otherwise.
+    void setTimeout(long seconds);
+
     // `response` may be NULL for each; otherwise it is replaced by the reply's body.
     [[nodiscard]] int insert(const std::string& calendarId, const std::string& body, std::string* response);
     [[nodiscard]] int update(const std::string& calendarId, const std::string& eventId,

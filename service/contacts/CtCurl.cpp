@@ -28,7 +28,6 @@ using sync_result::kTransferTimeout;
 
 namespace {
 
-constexpr long kTimeoutSeconds = 30;
 constexpr int kMaxAttempts = 3;
 constexpr int kTimedOut = -2;
 constexpr size_t kLogSlice = 900;
@@ -139,7 +138,7 @@ bool CtCurl::isAskedToWait() const {
 
 HttpTransfer CtCurl::makeTransfer(const std::string& url, const char* method, Access access) {
     HttpTransfer transfer{
-        .url = url, .method = method, .timeout = kTimeoutSeconds, .observer = mpObserver, .share = mpShare};
+        .url = url, .method = method, .timeout = mTimeout, .observer = mpObserver, .share = mpShare};
     if (access == Access::kAccount) transfer.headers.emplace_back(kVersionHeader);
     return transfer;
 }
@@ -367,7 +366,7 @@ int CtCurl::renewToken() {
 
 int CtCurl::getAnotherAccessToken(std::string* token) {
     std::string response;
-    if (requestAccessToken(*mpAccount, mpObserver, mpShare, kTimeoutSeconds, &response) != kOk) {
+    if (requestAccessToken(*mpAccount, mpObserver, mpShare, mTimeout, &response) != kOk) {
         SYNC_ERR("getAccessToken fail");
         return kFailed;
     }

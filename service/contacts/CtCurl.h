@@ -21,6 +21,9 @@ public:
     // Nothing is owned; the observer and the share may be NULL.
     CtCurl(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share);
 
+    // How long one attempt may take.
+    void setTimeout(long seconds) { mTimeout = seconds; }
+
     // Where the contacts and the people service live, as the account and the settings say now: they may change while the
     // client lives. Without a trailing slash.
     [[nodiscard]] std::string feedBase() const;
@@ -80,6 +83,7 @@ private:
     std::shared_ptr<HttpShare> mpShare;
     std::string mUsedToken;
     long mHttpStatus = 0;
+    long mTimeout = 30;  // seconds
 };
 
 // The URL with its size parameter set to 720.

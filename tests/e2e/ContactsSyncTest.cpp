@@ -147,6 +147,7 @@ TEST_F(Contacts, AccountsWithTheSameSystemGroupsStayApart) {
          {"gContact$groupMembershipInfo", {{{"href", "/m8/feeds/groups/default/base/starred"}}}}});
     ASSERT_EQ(mPair.sync(2).status, 0);
     mPair.expectSameContacts(2);
+    mPair.expectQuiet(1);
     run({"account", "remove", "2"});
     EXPECT_EQ(mPair.device.json({"contacts", "list", "--account", "2"}).size(), 0U);
     expectSameAndQuiet();

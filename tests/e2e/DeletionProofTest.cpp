@@ -88,6 +88,12 @@ protected:
         if (!token.empty() && !isFeed) reply["nextPageToken"] = token;
         return reply;
     }
+    // The same with an item that nobody can read.
+    Json unreadablePage(size_t count) {
+        Json reply = page(count);
+        (reply.contains("feed") ? reply["feed"]["entry"] : reply["items"]).push_back(Json::object());
+        return reply;
+    }
     // The next reads of the list are answered so; or, with a token, those of the page that it stands for.
     void answer(const std::string& token, const Json& body, int count = 1) {
         std::string path = mPath.substr(0, mPath.find('?'));
@@ -117,6 +123,19 @@ TEST_P(DeletionProof, OnlyAListThatWasReadToItsEndOrTwiceDeletes) {
     };
     const Row rows[] = {{"empty once", [&] { answer("", page(0)); }, 0},
                         {"shrunken once", [&] { answer("", page(1)); }, 0},
+                        {"an item that cannot be read", [&] { answer("", unreadablePage(1)); }, 0},
+                        {"an item that cannot be read at the second look",
+                         [&] {
+                             answer("", page(1));
+                             answer("", unreadablePage(0));
+                         },
+                         0},
+                        {"the second look fails",
+                         [&] {
+                             answer("", page(1));
+                             answer("", nullptr);
+                         },
+                         1},
                         {"the next page fails",
                          [&] {
                              answer("77", nullptr);

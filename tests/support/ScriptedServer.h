@@ -4,6 +4,7 @@
 #include <httplib.h>
 
 #include <atomic>
+#include <chrono>
 #include <string>
 #include <thread>
 
@@ -19,6 +20,7 @@ public:
         mServer.set_pre_routing_handler([this](const httplib::Request& request, httplib::Response& response) {
             if (request.path == "/o/oauth2/token") return httplib::Server::HandlerResponse::Unhandled;
             ++requests;
+            std::this_thread::sleep_for(std::chrono::milliseconds(delayMs));
             lastPath = request.target;
             lastMethod = request.method;
             lastHeaders = request.headers;
@@ -45,6 +47,7 @@ public:
 
     std::atomic<int> requests{0};
     std::atomic<int> refreshes{0};
+    std::atomic<int> delayMs{0};
     int status = 200;
     std::string body = "{}";
     std::string contentType = "application/json";

@@ -91,6 +91,19 @@ TEST(CalCurl, GivesUpInItsOwnTime) {
     }
 }
 
+TEST(CalCurl, AWriteThatIsNotAnsweredInTimeGoesOutOnce) {
+    Client client;
+    client.account.setAccessToken("good");
+    client.curl.setTimeout(1);
+    client.server.delayMs = 1200;
+    int sent = 0;
+    for (int (CalCurl::*insert)(const std::string&, const std::string&, std::string*) :
+         {&CalCurl::insert, &CalCurl::insertTodo}) {
+        EXPECT_NE((client.curl.*insert)("c", "{}", &client.reply), kOk);
+        EXPECT_EQ(client.server.requests, ++sent);
+    }
+}
+
 TEST(CalCurl, TwoWorkersOfOneAccountRefreshOnce) {
     Client client;
     std::vector<std::thread> workers;

@@ -67,6 +67,21 @@ TEST(CalItemWriter, AnEditThatTheSyncHasNotSeenWinsAndTheRowTakesTheEtag) {
     EXPECT_EQ(device.row("a").dirty, 1) << "the edit must still be found";
 }
 
+TEST(CalItemWriter, ASeriesWaitsUntilTheEditOfItsInstanceWasSeen) {
+    CalendarFixture device;
+    device.download({{series("s", "1"), instance("s", 3, "1")}});
+    ASSERT_EQ(device.manager.setCalendarbookChanged(device.book.calendar_id), 0);
+    device.userSets(instanceUid(3), kSummary, "mine");
+
+    device.download({{series("s", "2"), instance("s", 3, "1")}});
+
+    EXPECT_THAT(device.summaries(), ElementsAre("mine", "s 1"));
+    ASSERT_EQ(device.manager.setCalendarbookChanged(device.book.calendar_id), 0);
+    EXPECT_EQ(instanceRow(device, 3).dirty, 1) << "the edit must still be found";
+    device.download({{series("s", "2"), instance("s", 3, "1")}});
+    EXPECT_THAT(device.summaries(), ElementsAre("mine", "s 2"));
+}
+
 TEST(CalItemWriter, AChangeThatCannotBeMarkedIsSeenAgain) {
     CalendarFixture device;
     device.download({{event("a", "1"), event("b", "1"), event("c", "1")}});

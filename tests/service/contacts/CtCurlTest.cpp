@@ -73,6 +73,18 @@ TEST(CtCurl, RenewsTheTokenOnceAndSendsTheServicesHeaders) {
     EXPECT_EQ(client.server.requests, before) << "nor with one that would begin a header of its own";
 }
 
+TEST(CtCurl, ANewItemThatIsNotAnsweredInTimeGoesOutOnce) {
+    Client client;
+    client.account.setAccessToken("good");
+    client.curl.setTimeout(1);
+    client.server.delayMs = 1200;
+    int sent = 0;
+    for (const CtItemType type : {CtItemType::kContact, CtItemType::kGroup}) {
+        EXPECT_EQ(client.curl.insert(type, "<x/>", &client.reply), kFailed);
+        EXPECT_EQ(client.server.requests, ++sent);
+    }
+}
+
 TEST(CtCurl, WhatAnAnswerMeans) {
     struct Case {
         int status;

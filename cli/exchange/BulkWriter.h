@@ -1,5 +1,5 @@
-// BulkWriter.h: writes new records some hundred at a time, each lot in one transaction. A record that the store refuses is left out
-// and told of; what was written before a failure of the store itself stays, and is counted.
+// BulkWriter.h: writes new records some hundred at a time, each lot in one transaction. A record that the store
+// refuses is left out and told of; what was written before a failure of the store itself stays, and is counted.
 #pragma once
 
 #include <functional>

@@ -17,8 +17,8 @@ public:
     // The calendar store must be open.
     CalendarImport(const ImportOptions& options, ImportReport& report);
 
-    // Reads the whole file, then writes: a series and its instances may stand anywhere in it. A Failure when the file or the store
-    // fails; the report then tells what was done.
+    // Reads the whole file, then writes: a series and its instances may stand anywhere in it. A Failure when the file
+    // or the store fails; the report then tells what was done.
     void run(ItemReader& reader);
 
 private:

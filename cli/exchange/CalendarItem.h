@@ -28,7 +28,8 @@ struct CalendarItem {
     Json fields = Json::object();
     // Set for a changed instance, until it has found its series.
     std::optional<calendar_time_s> recurrence;
-    // Of a series: how far its start's wall time is into its day, and in which zone; instances may be named by their date alone.
+    // Of a series: how far its start's wall time is into its day, and in which zone; instances may be named by their
+    // date alone.
     int64_t wallTimeOfDay = 0;
     const TimeZone* zone = nullptr;
     std::vector<Instance> instances;

@@ -64,26 +64,29 @@ CalendarRecords::CalendarRecords(int calendarId) : mCalendarId(calendarId) {
 }
 
 KnownItems CalendarRecords::known() const {
-    std::map<int, std::vector<Json>> instances;
-    std::vector<Json> items;
     const char* view = mHoldsTodos ? _calendar_todo : _calendar_event;
     const unsigned book = mHoldsTodos ? CALENDAR_TODO_BOOK_ID : CALENDAR_EVENT_BOOK_ID;
     const CalendarList list =
         CalendarStore::find(view, {{book, mCalendarId}}, mHoldsTodos ? CALENDAR_TODO_ID : CALENDAR_EVENT_ID,
                             mHoldsTodos ? todo_json::projection() : event_json::projection());
-    record_access::forEach(list, [&](calendar_record_h record) {
-        Json item = mHoldsTodos ? todo_json::compose(record) : event_json::compose(record);
-        const bool isInstance = !mHoldsTodos && !item["originalEvent"].is_null();
-        (isInstance ? instances[item["originalEvent"].get<int>()] : items).push_back(std::move(item));
-    });
+    // Instances may stand before their series.
+    std::map<int, std::vector<Json>> instances;
+    if (!mHoldsTodos) {
+        record_access::forEach(list, [&](calendar_record_h record) {
+            const int series = intOf(record, CALENDAR_EVENT_ORIGINAL_EVENT_ID);
+            if (series != 0) instances[series].push_back(event_json::compose(record));
+        });
+    }
     KnownItems known;
     const char* kind = mHoldsTodos ? "todo" : "event";
-    for (Json& item : items) {
+    record_access::forEach(list, [&](calendar_record_h record) {
+        if (!mHoldsTodos && intOf(record, CALENDAR_EVENT_ORIGINAL_EVENT_ID) != 0) return;
+        Json item = mHoldsTodos ? todo_json::compose(record) : event_json::compose(record);
         const int id = item["id"];
         const std::vector<std::string> uids = {item["uid"], identity::uidOf(kind, id)};
         if (!mHoldsTodos) item = sayWith(std::move(item), std::move(instances[id]));
         known.add(id, uids, identity::digestOf(item), keysOf(item));
-    }
+    });
     return known;
 }
 

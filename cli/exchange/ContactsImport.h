@@ -20,8 +20,8 @@ public:
     // The contacts store must be open. A Failure when the account has no address book that can be written.
     ContactsImport(const ImportOptions& options, ImportReport& report);
 
-    // Writes while it reads, so that photos are not all kept at once. A Failure when the file or the store fails; the report then
-    // tells what was done.
+    // Writes while it reads, so that photos are not all kept at once. A Failure when the file or the store fails; the
+    // report then tells what was done.
     void run(ItemReader& reader);
 
 private:

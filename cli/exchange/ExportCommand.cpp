@@ -74,7 +74,8 @@ std::string uidOf(const char* kind, const Json& item) {
 
 using Series = std::map<int, SeriesPlace>;
 
-// The zones come first in the file, and an instance is named after its series: both are known before the first event is written.
+// The zones come first in the file, and an instance is named after its series: both are known before the first event
+// is written.
 Series lookAhead(const std::vector<CalendarList>& lists, ICalendarWriter& writer) {
     Series series;
     for (const CalendarList& list : lists) {

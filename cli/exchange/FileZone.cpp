@@ -17,8 +17,8 @@ struct ComponentDeleter {
 };
 using Component = std::unique_ptr<icalcomponent, ComponentDeleter>;
 
-// A zone changes some times a year. The library goes through every change since the rule began, so that a rule by the second
-// would keep it busy for hours.
+// A zone changes some times a year. The library goes through every change since the rule began, so that a rule by the
+// second would keep it busy for hours.
 bool isRuleOfZone(icalproperty* property) {
     const icalrecurrencetype rule = icalproperty_get_rrule(property);
     if (rule.freq != ICAL_YEARLY_RECURRENCE || rule.interval < 1) return false;

@@ -1,4 +1,5 @@
-// ICalendarMapping.h: the properties of a calendar file beside the members of the JSON of events and to-dos, for both directions.
+// ICalendarMapping.h: the properties of a calendar file beside the members of the JSON of events and to-dos, for both
+// directions.
 #pragma once
 
 #include <span>

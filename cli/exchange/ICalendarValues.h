@@ -1,4 +1,5 @@
-// ICalendarValues.h: values of calendar files that are more than a text: durations, rules, addresses, days. Pure functions.
+// ICalendarValues.h: values of calendar files that are more than a text: durations, rules, addresses, days. Pure
+// functions.
 #pragma once
 
 #include <cstdint>
@@ -16,8 +17,8 @@ std::optional<int64_t> durationSec(const std::string& text);
 // "-PT15M".
 std::string beforeStart(int64_t minutes);
 
-// The rule as the store has it. A Failure when it is malformed or says more than the store holds. `toUtc` turns a wall time of
-// the series into an instant.
+// The rule as the store has it. A Failure when it is malformed or says more than the store holds. `toUtc` turns a
+// wall time of the series into an instant.
 std::string ruleOf(const std::string& value, const std::function<int64_t(int64_t wallSec)>& toUtc);
 
 // Of an ATTENDEE or ORGANIZER; "" when it has none.

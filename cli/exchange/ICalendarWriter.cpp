@@ -46,7 +46,8 @@ std::string ICalendarWriter::zones() const {
 void ICalendarWriter::addText(const std::string& name, const std::string& text) {
     if (text.empty()) return;
     if (content_line::losesControls(text)) mLosses.add("control characters in texts");
-    add({"", name, {}, content_line::escape(text)});
+    std::string value = content_line::escape(text);
+    if (!value.empty()) add({"", name, {}, std::move(value)});
 }
 
 bool ICalendarWriter::addTime(const char* name, const std::string& time, const std::string& zone) {

@@ -1,4 +1,5 @@
-// ItemReader.h: the items of a file, one at a time: the components of a calendar, or cards. Whatever is broken stays in its item.
+// ItemReader.h: the items of a file, one at a time: the components of a calendar, or cards. Whatever is broken stays
+// in its item.
 #pragma once
 
 #include <string>

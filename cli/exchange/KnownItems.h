@@ -1,5 +1,5 @@
-// KnownItems.h: the items that a calendar or an address book held before an import, and which of them an item of the file is. Each
-// is found once, so that two alike stay two.
+// KnownItems.h: the items that a calendar or an address book held before an import, and which of them an item of the
+// file is. Each is found once, so that two alike stay two.
 #pragma once
 
 #include <set>

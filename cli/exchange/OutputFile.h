@@ -1,4 +1,5 @@
-// OutputFile.h: a file that takes its name only when it is whole. What is exported is private, so nobody else may read it.
+// OutputFile.h: a file that takes its name only when it is whole. What is exported is private, so nobody else may
+// read it.
 #pragma once
 
 #include <string>

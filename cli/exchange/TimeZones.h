@@ -18,13 +18,14 @@ public:
     TimeZone(std::unique_ptr<icu::BasicTimeZone> zone, std::string name);
     TimeZone(FileZone zone, std::string name);
 
-    // As the time zone database has it; "" for a zone of a file that is like none there. A zone of a file is only read with.
+    // As the time zone database has it; "" for a zone of a file that is like none there. A zone of a file is only
+    // read with.
     [[nodiscard]] const std::string& name() const { return mName; }
     // A wall time that is skipped counts with the offset before the gap, one that comes twice is the first.
     [[nodiscard]] int64_t toUtc(int64_t wallSec) const;
     [[nodiscard]] int64_t toWall(int64_t utcSec) const;
-    // Whether the wall time leads back to the same instant.
-    [[nodiscard]] bool holds(int64_t utcSec) const { return toUtc(toWall(utcSec)) == utcSec; }
+    // Whether the wall time means this instant alone. Readers disagree about one that comes twice.
+    [[nodiscard]] bool holds(int64_t utcSec) const;
     // The zone as a component of a calendar file, for times from `sinceSec` on; "" when it cannot be written.
     [[nodiscard]] std::string component(int64_t sinceSec) const;
 
@@ -41,8 +42,8 @@ public:
 
     // The text of a VTIMEZONE component.
     void define(const std::string& id, std::string component, const std::string& location);
-    // The zone behind a TZID: by the database's name, by the name that another system has for it, else as the file defines it.
-    // NULL for one that nobody knows.
+    // The zone behind a TZID: by the database's name, by the name that another system has for it, else as the file
+    // defines it. NULL for one that nobody knows.
     const TimeZone* find(const std::string& id);
     const TimeZone& floating() const { return *mpFloating; }
 

@@ -102,7 +102,8 @@ inline constexpr CompanyText kCompanyTexts[] = {{"TITLE", "title"},
                                                 {"X-VANTOR-ORG-LOCATION", "location"},
                                                 {"X-VANTOR-ORG-SYMBOL", "symbol"}};
 
-// --- messengers: the scheme of IMPP, and the properties that older cards have ---------------------------------------------
+// --- messengers: the scheme of IMPP, and the properties that older cards have
+// ---------------------------------------------
 struct CardMessenger {
     std::string_view scheme;
     std::string_view protocol;
@@ -124,7 +125,8 @@ inline constexpr CardMessenger kMessengers[] = {{"x-vantor-talk", "VANTOR_TALK",
                                                 {"x-im", "other", ""},
                                                 {"im", "other", "", true}};
 
-// --- properties of their own -------------------------------------------------------------------------------------------
+// --- properties of their own
+// -------------------------------------------------------------------------------------------
 inline constexpr std::string_view kLabelProperty = "X-ABLABEL";  // of the property in the same group
 inline constexpr std::string_view kDateProperty =
     "X-ABDATE";  // any date but the first birthday and anniversary

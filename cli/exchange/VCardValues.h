@@ -1,4 +1,5 @@
-// VCardValues.h: values of cards that are more than a text: encodings, types, dates, images, messengers. Pure functions.
+// VCardValues.h: values of cards that are more than a text: encodings, types, dates, images, messengers. Pure
+// functions.
 #pragma once
 
 #include <optional>
@@ -15,7 +16,8 @@ bool decode(ContentLine& line);
 
 // The words of TYPE, in capitals.
 std::vector<std::string> typesOf(const ContentLine& line);
-// A label that an address book of another maker brings with it ("_$!<Home>!$_"), without its frame; "" for a label of the user's.
+// A label that an address book of another maker brings with it ("_$!<Home>!$_"), without its frame; "" for a label of
+// the user's.
 std::string commonLabel(const std::string& label);
 // The parts of a list as one text.
 std::string joined(std::string_view list, std::string_view joint);

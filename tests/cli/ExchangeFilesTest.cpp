@@ -78,7 +78,8 @@ const std::vector<Sample>& eventSamples() {
                "uuid:1\n"
                "ATTENDEE;EMAIL=b@example.com:urn:uuid:2\n"),
          R"({"organizer": {"name": "Doe, J", "email": "j+d@example.com"},
-             "attendees": [{"name": "", "email": "a@example.com", "status": "needsAction"}, {"name": "", "email": "b@example.com", "status": "needsAction"}]})",
+             "attendees": [{"name": "", "email": "a@example.com", "status": "needsAction"}, {"name": "",
+             "email": "b@example.com", "status": "needsAction"}]})",
          {{"ATTENDEE (without an e-mail address)", 1}, {"ATTENDEE;PARTSTAT", 1}, {"ATTENDEE;ROLE", 1}}},
         {"alarms",
          event("DTSTART:20260701T080000Z\nDTEND:20260701T090000Z\n"
@@ -122,10 +123,14 @@ const std::vector<Sample>& cardSamples() {
               "Doe\nTEL;TYPE=HOME,VOICE,pref:1\nTEL;TYPE=cell;TYPE=work:2\nEMAIL;TYPE=INTERNET,PREF:a@b\n"
               "ADR;TYPE=home:;;A;;;;\nADR:;;;;;;\nORG:O;D;E\nTITLE:t\nBDAY;VALUE=date:1990-02-28T00:00:"
               "00Z\nPHOTO;ENCODING=b;TYPE=JPEG:/9j/\nX-SKYPE:s\nURL:http\\://u\n"),
-         R"({"name": {"first": "John", "middle": "Philip, Paul", "last": "Doe", "prefix": "", "suffix": "", "phoneticFirst": "", "phoneticMiddle": "", "phoneticLast": ""},
-             "phones": [{"value": "1", "type": "home", "label": "", "primary": true}, {"value": "2", "type": "work_mobile", "label": "", "primary": false}],
-             "companies": [{"name": "O", "title": "t", "department": "D, E", "description": "", "location": "", "symbol": "", "type": "other", "label": ""}],
-             "messengers": [{"value": "s", "protocol": "SKYPE", "label": ""}], "urls": [{"value": "http://u", "type": "other", "label": ""}],
+         R"({"name": {"first": "John", "middle": "Philip, Paul", "last": "Doe", "prefix": "", "suffix": "",
+             "phoneticFirst": "", "phoneticMiddle": "", "phoneticLast": ""},
+             "phones": [{"value": "1", "type": "home", "label": "", "primary": true}, {"value": "2",
+             "type": "work_mobile", "label": "", "primary": false}],
+             "companies": [{"name": "O", "title": "t", "department": "D, E", "description": "", "location": "",
+             "symbol": "", "type": "other", "label": ""}],
+             "messengers": [{"value": "s", "protocol": "SKYPE", "label": ""}], "urls": [{"value": "http://u",
+             "type": "other", "label": ""}],
              "events": [{"date": "1990-02-28", "type": "birthday", "label": ""}], "photo": true})",
          {{"EMAIL;PREF", 1}}},
         {"labels of another maker",
@@ -135,9 +140,12 @@ const std::vector<Sample>& cardSamples() {
               "\n"
               "item5.URL:u\nitem5.X-ABLabel:_$!<HomePage>!$_\nBDAY;X-APPLE-OMIT-YEAR=1604:1604-02-03\nIMPP;X-"
               "SERVICE-TYPE=Jabber:x-apple:j@k\n"),
-         R"({"phones": [{"value": "1", "type": "work", "label": "", "primary": false}, {"value": "2", "type": "custom", "label": "Boat", "primary": false}],
-             "relations": [{"name": "S", "type": "sister", "label": ""}], "events": [{"date": "2015-05-01", "type": "anniversary", "label": ""}],
-             "urls": [{"value": "u", "type": "custom", "label": "HomePage"}], "messengers": [{"value": "j@k", "protocol": "JABBER", "label": ""}]})",
+         R"({"phones": [{"value": "1", "type": "work", "label": "", "primary": false}, {"value": "2",
+             "type": "custom", "label": "Boat", "primary": false}],
+             "relations": [{"name": "S", "type": "sister", "label": ""}], "events": [{"date": "2015-05-01",
+             "type": "anniversary", "label": ""}],
+             "urls": [{"value": "u", "type": "custom", "label": "HomePage"}], "messengers": [{"value": "j@k",
+             "protocol": "JABBER", "label": ""}]})",
          {{"BDAY (no whole date)", 1}}},
         {"2.1",
          "BEGIN:VCARD\r\nVERSION:2.1\r\nN;CHARSET=ISO-8859-1;ENCODING=QUOTED-PRINTABLE:D=F6e;J=\r\n="
@@ -152,7 +160,8 @@ const std::vector<Sample>& cardSamples() {
          "RELATED;TYPE=friend:urn:uuid:1\nIMPP:sip:s@t\nANNIVERSARY:--0501\nPHOTO:https://p.example/"
          "x.jpg\nGENDER:F\nKIND:individual\nEND:VCARD\n",
          R"({"nickname": "a, b", "phones": [{"value": "+1-2", "type": "home", "label": "", "primary": false}],
-             "relations": [{"name": "R", "type": "custom", "label": "colleague"}], "messengers": [{"value": "s@t", "protocol": "custom", "label": "sip"}]})",
+             "relations": [{"name": "R", "type": "custom", "label": "colleague"}], "messengers": [{"value": "s@t",
+             "protocol": "custom", "label": "sip"}]})",
          {{"ANNIVERSARY (no whole date)", 1},
           {"GENDER", 1},
           {"PHOTO (a link)", 1},

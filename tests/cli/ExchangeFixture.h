@@ -1,4 +1,5 @@
-// ExchangeFixture: a device with two calendars, two task lists and two address books, to go from one to the other through a file.
+// ExchangeFixture: a device with two calendars, two task lists and two address books, to go from one to the other
+// through a file.
 #pragma once
 
 #include <gtest/gtest.h>

@@ -1,4 +1,5 @@
-// What is imported on the device goes up by itself, once, and a second import of the same file adds nothing on either side.
+// What is imported on the device goes up by itself, once, and a second import of the same file adds nothing on either
+// side.
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 

@@ -119,7 +119,12 @@ async function remove() {
 // What is behind the form is as new as what was saved when the form goes.
 async function finish(text) {
     await refresh().catch(() => {});
+    const id = open?.item?.id ?? "";
     close();
+    // The row from which the form was opened may be another element by now.
+    if (document.activeElement === document.body) {
+        document.querySelector(`li[data-id="${CSS.escape(id)}"] button`)?.focus();
+    }
     toast(text);
 }
 

@@ -20,7 +20,7 @@ export class Listing {
         this.shownPath = null;
         this.filter = el("input", {type: "search", "aria-label": `Find ${noun[1]}`, placeholder: "Find …",
             oninput: () => this.#typed()});
-        this.order = el("select", {"aria-label": "Order", onchange: () => this.#restart()},
+        this.order = el("select", {"aria-label": "Order", onchange: () => this.#look(0)},
             el("option", {value: "changed"}, "Last changed first"), el("option", {value: "place"}, placeOrder));
         this.count = el("p", {class: "count quiet", role: "status"});
         this.list = el("ul", {class: "rows"});
@@ -32,15 +32,15 @@ export class Listing {
 
     #typed() {
         clearTimeout(this.typing);
-        this.typing = setTimeout(() => this.#restart(), TYPING_PAUSE_MS);
+        this.typing = setTimeout(() => this.#look(0), TYPING_PAUSE_MS);
     }
-    #restart() {
-        this.offset = 0;
-        return this.refresh();
+    // Without an answer the list stays as it is; the page tells of a lost connection and looks again.
+    #look(offset) {
+        this.offset = offset;
+        return this.refresh().catch(console.error);
     }
     async #turn(pages) {
-        this.offset = Math.max(0, this.offset + pages * PAGE_SIZE);
-        await this.refresh();
+        await this.#look(Math.max(0, this.offset + pages * PAGE_SIZE));
         this.list.scrollIntoView({block: "nearest"});
     }
 
@@ -71,7 +71,8 @@ export class Listing {
     // same question was asked last is marked.
     #show(reply, address) {
         const isSameList = address === this.shownAddress;
-        const focused = document.activeElement?.closest("li")?.dataset.id;
+        const active = document.activeElement;
+        const focused = this.list.contains(active) ? active.closest("li").dataset.id : null;
         const before = this.shown;
         this.shown = new Map();
         for (const item of reply.items) {
@@ -92,8 +93,8 @@ export class Listing {
             elements.every((element, i) => element === this.list.children[i]);
         if (!isSame) {
             this.list.replaceChildren(...elements);
-            if (focused !== undefined) {
-                elements.find((element) => element.dataset.id === focused)?.querySelector("button")?.focus();
+            if (focused !== null) {
+                elements.find((element) => element.dataset.id === focused)?.querySelector(active.tagName)?.focus();
             }
         }
         this.#tell(reply);

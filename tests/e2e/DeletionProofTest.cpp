@@ -77,7 +77,7 @@ protected:
     Json page(size_t count, const std::string& token = "") {
         Json reply = mReply;
         const bool isFeed = reply.contains("feed");
-        Json& items = isFeed ? reply["feed"]["entry"] : reply["items"];
+        Json& items = itemsOf(reply);
         EXPECT_GT(items.size(), count);
         items.erase(items.begin(), items.end() - static_cast<int>(count));
         reply.erase("nextPageToken");
@@ -88,11 +88,8 @@ protected:
         if (!token.empty() && !isFeed) reply["nextPageToken"] = token;
         return reply;
     }
-    // The same with an item that nobody can read.
-    Json unreadablePage(size_t count) {
-        Json reply = page(count);
-        (reply.contains("feed") ? reply["feed"]["entry"] : reply["items"]).push_back(Json::object());
-        return reply;
+    static Json& itemsOf(Json& reply) {
+        return reply.contains("feed") ? reply["feed"]["entry"] : reply["items"];
     }
     // The next reads of the list are answered so; or, with a token, those of the page that it stands for.
     void answer(const std::string& token, const Json& body, int count = 1) {
@@ -123,11 +120,19 @@ TEST_P(DeletionProof, OnlyAListThatWasReadToItsEndOrTwiceDeletes) {
     };
     const Row rows[] = {{"empty once", [&] { answer("", page(0)); }, 0},
                         {"shrunken once", [&] { answer("", page(1)); }, 0},
-                        {"an item that cannot be read", [&] { answer("", unreadablePage(1)); }, 0},
-                        {"an item that cannot be read at the second look",
+                        {"one item cannot be read",
                          [&] {
+                             Json reply = mReply;
+                             itemsOf(reply).back() = Json::object();
+                             answer("", reply);
+                         },
+                         0},
+                        {"an item of the second look cannot be read",
+                         [&] {
+                             Json reply = page(0);
+                             itemsOf(reply).push_back(Json::object());
                              answer("", page(1));
-                             answer("", unreadablePage(0));
+                             answer("", reply);
                          },
                          0},
                         {"the second look fails",

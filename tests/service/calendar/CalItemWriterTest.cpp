@@ -251,6 +251,18 @@ TEST(CalItemWriter, OnlyProofDeletes) {
     }
 }
 
+TEST(CalItemWriter, AnEditBetweenTheListAndTheDeletionKeepsItsEvent) {
+    CalendarFixture device;
+    device.download({{event("a", "1"), event("b", "1")}});
+    CalItemStore* store = device.manager.prepared();
+    CalBookSnapshot snapshot(device.manager.kind());
+    ASSERT_EQ(snapshot.load(*store, device.book), 0);
+    CalItemWriter writer(store, &snapshot);
+    device.userSets("a", kSummary, "mine");
+    EXPECT_EQ(writer.deleteUnlisted(), 0);
+    EXPECT_THAT(device.summaries(), ElementsAre("mine"));
+}
+
 TEST(CalItemWriter, AnUnlistedEventWithALocalChangeStaysUntilItWasSent) {
     CalendarFixture device;
     device.download({{event("a", "1"), event("b", "1")}});

@@ -94,6 +94,21 @@ TEST_F(ContactSync, AGroupThatIsRenamedWhileItsPageComesKeepsNothingBack) {
     expectQuiet();
 }
 
+TEST_F(ContactSync, AnEditAfterTheWalkAndBeforeTheContactsWins) {
+    mServer.put("contacts", "a", named("a"));
+    sync();
+    mServer.put("contacts", "a", named("the server's"));
+    mServer.onGroupsRead = [&] {
+        const auto device = deviceContacts();
+        if (device.contains("a")) rename(device.at("a"), "mine");
+    };
+    ASSERT_EQ(mDown.run(), kOk);
+    mServer.onGroupsRead = nullptr;
+    EXPECT_EQ(deviceNames(), std::set<std::string>{"mine"});
+    sync();
+    EXPECT_EQ(serverNames(), std::set<std::string>{"mine"});
+}
+
 TEST_F(ContactSync, AContactWaitsForAGroupThatIsRefused) {
     const int group = addGroup(mBook, "Choir");
     add("member", group);

@@ -1,6 +1,6 @@
 // What the test drives: a provider, a device with the daemon, and the page in a browser.
 import {execFileSync, spawn} from "node:child_process";
-import {writeFileSync} from "node:fs";
+import {rmSync, writeFileSync} from "node:fs";
 import {createInterface} from "node:readline";
 import {chromium} from "playwright-core";
 
@@ -18,8 +18,15 @@ export class Provider {
     async start() {
         const args = ["--quiet", "--port", this.port, "--seed", this.seed, "--state", `${ROOT}/${this.name}.state`];
         this.process = spawn(`${BIN}/vantor-pim-provider`, args, {stdio: ["ignore", "pipe", "inherit"]});
-        writeFileSync(`${ROOT}/${this.name}.pid`, String(this.process.pid));
-        this.ended = new Promise((resolve) => { this.process.once("exit", resolve); });
+        // Only as long as it runs: another process may get the number afterwards.
+        const pidFile = `${ROOT}/${this.name}.pid`;
+        writeFileSync(pidFile, String(this.process.pid));
+        this.ended = new Promise((resolve) => {
+            this.process.once("exit", (status) => {
+                rmSync(pidFile, {force: true});
+                resolve(status);
+            });
+        });
         for await (const line of createInterface({input: this.process.stdout})) {
             this.ready = JSON.parse(line);
             break;

@@ -3,12 +3,6 @@
 
 #include <string>
 
-namespace photo_file {
-
-inline constexpr size_t kMostBytes = size_t{32} * 1024 * 1024;  // what the store takes
-
-}  // namespace photo_file
-
 // A copy of a photo below the root, where the store can take it; it goes with the object.
 class StagedPhoto {
 public:
@@ -33,6 +27,8 @@ private:
 };
 
 namespace photo_file {
+
+inline constexpr size_t kMostBytes = size_t{32} * 1024 * 1024;  // what the store takes
 
 // The image at `source`, a path of this machine.
 std::string read(const std::string& source);

@@ -64,9 +64,8 @@ constexpr const WordRow* rowOfValue(std::span<const WordRow> rows, std::string_v
 }
 
 // Bookkeeping of whoever wrote the file; nobody misses it.
-inline constexpr std::string_view kSilent[] = {"UID",           "DTSTAMP",    "CREATED", "LAST-MODIFIED",
-                                               "SEQUENCE",      "END",        "BEGIN",   "X-MOZ-GENERATION",
-                                               "X-MOZ-LASTACK", "X-LIC-ERROR"};
+inline constexpr std::string_view kSilent[] = {"UID",      "DTSTAMP", "CREATED",          "LAST-MODIFIED",
+                                               "SEQUENCE", "END",     "X-MOZ-GENERATION", "X-MOZ-LASTACK"};
 
 // The zone of an event that its times cannot name (an all-day event, an hour that comes twice).
 inline constexpr std::string_view kZoneProperty = "X-VANTOR-TIME-ZONE";

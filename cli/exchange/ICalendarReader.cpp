@@ -204,32 +204,49 @@ void ICalendarReader::readEvent(const Parts& parts, CalendarItem& item) {
 }
 
 bool ICalendarReader::readEventLine(const ContentLine& line, Frame& frame, CalendarItem& item) {
-    if (line.name == "DTSTART") {
-        frame.start = readTime(line, line.value);
-    } else if (line.name == "DTEND") {
-        frame.end = readTime(line, line.value);
-    } else if (line.name == "DURATION") {
-        frame.durationSec = ical_values::durationSec(line.value);
-        if (!frame.durationSec) throw Failure("its DURATION cannot be read");
-    } else if (line.name == "RRULE") {
-        if (frame.rule != nullptr) throw Failure("it has more than one rule (RRULE); a series holds one");
-        frame.rule = &line;
-    } else if (line.name == "EXDATE") {
-        frame.exdates.push_back(&line);
-    } else if (line.name == "RECURRENCE-ID") {
-        if (!line.parameter("RANGE").empty())
-            mpLosses->add("RECURRENCE-ID;RANGE (only the one instance is changed)");
-        item.recurrence = readTime(line, line.value).time;
-    } else if (line.name == "ORGANIZER") {
-        item.fields["organizer"] = {{"name", line.parameter("CN")}, {"email", ical_values::emailOf(line)}};
-    } else if (line.name == "ATTENDEE") {
-        readAttendee(line, item);
-    } else if (line.name == kZoneProperty) {
-        frame.zoneName = content_line::unescape(line.value);
-    } else {
-        return false;
+    struct Row {
+        std::string_view property;
+        void (*read)(ICalendarReader& self, const ContentLine& line, Frame& frame, CalendarItem& item);
+    };
+    using Self = ICalendarReader;
+    using Line = ContentLine;
+    static constexpr Row kRows[] = {
+        {"DTSTART", [](Self& self, const Line& text, Frame& to,
+                       CalendarItem&) { to.start = self.readTime(text, text.value); }},
+        {"DTEND", [](Self& self, const Line& text, Frame& to,
+                     CalendarItem&) { to.end = self.readTime(text, text.value); }},
+        {"DURATION",
+         [](Self&, const Line& text, Frame& to, CalendarItem&) {
+             to.durationSec = ical_values::durationSec(text.value);
+             if (!to.durationSec) throw Failure("its DURATION cannot be read");
+         }},
+        {"RRULE",
+         [](Self&, const Line& text, Frame& to, CalendarItem&) {
+             if (to.rule != nullptr) throw Failure("it has more than one rule (RRULE); a series holds one");
+             to.rule = &text;
+         }},
+        {"EXDATE", [](Self&, const Line& text, Frame& to, CalendarItem&) { to.exdates.push_back(&text); }},
+        {"RECURRENCE-ID",
+         [](Self& self, const Line& text, Frame&, CalendarItem& to) {
+             if (!text.parameter("RANGE").empty())
+                 self.mpLosses->add("RECURRENCE-ID;RANGE (only the one instance is changed)");
+             to.recurrence = self.readTime(text, text.value).time;
+         }},
+        {"ORGANIZER",
+         [](Self&, const Line& text, Frame&, CalendarItem& to) {
+             to.fields["organizer"] = {{"name", text.parameter("CN")}, {"email", ical_values::emailOf(text)}};
+         }},
+        {"ATTENDEE",
+         [](Self& self, const Line& text, Frame&, CalendarItem& to) { self.readAttendee(text, to); }},
+        {kZoneProperty, [](Self&, const Line& text, Frame& to,
+                           CalendarItem&) { to.zoneName = content_line::unescape(text.value); }},
+    };
+    for (const Row& row : kRows) {
+        if (row.property != line.name) continue;
+        row.read(*this, line, frame, item);
+        return true;
     }
-    return true;
+    return false;
 }
 
 void ICalendarReader::setTimes(const Frame& frame, CalendarItem& item) {

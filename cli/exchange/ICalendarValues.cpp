@@ -14,6 +14,7 @@ namespace exchange::ical_values {
 namespace {
 
 constexpr size_t kMostValueBytes = 1024;
+constexpr size_t kMostShownBytes = 80;
 constexpr std::string_view kMailto = "MAILTO:";
 constexpr std::string_view kUntil = "UNTIL=";
 constexpr int kMinutesPerDay = 1440;
@@ -78,7 +79,7 @@ std::string ruleOf(const std::string& value, const std::function<int64_t(int64_t
     if (rrule_text::parse(withInstant(content_line::upper(value), toUtc), &fields, &reason))
         return rrule_text::compose(fields);
     const std::string rule = normalised(content_line::upper(value));
-    if (rule.empty()) throw Failure("its rule (RRULE) cannot be read");
+    if (rule.empty()) throw Failure("its rule (RRULE) cannot be read: " + value.substr(0, kMostShownBytes));
     if (!rrule_text::parse(withInstant(rule, toUtc), &fields, &reason))
         throw Failure("its rule (RRULE): " + reason);
     return rrule_text::compose(fields);

@@ -2,17 +2,12 @@
 
 #include <unicode/strenum.h>
 #include <unicode/ucal.h>
-#include <unicode/vtzone.h>
 
-#include <algorithm>
-#include <array>
-#include <cstdio>
-#include <cstdlib>
 #include <vector>
 
 #include "EventFields.h"
 #include "Failure.h"
-#include "TimeText.h"
+#include "exchange/ZoneComponent.h"
 
 namespace exchange {
 
@@ -86,54 +81,6 @@ std::unique_ptr<TimeZone> ofFile(const std::string& component) {
     return std::make_unique<TimeZone>(std::move(zone), std::move(name));
 }
 
-// Seconds of "+0130" or "+013000".
-int64_t offsetSec(const std::string& text) {
-    const std::string digits = text.substr(std::min<size_t>(1, text.size())) + "00";
-    const auto pair = [&digits](size_t at) { return std::strtol(digits.substr(at, 2).c_str(), nullptr, 10); };
-    const int64_t seconds = pair(0) * 3600 + pair(2) * 60 + pair(4);
-    return text.starts_with('-') ? -seconds : seconds;
-}
-
-std::string offsetText(int64_t seconds) {
-    std::array<char, 32> text{};
-    const int64_t size = std::abs(seconds);
-    std::snprintf(text.data(), text.size(), size % 60 != 0 ? "%c%02d%02d%02d" : "%c%02d%02d",
-                  seconds < 0 ? '-' : '+', static_cast<int>(size / 3600), static_cast<int>(size / 60 % 60),
-                  static_cast<int>(size % 60));
-    return text.data();
-}
-
-// As the ICU library writes a zone, but as readers want it: the end of a rule is an instant, an offset has seconds
-// only where it needs them, and nothing is the library's own.
-std::string asReadersWantIt(const std::string& component) {
-    constexpr std::string_view kUntil = "UNTIL=";
-    constexpr size_t kWallTimeBytes = 15;
-    std::string out;
-    int64_t from = 0;
-    for (size_t at = 0; at < component.size();) {
-        const size_t end = std::min(component.find("\r\n", at), component.size());
-        std::string line = component.substr(at, end - at);
-        at = end + 2;
-        if (line.starts_with("X-TZINFO") || line.find(':') == std::string::npos) continue;
-        const bool isOffset = line.starts_with("TZOFFSET");
-        constexpr size_t kLongOffsetBytes = 7;
-        const bool isLong = isOffset && line.size() - line.find(':') - 1 == kLongOffsetBytes;
-        if (isLong && line.ends_with("00")) line.resize(line.size() - 2);
-        if (line.starts_with("TZOFFSETFROM:")) from = offsetSec(line.substr(line.find(':') + 1));
-        const size_t until = line.find(kUntil);
-        if (until != std::string::npos) {
-            const size_t start = until + kUntil.size();
-            auto time = time_text::parseCompact(line.substr(start, kWallTimeBytes) + "Z");
-            if (time && line.compare(start + kWallTimeBytes, 1, "Z") != 0) {
-                time->utime -= from;
-                line.replace(start, kWallTimeBytes, time_text::composeCompact(*time));
-            }
-        }
-        out += line + "\r\n";
-    }
-    return out;
-}
-
 int64_t offsetOfWall(const icu::BasicTimeZone& zone, int64_t wallSec, UTimeZoneLocalOption option) {
     int32_t raw = 0;
     int32_t saving = 0;
@@ -177,25 +124,8 @@ int64_t TimeZone::toWall(int64_t utcSec) const {
 }
 
 std::string TimeZone::component(int64_t sinceSec) const {
-    const std::unique_ptr<icu::VTimeZone> zone(
-        icu::VTimeZone::createVTimeZoneByID(icu::UnicodeString::fromUTF8(mName)));
-    if (zone == nullptr) return {};
     const int64_t first = sinceSec - kYearSec;
-    UErrorCode error = U_ZERO_ERROR;
-    icu::UnicodeString text;
-    zone->write(static_cast<double>(first) * kMsPerSecond, text, error);
-    if (U_FAILURE(error)) return {};
-    std::string component = asReadersWantIt(utf8(text));
-    // The library begins with the first change; what holds until then stands before it.
-    calendar_time_s start;
-    start.utime = toWall(first);
-    std::string startText = time_text::composeCompact(start);
-    startText.pop_back();  // the Z
-    const std::string offset = offsetText(start.utime - first);
-    const std::string initial = "BEGIN:STANDARD\r\nTZOFFSETTO:" + offset + "\r\nTZOFFSETFROM:" + offset +
-                                "\r\nDTSTART:" + startText + "\r\nEND:STANDARD\r\n";
-    const size_t place = component.find("BEGIN:", 1);
-    return place == std::string::npos ? std::string() : component.insert(place, initial);
+    return zone_component::compose(mName, first, toWall(first));
 }
 
 TimeZones::TimeZones(const std::string& floating) {

@@ -105,7 +105,7 @@ void ICalendarWriter::addPerson(const char* name, const Json& person) {
     if (content_line::losesControls(called)) mLosses.add("control characters in texts");
     const WordRow* row = rowOfValue(kPartStatRows, textOf(person, "status"));
     if (row != nullptr) line.parameters.push_back({"PARTSTAT", {std::string(row->word)}});
-    add(std::move(line));
+    add(line);
 }
 
 void ICalendarWriter::addExdates(const Json& event) {

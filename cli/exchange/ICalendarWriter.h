@@ -34,7 +34,7 @@ public:
     std::string todo(const Json& todo, const std::string& uid);
 
 private:
-    void add(ContentLine line) { mText += content_line::compose(line); }
+    void add(const ContentLine& line) { mText += content_line::compose(line); }
     void addText(const std::string& name, const std::string& text);
     void addPerson(const char* name, const Json& person);
     void addExdates(const Json& event);

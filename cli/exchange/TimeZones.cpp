@@ -56,6 +56,7 @@ std::string nameLike(const FileZone& wanted) {
     constexpr int kDays = 2 * 366;
     const int64_t first = static_cast<int64_t>(ucal_getNow() / kMsPerSecond) - kDays / 2 * kDaySec;
     std::vector<int> offsets;
+    offsets.reserve(kDays);
     for (int day = 0; day < kDays; ++day) offsets.push_back(wanted.offsetOfUtc(first + day * kDaySec));
     UErrorCode error = U_ZERO_ERROR;
     const std::unique_ptr<icu::StringEnumeration> names(icu::TimeZone::createTimeZoneIDEnumeration(
@@ -72,13 +73,6 @@ std::string nameLike(const FileZone& wanted) {
         if (isLike) return utf8(*name);
     }
     return {};
-}
-
-std::unique_ptr<TimeZone> ofFile(const std::string& component) {
-    FileZone zone(component);
-    if (!zone) return nullptr;
-    std::string name = nameLike(zone);
-    return std::make_unique<TimeZone>(std::move(zone), std::move(name));
 }
 
 int64_t offsetOfWall(const icu::BasicTimeZone& zone, int64_t wallSec, UTimeZoneLocalOption option) {
@@ -149,7 +143,11 @@ std::unique_ptr<TimeZone> TimeZones::make(const std::string& id) {
         if (auto zone = ofDatabase(definition->second.location)) return zone;
     }
     if (auto zone = fromPath(id)) return zone;
-    return definition != mDefinitions.end() ? ofFile(definition->second.component) : nullptr;
+    if (definition == mDefinitions.end()) return nullptr;
+    FileZone zone(definition->second.component);
+    if (!zone) return nullptr;
+    std::string name = nameLike(zone);
+    return std::make_unique<TimeZone>(std::move(zone), std::move(name));
 }
 
 const TimeZone* TimeZones::find(const std::string& id) {

@@ -14,7 +14,6 @@ namespace exchange {
 namespace {
 
 using content_line::unescape;
-using content_line::upper;
 
 template <class Rows>
 bool isIn(const Rows& rows, std::string_view name) {
@@ -310,8 +309,10 @@ void VCardReader::readPhoto(const ContentLine& line, Card& card) {
 void VCardReader::finish(const std::vector<ContentLine>& lines, Card& card) {
     for (Company& company : mCompanies) {
         const bool saysNothing =
-            std::all_of(company.fields.begin(), company.fields.end(),
-                        [](const Json& field) { return field == "" || field == "other"; });
+            std::all_of(company.fields.begin(), company.fields.end(), [](const Json& field) {
+                const auto& text = field.get_ref<const std::string&>();
+                return text.empty() || text == "other";
+            });
         if (!saysNothing) card.contact["companies"].push_back(std::move(company.fields));
     }
     const auto fn =

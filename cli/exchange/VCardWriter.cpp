@@ -82,7 +82,7 @@ void VCardWriter::addItem(ContentLine line, const Json& object, std::string_view
     const std::string label = object.value("label", "");
     if (!label.empty() && line.group.empty()) line.group = nextGroup();
     const std::string group = line.group;
-    add(std::move(line));
+    add(line);
     if (!label.empty()) add({group, std::string(kLabelProperty), {}, escaped(label)});
 }
 

@@ -24,7 +24,7 @@ public:
     std::string card(const Json& contact, const CardExtras& extras);
 
 private:
-    void add(ContentLine line) { mText += content_line::compose(line); }
+    void add(const ContentLine& line) { mText += content_line::compose(line); }
     void addText(std::string_view property, const std::string& text);
     // With the type, the label and the mark that the object has.
     void addItem(ContentLine line, const Json& object, std::string_view types);

@@ -17,7 +17,8 @@ std::string contentOf(const std::filesystem::path& path) {
 
 // The files that are made to keep a secret.
 bool isKeeper(const std::string& path) {
-    return path.find("/shared/trusted/") != std::string::npos || path.find("/key-storage/") != std::string::npos;
+    return path.find("/shared/trusted/") != std::string::npos ||
+           path.find("/key-storage/") != std::string::npos;
 }
 
 struct DebugLog {
@@ -35,20 +36,28 @@ TEST(Hygiene, NothingThatARunLeavesBehindHoldsASecret) {
     EXPECT_EQ(device.sync(1, "all").status, 0);
     EXPECT_EQ(device.tool({"account", "update", "1", "--contacts"}).status, 0);
     pair.provider.admin("POST", "/tokens/expire", Json::object());
-    const Json event = {{"summary", "Secret"}, {"start", "2026-12-01T10:00:00Z"}, {"end", "2026-12-01T11:00:00Z"}};
-    EXPECT_EQ(device.tool({"event", "add", "--calendar", std::to_string(pair.localCalendar(1, "Personal")), "-"},
-                          event.dump())
-                  .status,
-              0);
+    const Json event = {
+        {"summary", "Secret"}, {"start", "2026-12-01T10:00:00Z"}, {"end", "2026-12-01T11:00:00Z"}};
+    EXPECT_EQ(
+        device
+            .tool({"event", "add", "--calendar", std::to_string(pair.localCalendar(1, "Personal")), "-"},
+                  event.dump())
+            .status,
+        0);
     EXPECT_EQ(device.sync(1, "all").status, 0);
     pair.provider.admin("POST", "/tokens/expire", Json::object());
     pair.provider.admin("POST", "/tokens/revoke", {{"email", pair.provider.accounts()[1].email}});
     EXPECT_EQ(device.sync(2).status, 1);
 
     std::map<std::string, std::string> places;
-    for (const std::vector<std::string>& command : std::vector<std::vector<std::string>>{
-             {"status"}, {"status", "--json"}, {"doctor"}, {"log"}, {"account", "list", "--json"},
-             {"account", "show", "1"}, {"sync", "2", "--wait"}}) {
+    for (const std::vector<std::string>& command :
+         std::vector<std::vector<std::string>>{{"status"},
+                                               {"status", "--json"},
+                                               {"doctor"},
+                                               {"log"},
+                                               {"account", "list", "--json"},
+                                               {"account", "show", "1"},
+                                               {"sync", "2", "--wait"}}) {
         const CommandResult result = device.tool(command);
         places["the tool's " + command[0]] += result.output + result.error;
     }
@@ -59,11 +68,16 @@ TEST(Hygiene, NothingThatARunLeavesBehindHoldsASecret) {
     for (const auto& entry : std::filesystem::recursive_directory_iterator(device.root().at("/"))) {
         if (!entry.is_regular_file()) continue;
         const std::string path = entry.path();
-        isKeeper(path) ? static_cast<void>(++keepers) : static_cast<void>(places[path] = contentOf(entry.path()));
-        if (isKeeper(path)) EXPECT_EQ(entry.status().permissions(), std::filesystem::perms(0600)) << path;
+        if (!isKeeper(path)) {
+            places[path] = contentOf(entry.path());
+            continue;
+        }
+        ++keepers;
+        EXPECT_EQ(entry.status().permissions(), std::filesystem::perms(0600)) << path;
     }
     EXPECT_EQ(keepers, 4U) << "two tokens and two keys";
-    EXPECT_THAT(device.daemonLog(), testing::HasSubstr("D/")) << "debug lines are among what is looked through";
+    EXPECT_THAT(device.daemonLog(), testing::HasSubstr("D/"))
+        << "debug lines are among what is looked through";
     for (const auto& [place, content] : places) {
         for (const std::string& secret : secrets)
             EXPECT_EQ(content.find(secret), std::string::npos) << place << " holds \"" << secret << '"';

@@ -165,21 +165,21 @@ TEST(EventFields, AnExceptionDateIsAddedOnce) {
 
 TEST(Output, ColumnsFitWhateverTheTextIs) {
     output::Table table({"A", "B"});
-    table.add({"日本", "x"});       // two columns a character
+    table.add({"日本語", "x"});     // two columns a character
     table.add({"e\u0301te", "y"});  // an accent of its own takes none
     table.add({"a\x1b[31m\n\xff", "z"});
     EXPECT_EQ(table.text(),
               "A         B\n"
-              "日本      x\n"
+              "日本語    x\n"
               "e\u0301te       y\n"
               "a [31m \ufffd  z\n");
     // Cut in the middle of no character; a list where even that does not help.
     EXPECT_EQ(table.text(8),
-              "A     B\n"
-              "日…   x\n"
-              "e\u0301te   y\n"
+              "A      B\n"
+              "日本…  x\n"
+              "e\u0301te    y\n"
               "a [3…  z\n");
-    EXPECT_THAT(table.text(6), testing::HasSubstr("A: 日本\nB: x\n\n"));
+    EXPECT_THAT(table.text(6), testing::HasSubstr("A: 日本語\nB: x\n\n"));
     EXPECT_EQ(output::wrapped("what to do about it", 12, 2), "  what to do\n  about it");
 }
 

@@ -137,7 +137,10 @@ void CalendarRecords::replaceEvent(int id, const CalendarItem& item) const {
     const CalendarRecord wanted = make(item);
     const auto onto = [](calendar_record_h source, CalendarRecord target) {
         Json said = withoutPlace(event_json::compose(source));
-        if (said["organizer"]["email"] == "" && said["organizer"]["name"] == "") said.erase("organizer");
+        const auto isBlank = [&said](const char* member) {
+            return said["organizer"][member].get_ref<const std::string&>().empty();
+        };
+        if (isBlank("email") && isBlank("name")) said.erase("organizer");
         return event_json::parse(said, std::move(target)).record;
     };
     std::string cancelled = textOf(record.get(), CALENDAR_EVENT_EXDATE);

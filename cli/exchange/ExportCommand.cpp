@@ -23,7 +23,6 @@ namespace {
 
 using namespace exchange;  // NOLINT(google-build-using-namespace): the command of that folder
 using record_access::intOf;
-using record_access::textOf;
 
 constexpr item_list::View kEvents{_calendar_event, CALENDAR_EVENT_ID, CALENDAR_EVENT_BOOK_ID};
 constexpr item_list::View kTodos{_calendar_todo, CALENDAR_TODO_ID, CALENDAR_TODO_BOOK_ID};

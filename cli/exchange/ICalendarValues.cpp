@@ -86,7 +86,7 @@ std::string ruleOf(const std::string& value, const std::function<int64_t(int64_t
 }
 
 std::string emailOf(const ContentLine& line) {
-    if (const std::string email = line.parameter("EMAIL"); !email.empty()) return email;
+    if (std::string email = line.parameter("EMAIL"); !email.empty()) return email;
     const size_t start = line.value.find_first_not_of(' ');
     if (start == std::string::npos) return {};
     const std::string value = line.value.substr(start);

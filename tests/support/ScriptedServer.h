@@ -5,6 +5,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <mutex>
 #include <string>
 #include <thread>
 
@@ -21,9 +22,12 @@ public:
             if (request.path == "/o/oauth2/token") return httplib::Server::HandlerResponse::Unhandled;
             ++requests;
             std::this_thread::sleep_for(std::chrono::milliseconds(delayMs));
-            lastPath = request.target;
-            lastMethod = request.method;
-            lastHeaders = request.headers;
+            {
+                const std::lock_guard lock(mMutex);  // several connections are served at once
+                lastPath = request.target;
+                lastMethod = request.method;
+                lastHeaders = request.headers;
+            }
             if (request.get_header_value("Authorization") != "Bearer good") {
                 response.status = 401;
                 response.set_content(R"({"error":{"code":401}})", "application/json");
@@ -56,6 +60,7 @@ public:
     httplib::Headers lastHeaders;
 
 private:
+    std::mutex mMutex;
     httplib::Server mServer;
     int mPort = 0;
     std::thread mThread;

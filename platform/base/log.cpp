@@ -151,8 +151,9 @@ void writeToJournal(log_priority priority, const char* tag, const log_place_s* p
     fields.send();
 }
 
-int print(log_priority priority, const char* tag, const log_place_s* place, const char* format,
-          va_list arguments) {
+__attribute__((format(printf, 4, 0))) int print(log_priority priority, const char* tag,
+                                                const log_place_s* place, const char* format,
+                                                va_list arguments) {
     char buffer[kMaxMessageBytes];
     size_t length = 0;
     if (place != nullptr) {

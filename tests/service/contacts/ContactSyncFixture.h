@@ -34,8 +34,8 @@ protected:
 
     static CtDataManager& manager() { return CtDataManager::getInstance(); }
     static TestRoot& root() {
-        static TestRoot* const instance = new TestRoot;
-        return *instance;
+        static TestRoot instance;
+        return instance;
     }
     vantor_pim_sync_account_s record() {
         static int accounts = 0;

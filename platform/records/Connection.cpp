@@ -1,5 +1,6 @@
 #include "Connection.h"
 
+#include <array>
 #include <cstdio>
 
 namespace platform::records {
@@ -109,6 +110,21 @@ sqlite3_stmt* Connection::kept(const std::string& sql) {
     }
     mStatements[sql].reset(statement);
     return statement;
+}
+
+int Connection::readChangeCounter(uint64_t* counter) {
+    constexpr sqlite3_int64 kOffset = 24;  // of the file format: big-endian
+    sqlite3_file* file = nullptr;
+    const int code = sqlite3_file_control(mpHandle, "main", SQLITE_FCNTL_FILE_POINTER, &file);
+    if (code != SQLITE_OK) return code;
+    if (file == nullptr || file->pMethods == nullptr) return SQLITE_ERROR;
+    // A descriptor of our own would take SQLite's locks with it when it is closed.
+    std::array<unsigned char, 4> bytes{};
+    const int read = file->pMethods->xRead(file, bytes.data(), static_cast<int>(bytes.size()), kOffset);
+    if (read != SQLITE_OK) return read;
+    *counter = 0;
+    for (const unsigned char byte : bytes) *counter = *counter << 8 | byte;
+    return SQLITE_OK;
 }
 
 int Connection::run(const std::string& sql) {

@@ -66,6 +66,8 @@ public:
     [[nodiscard]] int64_t lastRowId() const { return sqlite3_last_insert_rowid(mpHandle); }
     [[nodiscard]] bool inTransaction() const { return sqlite3_get_autocommit(mpHandle) == 0; }
     [[nodiscard]] const char* message() const { return sqlite3_errmsg(mpHandle); }
+    // The counter in the file's header that each commit raises. SQLite's code.
+    [[nodiscard]] int readChangeCounter(uint64_t* counter);
     void setBusyTimeout(int milliseconds) { sqlite3_busy_timeout(mpHandle, milliseconds); }
 
 private:

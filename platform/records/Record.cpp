@@ -100,4 +100,10 @@ bool Record::hasSameContent(const Record& other) const {
     return true;
 }
 
+std::string idArray(std::span<const int> ids) {
+    std::string text = "[";
+    for (const int id : ids) text.append(text.size() > 1 ? "," : "").append(std::to_string(id));
+    return text + "]";
+}
+
 }  // namespace platform::records

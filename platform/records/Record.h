@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <map>
 #include <memory>
+#include <span>
 #include <string>
 #include <utility>
 #include <variant>
@@ -80,6 +81,9 @@ public:
     void release() { records.clear(); }
 };
 
+// The JSON array that a statement's json_each() takes.
+[[nodiscard]] std::string idArray(std::span<const int> ids);
+
 class Query {
 public:
     explicit Query(const View& queried) : view(&queried) {}
@@ -90,6 +94,7 @@ public:
     };
     const View* view;
     std::vector<Filter> filters;
+    std::string ids;               // as idArray() makes it; empty: whatever the id
     std::vector<bool> projection;  // by position; empty: everything
     int sortIndex = -1;
     bool ascending = true;

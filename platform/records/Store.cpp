@@ -189,6 +189,12 @@ int Store::currentVersion(int* version) {
     return PLATFORM_ERROR_NONE;
 }
 
+int Store::writeMark(uint64_t* mark) {
+    const std::lock_guard lock(mMutex);
+    if (!mConnection.isOpen()) return PLATFORM_ERROR_DATABASE;
+    return codeOf(mConnection.readChangeCounter(mark));
+}
+
 int Store::lastChangeVersion(int* version) {
     const std::lock_guard lock(mMutex);
     const auto own = lastVersions().find(this);

@@ -60,6 +60,9 @@ public:
 
     // --- reads
     [[nodiscard]] int get(const View& view, int id, std::unique_ptr<Record>* out);
+    // One for each id, in order; NULL for those that are not there.
+    [[nodiscard]] int getMany(const View& view, std::span<const int> ids,
+                              std::vector<std::unique_ptr<Record>>* out);
     [[nodiscard]] int query(const Query& query, int offset, int limit, RecordList* out);
     [[nodiscard]] int changes(const View& view, int bookId, int since, RecordList* out, int* current);
     // One record at a time, of one state of the store, in no particular order. `use` runs with the lock held and may take the
@@ -69,6 +72,8 @@ public:
     // As changes(), one at a time.
     [[nodiscard]] int visitChanges(const View& view, int bookId, int since, const Use& use, int* current);
     [[nodiscard]] int currentVersion(int* version);
+    // Stays as long as nobody commits a write, in any process. Takes no lock of the file.
+    [[nodiscard]] int writeMark(uint64_t* mark);
     [[nodiscard]] int lastChangeVersion(int* version);
 
     // --- change callbacks

@@ -39,6 +39,11 @@ std::string conditionOf(const Query& query, std::vector<Value>* values) {
         condition += std::string(query.view->properties[filter.index].column) + " = ?";
         values->push_back(filter.value);
     }
+    if (!query.ids.empty()) {
+        condition += condition.empty() ? " WHERE " : " AND ";
+        condition += "id IN (SELECT value FROM json_each(?))";
+        values->emplace_back(query.ids);
+    }
     return condition;
 }
 
@@ -80,6 +85,20 @@ int Store::get(const View& view, int id, std::unique_ptr<Record>* out) {
     if (code != PLATFORM_ERROR_NONE) return code;
     if (found == nullptr) return PLATFORM_ERROR_NOT_FOUND;
     *out = std::move(found);
+    return PLATFORM_ERROR_NONE;
+}
+
+int Store::getMany(const View& view, std::span<const int> ids, std::vector<std::unique_ptr<Record>>* out) {
+    Query query(view);
+    query.ids = idArray(ids);
+    std::map<int, std::unique_ptr<Record>> found;
+    const int code = visit(query, [&found](std::unique_ptr<Record>& record) {
+        const int id = record->id();
+        found[id] = std::move(record);
+    });
+    if (code != PLATFORM_ERROR_NONE) return code;
+    out->clear();
+    for (const int id : ids) out->push_back(std::move(found[id]));
     return PLATFORM_ERROR_NONE;
 }
 
@@ -189,15 +208,14 @@ int Store::visit(const Query& query, const Use& use) {
 int Store::hand(const Query& query, std::vector<std::unique_ptr<Record>>* batch, const Use& use) {
     if (batch->empty()) return PLATFORM_ERROR_NONE;
     std::map<int, Record*> byId;
-    std::string list = "[";
+    std::vector<int> list;
     for (const auto& record : *batch) {
         byId[record->id()] = record.get();
-        list.append(list.size() > 1 ? "," : "").append(std::to_string(record->id()));
+        list.push_back(record->id());
     }
-    list += "]";
     // One is looked up without a table of ids.
     const bool isOne = batch->size() == 1;
-    const Value ids = isOne ? Value(int64_t{batch->front()->id()}) : Value(std::move(list));
+    const Value ids = isOne ? Value(int64_t{list.front()}) : Value(idArray(list));
     const char* const selectIds = isOne ? "?" : "SELECT value FROM json_each(?)";
     if (const int code = readChildren(*query.view, query, selectIds, {ids}, &byId);
         code != PLATFORM_ERROR_NONE) {

@@ -1,6 +1,7 @@
 #include "calendar/CalUploader.h"
 
 #include <algorithm>
+#include <iterator>
 #include <utility>
 
 #include "calendar/CalItemWriter.h"
@@ -27,7 +28,8 @@ CalUploader::CalUploader(CalSyncSide* side, CalUpSyncTask* task, IStopQuery* sto
       mpStopQuery(stopQuery),
       mParked(*parked),
       mBook(std::move(book)),
-      mKind(side->manager().kind()) {}
+      mKind(side->manager().kind()),
+      mRecords(mKind.view) {}
 
 int CalUploader::run() {
     mpStore = mSide.manager().prepared();
@@ -144,31 +146,43 @@ int CalUploader::markAsSent() {
 
 // --- items
 
-int CalUploader::sendDirty() {
+std::vector<CalUploader::Row*> CalUploader::dirtyItems() {
+    std::vector<Row*> dirty;
     for (Row& row : mRows) {
-        if (mEnd != End::kNone) return mResult;
-        if (isStopped()) return kStopped;
         if (row.original_event_id != 0 || row.deleted != 0) continue;
         const auto instances = mInstances.find(row.event_id);
         const bool hasDirtyInstance =
             instances != mInstances.end() &&
             std::any_of(instances->second.begin(), instances->second.end(),
                         [](const Row* instance) { return instance->dirty != 0 && instance->event_id > 0; });
-        if (row.dirty != 0 || hasDirtyInstance) sendItem(row);
+        if (row.dirty != 0 || hasDirtyInstance) dirty.push_back(&row);
+    }
+    return dirty;
+}
+
+int CalUploader::sendDirty() {
+    const std::vector<Row*> dirty = dirtyItems();
+    std::vector<int> ids;
+    std::transform(dirty.begin(), dirty.end(), std::back_inserter(ids),
+                   [](const Row* row) { return row->event_id; });
+    mRecords.expect(std::move(ids));
+    for (Row* row : dirty) {
+        if (mEnd != End::kNone) break;
+        if (isStopped()) return kStopped;
+        sendItem(*row);
     }
     return mResult;
 }
 
 void CalUploader::sendItem(Row& row) {
     if (mSkipUnconfirmed && row.uri.empty() && row.etag == kUnconfirmedEtag) return;
-    calendar_record_h raw = nullptr;
-    const int code = calendar_db_get_record(mKind.view, row.event_id, &raw);
-    if (code != PLATFORM_ERROR_NONE) {
+    CalendarRecord record;
+    if (const int code = mRecords.take(row.event_id, &record); code != PLATFORM_ERROR_NONE) {
         // Deleted since the marks were set: the next walk finds that.
         if (code != PLATFORM_ERROR_NOT_FOUND) SYNC_ERR("db_get_record fail");
         return;
     }
-    const CalendarRecord record(raw);
+    calendar_record_h raw = record.get();
     if (row.dirty != 0 && !isParked(row)) {
         const std::string body = mKind.build(raw);
         if (body.empty()) {

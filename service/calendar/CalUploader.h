@@ -15,6 +15,7 @@
 #include "calendar/CalUpSyncTasks.h"
 #include "calendar/CalWriteBack.h"
 #include "common/ParkedItems.h"
+#include "common/RecordsAhead.h"
 #include "common/SyncDirector.h"
 
 class CalUploader {
@@ -60,6 +61,7 @@ private:
     [[nodiscard]] int markAsSent();
 
     // --- items
+    [[nodiscard]] std::vector<Row*> dirtyItems();
     [[nodiscard]] int sendDirty();
     void sendItem(Row& row);
     void insertItem(Row& row, calendar_record_h record, const std::string& body);
@@ -93,6 +95,7 @@ private:
     const CalItemKind& mKind;
     CalItemStore* mpStore = nullptr;
 
+    CalendarRecordsAhead mRecords;
     std::list<Row> mRows;
     std::map<int, std::vector<Row*>> mInstances;  // by series
     std::vector<Sent> mSentItems;

@@ -77,10 +77,7 @@ int CtUploader::run() {
         return mResult;
     }
     mpComposer = std::make_unique<ContactComposer>(mGroups.composer(mpCurl->feedBase()));
-    for (CtContactSyncRow& row : contacts) {
-        const bool waits = row.dirty != 0 || row.image_dirty != 0;
-        if (!isOver() && waits && row.deleted == 0 && !isParked<CtContactKind>(row)) sendContact(row);
-    }
+    sendContacts(&contacts);
     for (CtContactSyncRow& row : contacts) {
         if (!isOver() && row.deleted != 0 && !isParked<CtContactKind>(row))
             sendDeleted<CtContactKind>(CtItemType::kContact, row);
@@ -155,11 +152,11 @@ void CtUploader::renew(typename Kind::Row& row) {
     if (Kind::update(*mpStore, row) != kOk) mIsOver = true;
 }
 
-ContactsRecord CtUploader::readRecord(const char* view, int id) {
-    contacts_record_h raw = nullptr;
-    const int code = contacts_db_get_record(view, id, &raw);
+ContactsRecord CtUploader::readRecord(ContactsRecordsAhead* records, int id) {
+    ContactsRecord record;
+    const int code = records->take(id, &record);
     // One that was just deleted is met as a deletion by the next look at the device's changes.
-    if (code == PLATFORM_ERROR_NONE || code == PLATFORM_ERROR_NOT_FOUND) return ContactsRecord(raw);
+    if (code == PLATFORM_ERROR_NONE || code == PLATFORM_ERROR_NOT_FOUND) return record;
     SYNC_ERR("get fail %d", code);
     failOfStore("the device's stores cannot be read");
     return nullptr;
@@ -168,7 +165,7 @@ ContactsRecord CtUploader::readRecord(const char* view, int id) {
 // --- groups
 
 void CtUploader::sendGroup(CtGroupSyncRow& row) {
-    const ContactsRecord record = readRecord(_contacts_group, row.group_id);
+    const ContactsRecord record = readRecord(&mGroupRecords, row.group_id);
     contacts_record_h raw = record.get();
     if (raw == nullptr) return;
     const int version = intOf(raw, CONTACTS_GROUP_VERSION);
@@ -212,8 +209,24 @@ void CtUploader::sendGroup(CtGroupSyncRow& row) {
 
 // --- contacts
 
+void CtUploader::sendContacts(std::vector<CtContactSyncRow>* rows) {
+    std::vector<CtContactSyncRow*> marked;
+    std::vector<int> ids;
+    for (CtContactSyncRow& row : *rows) {
+        const bool waits = row.dirty != 0 || row.image_dirty != 0;
+        if (!waits || row.deleted != 0 || isParked<CtContactKind>(row)) continue;
+        marked.push_back(&row);
+        ids.push_back(row.contact_id);
+    }
+    mContactRecords.expect(std::move(ids));
+    for (CtContactSyncRow* row : marked) {
+        if (isOver()) return;
+        sendContact(*row);
+    }
+}
+
 void CtUploader::sendContact(CtContactSyncRow& row) {
-    const ContactsRecord record = readRecord(_contacts_contact, row.contact_id);
+    const ContactsRecord record = readRecord(&mContactRecords, row.contact_id);
     if (record == nullptr) return;
     // The record may be younger than its mark: what is sent now, no later look will find.
     if (intOf(record.get(), CONTACTS_CONTACT_IMAGE_VERSION) > row.version) row.image_dirty = 1;

@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "common/ParkedItems.h"
+#include "common/RecordsAhead.h"
 #include "common/SyncDirector.h"
 #include "contacts/CtGroupMap.h"
 #include "contacts/CtItemKind.h"
@@ -67,8 +68,9 @@ private:
     [[nodiscard]] int writeBack(const std::vector<Sent>& sent);
 
     // NULL when the device has the record no more, or (then the run fails) it cannot be read.
-    [[nodiscard]] ContactsRecord readRecord(const char* view, int id);
+    [[nodiscard]] ContactsRecord readRecord(ContactsRecordsAhead* records, int id);
     void sendGroup(CtGroupSyncRow& row);
+    void sendContacts(std::vector<CtContactSyncRow>* rows);
     void sendContact(CtContactSyncRow& row);
     // Takes the entry into `row`; false when the contact's fields were not taken.
     [[nodiscard]] bool sendFields(CtContactSyncRow& row, contacts_record_h record);
@@ -89,6 +91,8 @@ private:
     CtGroupMap mGroups;
     std::unique_ptr<ContactComposer> mpComposer;  // once the groups are sent
 
+    ContactsRecordsAhead mGroupRecords{_contacts_group};
+    ContactsRecordsAhead mContactRecords{_contacts_contact};
     std::vector<Sent> mSentContacts;
     std::vector<Sent> mSentGroups;
     bool mIsOver = false;

@@ -171,6 +171,9 @@ int calendar_query_destroy(calendar_query_h query);
 
 // --- database: reads ---------------------------------------------------------------------------------
 [[nodiscard]] int calendar_db_get_record(const char* view, int id, calendar_record_h* out);
+// out[i] is the record with ids[i], NULL when there is none; all of one state of the store. On an error nothing is handed out.
+[[nodiscard]] int calendar_db_get_records_by_id(const char* view, const int* ids, size_t count,
+                                                calendar_record_h* out);
 [[nodiscard]] int calendar_db_get_all_records(const char* view, int offset, int limit, calendar_list_h* out);
 [[nodiscard]] int calendar_db_get_records_with_query(calendar_query_h query, int offset, int limit,
                                                      calendar_list_h* out);  // limit 0: all
@@ -190,6 +193,9 @@ using calendar_record_cb = void (*)(calendar_record_h record, void* user_data);
 [[nodiscard]] int calendar_db_for_each_change(const char* view, int book_id, int version,
                                               calendar_record_cb use, void* user_data, int* current_version);
 [[nodiscard]] int calendar_db_get_current_version(int* version);
+// Two equal marks: nobody wrote in between, and what was read after the first is what the store holds. Takes no lock of the file,
+// so it costs a fraction of a read.
+[[nodiscard]] int calendar_db_get_write_mark(uint64_t* mark);
 // The version of the calling thread's own last write; the store's current version when it has made none.
 [[nodiscard]] int calendar_db_get_last_change_version(int* version);
 

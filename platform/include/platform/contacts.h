@@ -185,6 +185,8 @@ int contacts_query_destroy(contacts_query_h query);
 [[nodiscard]] int contacts_query_set_sort(contacts_query_h query, unsigned property, bool ascending);
 
 [[nodiscard]] int contacts_db_get_record(const char* view, int id, contacts_record_h* out);
+[[nodiscard]] int contacts_db_get_records_by_id(const char* view, const int* ids, size_t count,
+                                                contacts_record_h* out);
 [[nodiscard]] int contacts_db_get_all_records(const char* view, int offset, int limit, contacts_list_h* out);
 [[nodiscard]] int contacts_db_get_records_with_query(contacts_query_h query, int offset, int limit,
                                                      contacts_list_h* out);
@@ -197,6 +199,7 @@ using contacts_record_cb = void (*)(contacts_record_h record, void* user_data);
 [[nodiscard]] int contacts_db_for_each_change(const char* view, int address_book_id, int version,
                                               contacts_record_cb use, void* user_data, int* current_version);
 [[nodiscard]] int contacts_db_get_current_version(int* version);
+[[nodiscard]] int contacts_db_get_write_mark(uint64_t* mark);
 [[nodiscard]] int contacts_db_get_last_change_version(int* version);
 
 [[nodiscard]] int contacts_db_insert_record(contacts_record_h record, int* id,

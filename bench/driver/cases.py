@@ -17,6 +17,7 @@ class Case:
     tasks: int = 0
     tls: bool = False
     uploads: int = 0
+    on_disk: bool = False  # a durable write costs something only there
 
     @property
     def kind(self):
@@ -49,15 +50,17 @@ def contacts(count, tls=False):
 
 ALL = [events(1000), events(5000), events(20000), events(5000, tls=True), contacts(2000), contacts(10000),
        contacts(2000, tls=True), Case("1,000 tasks", tasks=1000),
-       Case("1,000 uploads", uploads=UPLOADS), Case("1,000 uploads, HTTPS", uploads=UPLOADS, tls=True)]
+       Case("1,000 uploads", uploads=UPLOADS), Case("1,000 uploads, HTTPS", uploads=UPLOADS, tls=True),
+       Case("1,000 uploads, on a disk", uploads=UPLOADS, on_disk=True)]
 QUICK = [events(1000), events(5000), contacts(2000)]
 
 
 class Bench:
     """The page servers of all cases, and where the devices' files lie."""
 
-    def __init__(self, folder, cases):
+    def __init__(self, folder, disk_folder, cases):
         self.folder = folder
+        self.disk_folder = disk_folder
         self.servers = {}
         try:
             for case in cases:
@@ -71,14 +74,14 @@ class Bench:
         for server in self.servers.values():
             server.close()
 
-    def path(self):
-        return os.path.join(self.folder, f"r{next(_numbers)}")
+    def path(self, case):
+        return os.path.join(self.disk_folder if case.on_disk else self.folder, f"r{next(_numbers)}")
 
     def device(self, case):
-        return Device(self.path(), self.servers[case], contacts=case.contacts > 0)
+        return Device(self.path(case), self.servers[case], contacts=case.contacts > 0)
 
     def floor(self, case):
-        return Floor(self.path(), self.servers[case])
+        return Floor(self.path(case), self.servers[case])
 
     def _warm_up(self, case):
         """Lets every page be made, compressed and plain, that a sync will ask for."""

@@ -22,7 +22,7 @@ def measure(bench, case, runs):
     device = bench.device(case)
     try:
         device.measure("sync", case.kind)
-        synced_kb = device.status("VmRSS")
+        synced = device.memory()
         answers, latencies = [], []
         for _ in range(runs):
             device.stop()
@@ -32,8 +32,8 @@ def measure(bench, case, runs):
         pid = device.pid()
         before = _switches(pid)
         time.sleep(IDLE_SECONDS)
-        return {"wakesPerMinute": (_switches(pid) - before) * 60 / IDLE_SECONDS, "idleKb": device.status("VmRSS"),
-                "syncedKb": synced_kb, "firstAnswerMs": answers, "stateUs": [entry["medianUs"] for entry in latencies],
+        return {"wakesPerMinute": (_switches(pid) - before) * 60 / IDLE_SECONDS, "started": device.memory(),
+                "synced": synced, "firstAnswerMs": answers, "stateUs": [entry["medianUs"] for entry in latencies],
                 "stateP99Us": [entry["p99Us"] for entry in latencies]}
     finally:
         device.close()

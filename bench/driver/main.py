@@ -29,6 +29,7 @@ def options():
     parser.add_argument("--quick", action="store_true", help="few sizes and runs, a verdict as exit status")
     parser.add_argument("--peer", action="store_true", help="also measure vdirsyncer")
     parser.add_argument("--folder", default="/dev/shm", help="where the devices' files lie (default: in memory)")
+    parser.add_argument("--disk-folder", default="/var/tmp", help="where they lie in the cases on a disk (default: /var/tmp)")
     parser.add_argument("--only", help="only cases whose name contains this")
     parser.add_argument("--no-idle", action="store_true", help="leave out the idle daemon (over a minute)")
     chosen = parser.parse_args()
@@ -85,7 +86,6 @@ def limit_rows(product, floor, peers, idle_result):
 
     five, two = events(5000), contacts(2000)
     small, large = events(1000), events(20000)
-    upload = next((case for case in product if case.uploads and not case.tls), None)
     rows = []
     for case, work, limit, faster in ((five, "first sync", 2, 1.5), (five, "no changes", 1.3, 4), (two, "first sync", 2.5, 1.5)):
         if case not in product:
@@ -93,8 +93,9 @@ def limit_rows(product, floor, peers, idle_result):
         rows += against_floor(case, work, limit)
         if case in peers:
             rows.append((f"{work}, {case.name}, against the peer", 1 / ratio(case, work, peers), faster, " times as fast", True))
-    if upload:
-        rows += against_floor(upload, "uploads", 1.5)
+    for case in product:
+        if case.uploads and not case.tls:
+            rows += against_floor(case, "uploads", 1.5)
     if small in product and large in product:
         for work in ("first sync", "no changes"):
             for what, name in (("wallMs", "time"), ("cpuMs", "processor time")):
@@ -104,9 +105,11 @@ def limit_rows(product, floor, peers, idle_result):
         rows.append(("peak memory, 20,000 over 1,000 events", peaks[large] / peaks[small], MEMORY_GROWTH_LIMIT, " times", False))
         rows.append(("peak memory, 20,000 events", peaks[large] / report.KB_PER_MB, 48, " MB", False))
     if idle_result:
-        rows += [("idle daemon, memory after a start", idle_result["idleKb"] / report.KB_PER_MB, 20, " MB", False),
-                 ("idle daemon, memory after a first sync", idle_result["syncedKb"] / report.KB_PER_MB, 20, " MB", False),
-                 ("idle daemon, wakes a minute", idle_result["wakesPerMinute"], 1, "", False),
+        for state in ("started", "synced"):
+            memory = idle_result[state]
+            rows += [(f"idle daemon, {state}, resident memory", memory["Rss"] / report.KB_PER_MB, 20, " MB", False),
+                     (f"idle daemon, {state}, its share of it", memory["Pss"] / report.KB_PER_MB, 20, " MB", False)]
+        rows += [("idle daemon, wakes a minute", idle_result["wakesPerMinute"], 1, "", False),
                  ("start to the first answer (slowest)", max(idle_result["firstAnswerMs"]), 50, " ms", False),
                  ("get_state, median", statistics.median(idle_result["stateUs"]), 200, " µs", False)]
     return rows
@@ -134,7 +137,8 @@ def measure_all(bench, chosen, cases):
         say("the idle daemon")
         idle_result = idle.measure(bench, events(5000), chosen.runs)
     print(f"`{shlex.join(['bench/run', *sys.argv[1:]])}`")
-    print(f"\n{report.machine()}\n- {chosen.runs} interleaved runs, median (minimum–maximum); files in {chosen.folder}\n")
+    print(f"\n{report.machine()}\n- {chosen.runs} interleaved runs, median (minimum–maximum); files in {chosen.folder}, "
+          f"on a disk: in {chosen.disk_folder}\n")
     print(report.costs(cases, product, floor, flushes))
     if peers:
         print(f"\n{report.peers(list(peers), product, peers, peer.start_ms())}")
@@ -152,9 +156,10 @@ def main():
     cases = [case for case in (catalogue.QUICK if chosen.quick else catalogue.ALL) if not chosen.only or chosen.only in case.name]
     if not cases:
         sys.exit("bench/run: no case has such a name")
-    with tempfile.TemporaryDirectory(prefix="vps-bench-", dir=chosen.folder) as folder:
+    with (tempfile.TemporaryDirectory(prefix="vps-bench-", dir=chosen.folder) as folder,
+          tempfile.TemporaryDirectory(prefix="vps-bench-", dir=chosen.disk_folder) as disk_folder):
         say("making pages")
-        bench = Bench(folder, cases)
+        bench = Bench(folder, disk_folder, cases)
         try:
             product = measure_all(bench, chosen, cases)
         finally:

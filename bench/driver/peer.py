@@ -54,7 +54,7 @@ class Peer:
 
 def round_of(bench, case):
     """First sync and sync without changes."""
-    peer = Peer(bench.path(), bench.servers[case], case)
+    peer = Peer(bench.path(case), bench.servers[case], case)
     try:
         results = {"first sync": peer.sync()}
         if peer.held() != case.items:

@@ -100,6 +100,11 @@ class Device:
         with open(f"/proc/{self.pid()}/status") as file:
             return int(re.search(rf"^{name}:\s+(\d+)", file.read(), re.M).group(1))
 
+    def memory(self):
+        """What is resident, in kB: "Rss" with all of every page, "Pss" with its share of those that other processes map as well."""
+        with open(f"/proc/{self.pid()}/smaps_rollup") as file:
+            return {name: int(size) for name, size in re.findall(r"^(Rss|Pss):\s+(\d+)", file.read(), re.M)}
+
     def count(self, store, table):
         """Records of the device's store."""
         path = f"{self.folder}/opt/usr/data/records/{store}.db"

@@ -1,6 +1,7 @@
 #include "Connection.h"
 
 #include <array>
+#include <charconv>
 #include <cstdio>
 
 namespace platform::records {
@@ -18,13 +19,12 @@ std::string timeText(const calendar_time_s& time) {
 
 calendar_time_s timeOf(const std::string& text) {
     calendar_time_s time;
-    long long seconds = 0;
     if (text.starts_with('l')) {
         time.type = CALENDAR_TIME_LOCALTIME;
         std::sscanf(text.c_str(), "l%d-%d-%dT%d:%d:%d", &time.year, &time.month, &time.mday, &time.hour,
                     &time.minute, &time.second);
-    } else if (std::sscanf(text.c_str(), "u%lld", &seconds) == 1) {
-        time.utime = seconds;
+    } else if (text.starts_with('u')) {
+        (void)std::from_chars(text.data() + 1, text.data() + text.size(), time.utime);
     }
     return time;
 }

@@ -2,7 +2,7 @@
 add_library(vps_options INTERFACE)
 target_compile_options(vps_options INTERFACE
     -Wall -Wextra -Wpedantic -Wshadow -Wnon-virtual-dtor -Wold-style-cast -Wcast-qual -Wformat=2
-    -Wimplicit-fallthrough -Werror -Werror=switch-enum
+    -Wimplicit-fallthrough -Werror -Werror=switch-enum -pthread
     # The source file's name without directories stands in every log line.
     -fmacro-prefix-map=${CMAKE_SOURCE_DIR}/=)
 if(VPS_SANITIZE)
@@ -21,8 +21,9 @@ function(vps_add_test name)
     cmake_parse_arguments(ARG "" "TIMEOUT;TSAN_SUPPRESSIONS" "SOURCES;LIBS" ${ARGN})
     add_executable(${name} ${ARG_SOURCES})
     target_link_libraries(${name} PRIVATE vps_options ${ARG_LIBS} GTest::gmock GTest::gtest_main)
-    # Tests are small and many; optimising their templates would take most of a build's time.
+    # Tests are small and many; optimising their templates, and reading these headers for each, would take most of a build's time.
     target_compile_options(${name} PRIVATE -O0 -g0)
+    target_precompile_headers(${name} REUSE_FROM test_headers)
     if(NOT ARG_TIMEOUT)
         set(ARG_TIMEOUT 120)
     endif()

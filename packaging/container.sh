@@ -28,8 +28,9 @@ make_root() {  # of this machine's release, from this machine's archive
 }
 
 boot() {
+    # A time zone that is mounted into it could not be replaced by the package of zones.
     systemd-nspawn --quiet --register=no --keep-unit -D "$root" --boot --kill-signal=SIGRTMIN+3 --console=pipe \
-        </dev/null >>"$work/console" 2>&1 &
+        --timezone=off </dev/null >>"$work/console" 2>&1 &
     container=$!
     for _ in $(seq 300); do
         leader=$(pgrep -P "$container" -x systemd || true)

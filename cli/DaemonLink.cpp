@@ -61,6 +61,10 @@ Ipc connect() {
         throw Failure(
             "the daemon's socket refuses this user; run it as the daemon's user or a member of its group");
     }
+    if (code == PLATFORM_ERROR_FAILED) {
+        throw Failure("another user's program serves the daemon's socket " + platform::rootedPath(kSocket) +
+                      ", nothing is told to it; see who made the file, and remove it");
+    }
     return Ipc(code == PLATFORM_ERROR_NONE ? ipc : nullptr);
 }
 

@@ -20,7 +20,8 @@ make_root() {  # of this machine's release, from this machine's archive
     require mmdebstrap systemd-container util-linux curl python3
     local release
     release=$(. /etc/os-release && echo "$VERSION_CODENAME")
-    mmdebstrap --quiet --variant=apt --include=systemd,systemd-sysv,dbus,procps "$release" "$root" \
+    # tzdata: every Debian has it, and apt removes it from none.
+    mmdebstrap --quiet --variant=apt --include=systemd,systemd-sysv,dbus,procps,tzdata "$release" "$root" \
         $(find /etc/apt -name '*.sources' -o -name 'sources.list' -type f)
     cp /etc/apt/apt.conf.d/* "$root/etc/apt/apt.conf.d/"
     mkdir "$root/packages"

@@ -97,6 +97,10 @@ int pims_ipc_create(const char* path, pims_ipc_h* ipc) {
         if (error == ENOENT || error == ECONNREFUSED || error == ENOTDIR) return PLATFORM_ERROR_NOT_FOUND;
         return error == EACCES || error == EPERM ? PLATFORM_ERROR_PERMISSION_DENIED : PLATFORM_ERROR_IO;
     }
+    if (!platform::ipc::isServerTrusted(fd)) {
+        close(fd);
+        return PLATFORM_ERROR_FAILED;
+    }
     auto handle = std::make_unique<pims_ipc_s>();
     handle->fd = fd;
     *ipc = handle.release();

@@ -83,9 +83,11 @@ public:
         // As soon as clients can connect a signal ends the service in order: at the latest when the loop begins to run.
         mSignals[0] = g_unix_signal_add(SIGTERM, onSignal, this);
         mSignals[1] = g_unix_signal_add(SIGINT, onSignal, this);
-        const int fd = openService(path, group, mode);
+        mClaim = claimService(path);
+        const int fd = mClaim < 0 ? mClaim : openService(path, group, mode);
         if (fd < 0) {
             for (const guint signal : mSignals) g_source_remove(signal);
+            if (mClaim >= 0) close(std::exchange(mClaim, -1));
             return fd;
         }
         mFd = fd;
@@ -123,6 +125,7 @@ public:
         struct stat info {};
         const std::string path = rootedPath(mPath);
         if (lstat(path.c_str(), &info) == 0 && info.st_ino == mInode) unlink(path.c_str());
+        close(std::exchange(mClaim, -1));
         mCommands.clear();
     }
 
@@ -208,6 +211,7 @@ private:
         return true;
     }
 
+    int mClaim = -1;  // keeps the path for this process
     int mFd = -1;
     guint mSource = 0;
     guint mSignals[2] = {};

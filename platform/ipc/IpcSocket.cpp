@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <cstddef>
 #include <cstring>
 #include <vector>
 
@@ -78,6 +79,31 @@ bool addressOf(const std::string& path, sockaddr_un* address) {
     return true;
 }
 
+int claimService(const std::string& path) {
+    sockaddr_un address{};
+    if (!addressOf(path, &address)) return PLATFORM_ERROR_INVALID_PARAMETER;
+    const std::string rooted = rootedPath(path);
+    const size_t slash = rooted.rfind('/');
+    struct stat folder {};
+    if (stat(rooted.substr(0, slash + 1).c_str(), &folder) != 0) {
+        dlog_print(DLOG_ERROR, kTag, "%s cannot be opened: %s", rooted.c_str(), std::strerror(errno));
+        return PLATFORM_ERROR_IO;
+    }
+    // A name without a file: nothing is left behind, however the process ends.
+    const std::string name = "pims-ipc:" + std::to_string(folder.st_dev) + ":" +
+                             std::to_string(folder.st_ino) + ":" + rooted.substr(slash + 1);
+    address = sockaddr_un{.sun_family = AF_UNIX, .sun_path = {}};
+    if (name.size() + 1 > sizeof address.sun_path) return PLATFORM_ERROR_INVALID_PARAMETER;
+    std::copy(name.begin(), name.end(), address.sun_path + 1);
+    const auto length = static_cast<socklen_t>(offsetof(sockaddr_un, sun_path) + 1 + name.size());
+    const int fd = socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC, 0);
+    if (fd == -1) return PLATFORM_ERROR_IO;
+    if (bind(fd, reinterpret_cast<const sockaddr*>(&address), length) == 0) return fd;
+    dlog_print(DLOG_ERROR, kTag, "%s is served by another process, no service is opened", rooted.c_str());
+    close(fd);
+    return PLATFORM_ERROR_FAILED;
+}
+
 int openService(const std::string& path, unsigned group, unsigned mode) {
     sockaddr_un address{};
     if (!addressOf(path, &address)) return PLATFORM_ERROR_INVALID_PARAMETER;
@@ -118,6 +144,15 @@ bool isPeerAllowed(int connection, const std::string& path) {
     if (getsockopt(connection, SOL_SOCKET, SO_PEERGROUPS, groups.data(), &length) != 0) return false;
     groups.resize(length / sizeof(gid_t));
     return std::find(groups.begin(), groups.end(), info.st_gid) != groups.end();
+}
+
+bool isServerTrusted(int connection) {
+    ucred peer{};
+    socklen_t length = sizeof peer;
+    if (getsockopt(connection, SOL_SOCKET, SO_PEERCRED, &peer, &length) != 0) return false;
+    if (peer.uid == 0 || peer.uid == geteuid()) return true;
+    struct stat stores {};
+    return stat(rootedPath("/opt/usr/dbspace").c_str(), &stores) == 0 && peer.uid == stores.st_uid;
 }
 
 }  // namespace platform::ipc

@@ -50,7 +50,8 @@ int pims_ipc_svc_deinit();
 
 // --- client: any one thread at a time a handle ----------------------------------------------------
 // Connects. PLATFORM_ERROR_NOT_FOUND when nobody serves the path, PLATFORM_ERROR_PERMISSION_DENIED when the caller may not or
-// what is there is no socket (links are not followed).
+// what is there is no socket (links are not followed), PLATFORM_ERROR_FAILED when it is served by a user who has nothing to do with the
+// device's stores.
 [[nodiscard]] int pims_ipc_create(const char* path, pims_ipc_h* ipc);
 int pims_ipc_destroy(pims_ipc_h ipc);
 // Blocks until the reply, at most `timeout_ms`. *data_out is NULL for a reply without data; the caller

@@ -1,8 +1,10 @@
 // Accounts, alarms and the opening of the service socket. (The wire itself is tested through the daemon.)
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
+#include <sqlite3.h>
 #include <sys/stat.h>
 
+#include <csignal>
 #include <filesystem>
 #include <fstream>
 
@@ -11,9 +13,47 @@
 #include "platform/alarm.h"
 #include "platform/error.h"
 #include "platform/ipc.h"
+#include "platform/root.h"
 #include "platform/support.h"
 #include "service/common/MainLoop.h"
 #include "support/TestRoot.h"
+
+namespace {
+
+constexpr uid_t kOwner = 4711;
+
+// A process of `user` that serves the socket while the object lives.
+class OtherUser {
+public:
+    OtherUser(uid_t user, const char* path) : mSocket(platform::rootedPath(path)) {
+        int ready[2];
+        EXPECT_EQ(pipe(ready), 0);
+        mPid = inOtherProcess([&] {
+            if (setuid(user) != 0 || pims_ipc_svc_init(path, user, 0666) != 0) return 1;
+            close(ready[0]);
+            close(ready[1]);
+            pause();
+            return 0;
+        });
+        close(ready[1]);
+        char byte = 0;
+        EXPECT_EQ(read(ready[0], &byte, 1), 0) << "until the other end is closed";
+        close(ready[0]);
+    }
+    ~OtherUser() {
+        kill(mPid, SIGKILL);
+        (void)statusOf(mPid);
+        std::filesystem::remove(mSocket);
+    }
+    OtherUser(const OtherUser&) = delete;
+    OtherUser& operator=(const OtherUser&) = delete;
+
+private:
+    const std::string mSocket;
+    pid_t mPid = 0;
+};
+
+}  // namespace
 
 TEST(Accounts, EventsReachEveryProcessTheWriterIncluded) {
     const TestRoot root;
@@ -99,6 +139,13 @@ int onAlarm(alarm_id_t id, void* data) {
     return 0;
 }
 
+void execute(const TestRoot& root, const char* sql) {
+    sqlite3* store = nullptr;
+    EXPECT_EQ(sqlite3_open(root.at("/opt/usr/data/alarms/alarms.db").c_str(), &store), SQLITE_OK);
+    EXPECT_EQ(sqlite3_exec(store, sql, nullptr, nullptr, nullptr), SQLITE_OK) << sqlite3_errmsg(store);
+    sqlite3_close(store);
+}
+
 std::vector<alarm_id_t> listed() {
     std::vector<alarm_id_t> ids;
     EXPECT_EQ(alarmmgr_enum_alarm_ids(
@@ -143,6 +190,24 @@ TEST(Alarms, ComeOnceAfterALongSleepAndAreListedUntilRemoved) {
     alarms.removesItself = true;
     ASSERT_TRUE(iterateUntil([&] { return alarms.calls.size() == 2; }, std::chrono::seconds(3)));
     EXPECT_TRUE(listed().empty());
+}
+
+TEST(Alarms, AStoreThatFailsNeitherLoopsNorForgets) {
+    const TestRoot root;
+    Alarms alarms;
+    ASSERT_EQ(alarmmgr_init("app"), 0);
+    ASSERT_EQ(alarmmgr_set_cb(onAlarm, &alarms), 0);
+    alarm_id_t id = 0;
+    ASSERT_EQ(alarmmgr_add_alarm(0, 1, 3600, nullptr, &id), 0);
+    execute(root, "CREATE TRIGGER full BEFORE UPDATE ON alarms BEGIN SELECT RAISE(ABORT, 'full'); END");
+
+    EXPECT_FALSE(iterateUntil([&] { return !alarms.calls.empty(); }, std::chrono::milliseconds(1300)));
+
+    execute(root, "DROP TRIGGER full");
+    alarm_id_t other = 0;
+    ASSERT_EQ(alarmmgr_add_alarm(0, 3600, 3600, nullptr, &other), 0);  // the timer is set anew
+    ASSERT_TRUE(iterateUntil([&] { return !alarms.calls.empty(); }));
+    EXPECT_EQ(alarms.calls, std::vector<alarm_id_t>{id});
 }
 
 TEST(ServiceSocket, OpensOnlyWhereItMay) {
@@ -203,6 +268,21 @@ TEST(ServiceSocket, ClientsFollowNoLink) {
     ASSERT_EQ(pims_ipc_create("/tmp/s", &ipc), 0);
     EXPECT_EQ(pims_ipc_destroy(ipc), 0);
     EXPECT_EQ(pims_ipc_svc_deinit(), 0);
+}
+
+TEST(ServiceSocket, NothingIsToldToAStranger) {
+    if (geteuid() != 0) GTEST_SKIP() << "only root can be somebody else";
+    const TestRoot root;
+    std::filesystem::permissions(root.path(), std::filesystem::perms::all);
+    std::filesystem::permissions(root.at("/tmp"), std::filesystem::perms::all);
+    ASSERT_EQ(chown(root.at("/opt/usr/dbspace").c_str(), kOwner, kOwner), 0);
+    for (const auto& [user, code] : {std::pair<uid_t, int>{kOwner, PLATFORM_ERROR_NONE},
+                                     std::pair<uid_t, int>{kOwner + 1, PLATFORM_ERROR_FAILED}}) {
+        OtherUser server(user, "/tmp/s");
+        pims_ipc_h ipc = nullptr;
+        EXPECT_EQ(pims_ipc_create("/tmp/s", &ipc), code) << user;
+        EXPECT_EQ(pims_ipc_destroy(ipc), 0);
+    }
 }
 
 TEST(IpcData, KeepsToItsLimits) {

@@ -19,6 +19,7 @@ using platform::SqlStore;
 namespace {
 
 constexpr int64_t kMsPerSecond = 1000;
+constexpr int64_t kRetryMs = 60 * kMsPerSecond;  // of a store that failed
 constexpr const char* kTag = "PLATFORM_ALARM";
 
 int64_t nowMs(clockid_t clock) {
@@ -107,14 +108,17 @@ private:
         }
         std::vector<Alarm> alarms;
         if (const int code = list(&alarms); code != PLATFORM_ERROR_NONE) return code;
-        itimerspec time{};
         const auto first = std::min_element(alarms.begin(), alarms.end(),
                                             [](const Alarm& a, const Alarm& b) { return a.due < b.due; });
-        if (first != alarms.end() && mCallback != nullptr) {
-            const int64_t due = std::max<int64_t>(first->due, 1);  // all zero would switch it off
-            time.it_value.tv_sec = due / kMsPerSecond;
-            time.it_value.tv_nsec = due % kMsPerSecond * 1'000'000;
-        }
+        if (first == alarms.end() || mCallback == nullptr) return setTimer(0);
+        return setTimer(std::max<int64_t>(first->due, 1));
+    }
+
+    // 0: off.
+    int setTimer(int64_t due) const {
+        itimerspec time{};
+        time.it_value.tv_sec = due / kMsPerSecond;
+        time.it_value.tv_nsec = due % kMsPerSecond * 1'000'000;
         return timerfd_settime(mDescriptor, TFD_TIMER_ABSTIME, &time, nullptr) == 0 ? PLATFORM_ERROR_NONE
                                                                                     : PLATFORM_ERROR_IO;
     }
@@ -127,13 +131,24 @@ private:
     }
 
     void deliver() {
+        const bool isStored = deliverDue(nowMs(CLOCK_BOOTTIME));
+        // What could not be read or stored is still due: at once again would be a loop.
+        if (isStored && arm() == PLATFORM_ERROR_NONE) return;
+        dlog_print(DLOG_ERROR, kTag, "the alarms' store fails, they are looked at again in %lld s",
+                   static_cast<long long>(kRetryMs / kMsPerSecond));
+        if (setTimer(nowMs(CLOCK_BOOTTIME) + kRetryMs) != PLATFORM_ERROR_NONE)
+            dlog_print(DLOG_ERROR, kTag, "the timer cannot be set");
+    }
+
+    // Whether the store took and told everything.
+    bool deliverDue(int64_t now) {
         std::vector<Alarm> alarms;
-        const int64_t now = nowMs(CLOCK_BOOTTIME);
-        if (list(&alarms) != PLATFORM_ERROR_NONE) return;
+        if (list(&alarms) != PLATFORM_ERROR_NONE) return false;
+        bool isStored = true;
         for (const Alarm& alarm : alarms) {
             if (alarm.due > now || mCallback == nullptr) continue;
             // The next time is stored first: a callback that ends the process is not called again at once.
-            int kept = 1;
+            int kept = 0;
             const int code =
                 alarm.interval > 0
                     ? mStore.write(
@@ -141,12 +156,12 @@ private:
                             {platform::alarm::nextExpiry(alarm.due, alarm.interval, now), alarm.id}}},
                           &kept)
                     : mStore.write({{"DELETE FROM alarms WHERE id = ?", {alarm.id}}}, &kept);
-            if (code != PLATFORM_ERROR_NONE)
-                dlog_print(DLOG_ERROR, kTag, "alarm %lld is not stored", static_cast<long long>(alarm.id));
+            isStored = isStored && code == PLATFORM_ERROR_NONE;
             // An alarm that an earlier callback of this round removed is not delivered.
-            if (kept > 0) mCallback(static_cast<alarm_id_t>(alarm.id), mUserParam);
+            if (code == PLATFORM_ERROR_NONE && kept > 0)
+                mCallback(static_cast<alarm_id_t>(alarm.id), mUserParam);
         }
-        if (arm() != PLATFORM_ERROR_NONE) dlog_print(DLOG_ERROR, kTag, "the timer cannot be set");
+        return isStored;
     }
 
     SqlStore mStore{

@@ -70,6 +70,12 @@ int SyncScheduleManager::removeSchedule(ISyncScheduleListener* listener) {
     return kOk;
 }
 
+void SyncScheduleManager::forget(const ISyncScheduleListener* listener) {
+    for (auto& [alarm, owner] : mListeners) {
+        if (owner == listener) owner = nullptr;
+    }
+}
+
 int SyncScheduleManager::nextAlarm(const ISyncScheduleListener* listener) const {
     for (const auto& [id, owner] : mListeners) {
         time_t expiry = 0;

@@ -16,6 +16,8 @@ public:
     [[nodiscard]] int addSchedule(ISyncScheduleListener* listener, int period);
     // -1 when the listener has no alarm, or the alarm service refused (the entry stays).
     int removeSchedule(ISyncScheduleListener* listener);
+    // For a listener that goes: an alarm that could not be removed calls nobody.
+    void forget(const ISyncScheduleListener* listener);
     // Seconds since 1970, 0 when the listener has no alarm.
     [[nodiscard]] int nextAlarm(const ISyncScheduleListener* listener) const;
 

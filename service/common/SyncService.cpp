@@ -244,6 +244,7 @@ void SyncService::schedule(const Kind& kind, const Account& account, SyncAgent* 
 
 void SyncService::unschedule(SyncAgent* agent) {
     SyncScheduleManager::getInstance().removeSchedule(agent);
+    SyncScheduleManager::getInstance().forget(agent);
     agent->runStatus().setNextAlarm(0);
 }
 

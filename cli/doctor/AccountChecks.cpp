@@ -9,6 +9,7 @@
 #include "SyncClient.h"
 #include "SyncStatus.h"
 #include "TokenFile.h"
+#include "common/PeerVerification.h"
 #include "doctor/Checks.h"
 #include "doctor/ServerProbe.h"
 #include "platform/error.h"
@@ -21,7 +22,6 @@ namespace {
 constexpr int64_t kMostClockDifferenceSec = 5 * 60;
 constexpr int64_t kDaySec = 24 * 60 * 60;
 constexpr int64_t kSoonDays = 14;
-constexpr const char* kVerifyPeer = "db/vantor-pim-sync/verify_peer";
 
 std::string accountName(int id) {
     return "account " + std::to_string(id);
@@ -65,18 +65,13 @@ std::set<std::string> serversOf(const std::map<int, StoredAccount>& accounts, Fi
     return urls;
 }
 
-bool verifiesPeers() {
-    int value = 0;
-    return vconf_get_int(kVerifyPeer, &value) == PLATFORM_ERROR_NONE && value == 1;
-}
-
 void checkCertificate(const std::string& url, const ServerAnswer& answer, Findings& findings) {
     if (!answer.certificateProblem.empty()) {
         const std::string text =
             "the certificate of " + url + " is not to be trusted: " + answer.certificateProblem;
         const std::string advice =
             "ask whoever runs the server for a valid one, or install its authority's certificate";
-        verifiesPeers() ? findings.problem(text, advice) : findings.notice(text, advice);
+        isPeerVerified() ? findings.problem(text, advice) : findings.notice(text, advice);
     }
     const int64_t days = (answer.certificateEndSec - time(nullptr)) / kDaySec;
     if (answer.certificateEndSec == 0 || days > kSoonDays) return;

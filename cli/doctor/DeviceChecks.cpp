@@ -12,6 +12,7 @@
 #include "Device.h"
 #include "Failure.h"
 #include "ReadOnlyDatabase.h"
+#include "common/PeerVerification.h"
 #include "doctor/Checks.h"
 #include "platform/error.h"
 #include "platform/keys.h"
@@ -157,7 +158,7 @@ void checkSettings(std::vector<Finding>* all) {
         findings.notice("scheduled syncs are switched off",
                         "switch them on with: vantor-pim-syncctl setting set db/account/auto_sync 1");
     }
-    if (vconf_get_int("db/vantor-pim-sync/verify_peer", &value) != PLATFORM_ERROR_NONE || value != 1) {
+    if (!isPeerVerified()) {
         findings.notice(
             "servers are not asked to prove who they are, so another could pose as one and read the account",
             "turn it on with: vantor-pim-syncctl setting set db/vantor-pim-sync/verify_peer 1");

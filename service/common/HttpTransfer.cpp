@@ -8,10 +8,10 @@
 #include "common/Handles.h"
 #include "common/HeaderText.h"
 #include "common/HttpStatus.h"
+#include "common/PeerVerification.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 #include "platform/error.h"
-#include "platform/settings.h"
 
 using sync_result::kAborted;
 using sync_result::kFailed;
@@ -60,11 +60,6 @@ int beforeRequest(void* guard, char*, char*, int, int) {
     auto* state = static_cast<SendGuard*>(guard);
     ++state->sent;
     return state->writes && state->sent > 1 ? CURL_PREREQFUNC_ABORT : CURL_PREREQFUNC_OK;
-}
-
-bool isPeerVerified() {
-    int value = 0;
-    return vconf_get_int("db/vantor-pim-sync/verify_peer", &value) == PLATFORM_ERROR_NONE && value == 1;
 }
 
 int resultOf(CURLcode code) {

@@ -96,9 +96,14 @@ using FileHandle = std::unique_ptr<FILE, FreeWith<fclose>>;
 
 FileHandle openImage(const std::string& path, long* size) {
     const int fd = open(platform::rootedPath(path).c_str(), O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK);
-    FileHandle file(fd != -1 ? fdopen(fd, "rb") : nullptr);
+    if (fd == -1) return nullptr;
+    FileHandle file(fdopen(fd, "rb"));
+    if (!file) {
+        close(fd);
+        return nullptr;
+    }
     struct stat info {};
-    if (!file || fstat(fd, &info) != 0 || !S_ISREG(info.st_mode)) return nullptr;
+    if (fstat(fd, &info) != 0 || !S_ISREG(info.st_mode)) return nullptr;
     *size = static_cast<long>(info.st_size);
     return file;
 }
@@ -145,6 +150,7 @@ HttpTransfer CtCurl::makeTransfer(const std::string& url, const char* method, Ac
 
 int CtCurl::exchange(HttpTransfer& transfer) {
     mHttpStatus = 0;
+    mHasAsked = true;
     const int result = transfer.perform();
     mHttpStatus = transfer.status;
     // Whom anybody may ask (profiles, their images) does not speak for the account's server.
@@ -332,6 +338,8 @@ int CtCurl::getOrbitImage(const std::string& imageUrl, CtStagedPhoto* photo) {
 int CtCurl::decide(const char* failureText, Access access, Timeouts timeouts,
                    const std::function<int()>& impl) {
     bool isTimeout = false;
+    mHttpStatus = 0;
+    mHasAsked = false;
     for (int attempt = 0; attempt < kMaxAttempts; ++attempt) {
         mUsedToken = access == Access::kAccount ? mpAccount->getAccessToken() : std::string();
         const int result = impl();

@@ -48,6 +48,8 @@ public:
 
     // Of the last attempt, 0 when there was no reply.
     [[nodiscard]] long lastHttpStatus() const { return mHttpStatus; }
+    // Whether the last operation came as far as a request; a file that cannot be read ends it before.
+    [[nodiscard]] bool hasAsked() const { return mHasAsked; }
     // Whether the server has asked for a pause: whatever is sent before its end is refused.
     [[nodiscard]] bool isAskedToWait() const;
 
@@ -83,6 +85,7 @@ private:
     std::shared_ptr<HttpShare> mpShare;
     std::string mUsedToken;
     long mHttpStatus = 0;
+    bool mHasAsked = false;
     long mTimeout = 30;  // seconds
 };
 

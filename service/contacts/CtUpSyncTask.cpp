@@ -31,8 +31,6 @@ CtUpReply CtUpSyncTask::judge(int result) const {
     reply.result = result;
     reply.answer = result == kTokenFailed ? CtAnswer::kNoAnswer : answerOf(mpCurl->lastHttpStatus());
     reply.isForGood = result != kTokenFailed && http_status::isRefusedForGood(mpCurl->lastHttpStatus());
-    // A body that could not be sent was not done.
-    if (reply.answer == CtAnswer::kAccepted && result != kOk) reply.answer = CtAnswer::kRefused;
     if (reply.answer == CtAnswer::kNoAnswer) {
         reply.reason = "the server could not be reached or gave no usable answer";
     } else if (!reply.isAccepted()) {
@@ -88,6 +86,11 @@ std::string CtUpSyncTask::photoUrl(const std::string& contactId) const {
 CtUpReply CtUpSyncTask::upsertPhoto(const std::string& contactId, const std::string& photoEtag,
                                     const std::string& path) {
     CtUpReply reply = judge(mpCurl->upsertImage(photoUrl(contactId), photoEtag, path));
+    if (!mpCurl->hasAsked()) {
+        // That says nothing of the server: the other items go on.
+        reply.answer = CtAnswer::kRefused;
+        reply.reason = "its photo cannot be read";
+    }
     if (!reply.isAccepted()) {
         SYNC_ERR("Can't upsert image!");
         return reply;

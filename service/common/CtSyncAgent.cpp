@@ -11,6 +11,23 @@ CtSyncAgent::CtSyncAgent(Account* account) : DirectedSyncAgent(account, VANTOR_P
                  std::make_unique<CtUpSyncDirector>(account, worker()));
 }
 
+// A store that could not be opened at the start is opened once it can be.
+void CtSyncAgent::prepare() {
+    CtDataManager& manager = CtDataManager::getInstance();
+    if (manager.metaData() == nullptr && manager.prepareSync() == sync_result::kOk)
+        (void)manager.addAccount(mpAccount->getAccountId());
+}
+
+int CtSyncAgent::doUpSync() {
+    prepare();
+    return DirectedSyncAgent::doUpSync();
+}
+
+int CtSyncAgent::doDownSync() {
+    prepare();
+    return DirectedSyncAgent::doDownSync();
+}
+
 bool CtSyncAgent::hasSomethingToSend() {
     return CtDataManager::getInstance().hasSomethingToSend(mpAccount->getAccountId());
 }

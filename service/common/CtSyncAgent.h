@@ -8,7 +8,12 @@ public:
     explicit CtSyncAgent(Account* account);
 
 protected:
+    int doUpSync() override;
+    int doDownSync() override;
     [[nodiscard]] bool hasSomethingToSend() override;
     void countPending(int* dirty, int* deleted) override;
     void onRequestsDropped() override;
+
+private:
+    void prepare();
 };

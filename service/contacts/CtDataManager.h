@@ -7,6 +7,7 @@
 // Operations that ask by a uri alone cross accounts; the sync uses those bound to an account.
 #pragma once
 
+#include <atomic>
 #include <map>
 #include <memory>
 #include <mutex>
@@ -132,7 +133,7 @@ private:
     void requestUploads(bool (CtDataManager::*isChanged)(int), bool usesPending);
 
     std::mutex mPrepareMutex;
-    bool mIsPrepared = false;  // set once, before there is a worker
+    std::atomic<bool> mIsPrepared = false;  // set once, after what it speaks of
     std::unique_ptr<CtMetaDataDBHelper> mpMetaData;
     std::mutex mPendingMutex;
     std::map<int, bool>

@@ -66,11 +66,6 @@ private:
     std::vector<size_t> mSkipped;
 };
 
-int lastChangeVersion() {
-    int version = 0;
-    return calendar_db_get_last_change_version(&version) == PLATFORM_ERROR_NONE ? version : 0;
-}
-
 }  // namespace
 
 CalItemWriter::CalItemWriter(CalItemStore* store, CalBookSnapshot* snapshot)
@@ -158,7 +153,8 @@ int writeBulk(const CalItemKind& kind, Bulk<Planned>* bulk, bool isNew,
         SYNC_ERR("%s", isNew ? kind.texts.insertItems : kind.texts.updateItems);
         return kFailed;
     }
-    const int version = lastChangeVersion();
+    int version = 0;
+    if (calendar_db_get_last_change_version(&version) != PLATFORM_ERROR_NONE) return kFailed;
     bulk->finish(kind.id, skipped, [&](Planned* planned, int id) {
         planned->row.event_id = id;
         planned->row.version = version;
@@ -253,7 +249,8 @@ int CalItemWriter::deleteExceptions(const std::vector<PlannedInstance*>& instanc
         SYNC_ERR("db_delete_records fail");
         return kFailed;
     }
-    const int version = lastChangeVersion();
+    int version = 0;
+    if (calendar_db_get_last_change_version(&version) != PLATFORM_ERROR_NONE) return kFailed;
     std::unordered_set<size_t> left(skipped.begin(), skipped.end());
     for (size_t i = 0; i < instances.size(); ++i) {
         if (left.contains(i)) {

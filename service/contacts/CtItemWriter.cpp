@@ -16,11 +16,6 @@ using sync_result::kOk;
 
 namespace {
 
-int lastChangeVersion() {
-    int version = 0;
-    return contacts_db_get_last_change_version(&version) == PLATFORM_ERROR_NONE ? version : 0;
-}
-
 // The image on the device, which a write without it would take away.
 std::string imageOf(int contactId) {
     ContactsList list;
@@ -113,7 +108,8 @@ int CtItemWriter::writeBulk(Bulk* bulk, bool isNew, std::vector<BulkItem>* writt
         SYNC_ERR("Insert failed! (list count %zu)", bulk->items.size());
         return kFailed;
     }
-    const int version = lastChangeVersion();
+    int version = 0;
+    if (contacts_db_get_last_change_version(&version) != PLATFORM_ERROR_NONE) return kFailed;
     const std::unordered_set<size_t> left(skipped.begin(), skipped.end());
     for (size_t i = 0; i < bulk->items.size(); ++i) {
         BulkItem& item = bulk->items[i];
@@ -206,8 +202,7 @@ int CtItemWriter::writeGroupRecord(CtGroupItem& item, bool* isWritten) const {
         SYNC_ERR("%s", isNew ? "insert records fail" : "replace records fail");
         return kFailed;
     }
-    item.row.version = lastChangeVersion();
-    return kOk;
+    return contacts_db_get_last_change_version(&item.row.version) == PLATFORM_ERROR_NONE ? kOk : kFailed;
 }
 
 int CtItemWriter::writeGroups(std::vector<CtGroupItem>* items) {

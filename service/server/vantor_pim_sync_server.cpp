@@ -51,6 +51,8 @@ static int __server_main() {
     platform::protectMemory();
     tuneMemory();
     std::signal(SIGHUP, SIG_IGN);  // there is nothing to read again: settings and accounts are watched
+    std::signal(SIGPIPE,
+                SIG_IGN);  // of a client, a server or a log that went away: the write's error says so
     umask(kFileCreationMask);
     initializeTypes();
     (void)pims_ipc_svc_init(kServiceSocket, socketGroup(), kSocketMode);

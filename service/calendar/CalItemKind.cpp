@@ -22,6 +22,14 @@ std::string CalItemKind::comparable(calendar_record_h record) const {
                                                                        : std::string();
 }
 
+bool CalItemKind::saysTheSame(JsonObject* item, calendar_record_h record) const {
+    CalendarRecord server;
+    if (convert(item, &server) != sync_result::kOk) return true;
+    const std::string says = buildComparable(server.get());
+    // Mostly equal without the way through the JSON.
+    return says == buildComparable(record) || says == comparable(record);
+}
+
 namespace {
 
 constexpr unsigned kEventServerFields[] = {CALENDAR_EVENT_STATUS, CALENDAR_EVENT_ORGANIZER_NAME,

@@ -54,6 +54,8 @@ struct CalItemKind {
     // the item cannot be converted.
     [[nodiscard]] std::string comparable(calendar_record_h record) const;
     [[nodiscard]] std::string comparable(JsonObject* item) const;
+    // Whether the server's item says what the device's record says; true when it does not say enough to tell.
+    [[nodiscard]] bool saysTheSame(JsonObject* item, calendar_record_h record) const;
 };
 
 extern const CalItemKind kEventKind;

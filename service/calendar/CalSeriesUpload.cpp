@@ -110,8 +110,10 @@ void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, c
     }
     std::string etag = before.etag;
     JsonNodePtr item;
-    if (!update(row, uri, body, &etag, &item)) return;
+    const UpAnswer answer = update(row, uri, body, &etag, &item);
+    if (answer != UpAnswer::kAccepted && answer != UpAnswer::kGone) return;
     row.uri = uri;
+    if (answer == UpAnswer::kGone) return removeGone(row, version);
     row.etag = etag;
     row.dirty = 0;
     store(row, version, seriesVersion, std::move(item));  // an exception is as old as its series

@@ -53,6 +53,13 @@ UpReply CalUpSyncTask::judge(int result, const std::string& body) {
     reply.isForGood = http_status::isRefusedForGood(status);
     if (isRead && reply.answer == UpAnswer::kAccepted && !reply.uri.empty()) reply.item = parser.copyRoot();
     reply.isCancelled = isRead && json_access::textOr(parser.root(), "status", "") == "cancelled";
+    if (reply.answer == UpAnswer::kAccepted && !isRead && !body.empty()) {
+        // Whoever answers so, as the page where a network wants a login, is not the provider.
+        reply.answer = UpAnswer::kUnclear;
+        reply.result = kFailed;
+        reply.reason = "the answer is not one of the provider's";
+        return reply;
+    }
     if (reply.answer != UpAnswer::kAccepted) {
         reply.result = kFailed;
         reply.reason = "the server answered with error " + std::to_string(status);
@@ -61,7 +68,18 @@ UpReply CalUpSyncTask::judge(int result, const std::string& body) {
     return reply;
 }
 
+UpReply CalUpSyncTask::twice(const std::function<UpReply()>& request) {
+    UpReply reply = request();
+    if (reply.answer != UpAnswer::kGone) return reply;
+    SYNC_ERR("the server says that it does not have the item, it is asked again");
+    return request();
+}
+
 UpReply CalUpSyncTask::getEtag(const std::string& bookUri, const std::string& uri) {
+    return twice([&] { return getEtagOnce(bookUri, uri); });
+}
+
+UpReply CalUpSyncTask::getEtagOnce(const std::string& bookUri, const std::string& uri) {
     std::string body;
     const int result = (mCurl.*mRequests.getEtag)(bookUri, uri, &body);
     if (result != kOk) SYNC_ERR("CalCurl getEtagUri fail(%d)", result);
@@ -90,10 +108,12 @@ UpReply CalUpSyncTask::insert(const std::string& bookUri, const std::string& bod
 }
 
 UpReply CalUpSyncTask::update(const std::string& bookUri, const std::string& uri, const std::string& body) {
-    std::string answer;
-    const int result = (mCurl.*mRequests.update)(bookUri, uri, body, &answer);
-    if (result != kOk) SYNC_ERR("CalCurl update fail(%d)", result);
-    UpReply reply = judge(result, answer);
+    UpReply reply = twice([&] {
+        std::string answer;
+        const int result = (mCurl.*mRequests.update)(bookUri, uri, body, &answer);
+        if (result != kOk) SYNC_ERR("CalCurl update fail(%d)", result);
+        return judge(result, answer);
+    });
     if (reply.answer != UpAnswer::kAccepted || reply.uri.empty() || reply.uri == uri) return reply;
     reply.answer = UpAnswer::kUnclear;
     reply.result = kFailed;
@@ -102,10 +122,12 @@ UpReply CalUpSyncTask::update(const std::string& bookUri, const std::string& uri
 }
 
 UpReply CalUpSyncTask::remove(const std::string& bookUri, const std::string& uri) {
-    std::string answer;
-    const int result = (mCurl.*mRequests.remove)(bookUri, uri, &answer);
-    if (result != kOk) SYNC_ERR("CalCurl update fail(%d)", result);
-    return judge(result, answer);
+    return twice([&] {
+        std::string answer;
+        const int result = (mCurl.*mRequests.remove)(bookUri, uri, &answer);
+        if (result != kOk) SYNC_ERR("CalCurl update fail(%d)", result);
+        return judge(result, answer);
+    });
 }
 
 CalUpSyncEventTask::CalUpSyncEventTask(Account* account, IProgressObserver* observer,

@@ -2,6 +2,7 @@
 // Owner: a director.   Threads: one worker.
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -58,6 +59,9 @@ protected:
 private:
     // What the answer means; reads id, etag and the error from the body.
     [[nodiscard]] UpReply judge(int result, const std::string& body);
+    // One answer that the item is gone is not believed: what a user changed goes with it.
+    [[nodiscard]] static UpReply twice(const std::function<UpReply()>& request);
+    [[nodiscard]] UpReply getEtagOnce(const std::string& bookUri, const std::string& uri);
 
     const Requests& mRequests;
     CalCurl mCurl;

@@ -204,6 +204,7 @@ void CalUploader::insertItem(Row& row, calendar_record_h record, const std::stri
             row.etag = reply.etag;
             // A series stays marked until the server has its cancelled instances too.
             row.dirty = hasUnsentDates(row, record) ? 1 : 0;
+            compareWithSent(row, reply.item, record);
             return store(row, seenVersion(row, record), seenVersion(row, record), std::move(reply.item));
         case UpAnswer::kRefused: {
             fail(row, reply);
@@ -228,35 +229,51 @@ void CalUploader::updateItem(Row& row, calendar_record_h record, const std::stri
                  row.uri.c_str());
     }
     JsonNodePtr item;
-    if (!update(row, row.uri, body, &row.etag, &item)) return;
+    const UpAnswer answer = update(row, row.uri, body, &row.etag, &item);
+    if (answer == UpAnswer::kGone) return removeGone(row, version);
+    if (answer != UpAnswer::kAccepted) return;
     row.dirty = hasUnsentDates(row, record) ? 1 : 0;
+    compareWithSent(row, item, record);
     store(row, version, version, std::move(item));
 }
 
-bool CalUploader::update(const Row& row, const std::string& uri, const std::string& body, std::string* etag,
-                         JsonNodePtr* item) {
+// What the server made of it must come down: then the etag stays behind.
+void CalUploader::compareWithSent(Row& row, const JsonNodePtr& item, calendar_record_h record) {
+    if (item == nullptr || mKind.saysTheSame(jsonObjectOf(item), record)) return;
+    SYNC_INFO("%s(%s) is not what was sent, it is compared again", mKind.itemName, row.uri.c_str());
+    row.etag.clear();
+}
+
+UpAnswer CalUploader::update(const Row& row, const std::string& uri, const std::string& body,
+                             std::string* etag, JsonNodePtr* item) {
     UpReply answer = mTask.update(mBook.uri, uri, body);
+    if (answer.answer == UpAnswer::kGone) return answer.answer;
     if (answer.answer != UpAnswer::kAccepted) {
         endWith(row, answer, End::kNone);
-        return false;
+        return answer.answer;
     }
     if (answer.isCancelled) {
         // It takes changes but stays cancelled: without an etag the row differs from the list, and the download takes it away.
         etag->clear();
         SYNC_ERR("%s(%s) is cancelled on the server, the device's change is dropped", mKind.itemName,
                  uri.c_str());
-        return true;
+        return UpAnswer::kAccepted;
     }
     const UpReply after = mTask.getEtag(mBook.uri, uri);
     if (after.answer != UpAnswer::kAccepted) {
         SYNC_ERR("Failed to get etag");
         if (after.answer == UpAnswer::kNoAnswer) endWith(row, after, End::kAll);
+        // Then nothing names the item that was changed.
+        if (answer.uri.empty()) {
+            endWith(row, after, End::kNone);
+            return UpAnswer::kUnclear;
+        }
     }
     // What somebody else wrote in between comes down with the next download, so the etag of our own write is kept.
     const std::string& known = !answer.etag.empty() ? answer.etag : after.etag;
     if (!known.empty()) *etag = known;
     *item = std::move(answer.item);
-    return true;
+    return UpAnswer::kAccepted;
 }
 
 // The device's copy goes with the next download.

@@ -68,9 +68,10 @@ private:
     void updateItem(Row& row, calendar_record_h record, const std::string& body);
     void removeGone(Row& row, int version);
     void sendDeleted(Row& row);
-    // PATCH between two looks at the etag; true with the etag that the row takes when the server took it.
-    [[nodiscard]] bool update(const Row& row, const std::string& uri, const std::string& body,
-                              std::string* etag, JsonNodePtr* item);
+    // PATCH between two looks at the etag: accepted with the etag that the row takes; gone; or anything else, which is noted.
+    [[nodiscard]] UpAnswer update(const Row& row, const std::string& uri, const std::string& body,
+                                  std::string* etag, JsonNodePtr* item);
+    void compareWithSent(Row& row, const JsonNodePtr& item, calendar_record_h record);
     void store(Row& row, int version, int expectedVersion, JsonNodePtr item);
     // The records learn what the server calls them.
     [[nodiscard]] int writeBack();

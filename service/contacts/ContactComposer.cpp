@@ -170,6 +170,10 @@ ContactComposer::Composed ContactComposer::composeElement(const CtSection& secti
     const bool isNote = &section == &ct_mappings::kNote;
     Composed composed{.element = {.name = isNote ? "atom:content" : ctXmlName(section.member)}};
     for (const CtField& field : section.fields) composeField(field, child, &composed);
+    // A field of the user's may be empty, but the wire wants its value.
+    auto& attributes = composed.element.attributes;
+    if (&section == &ct_mappings::kUserDefined && attributes.size() == 1 && attributes[0].first == "key")
+        attributes.emplace_back("value", "");
     if (section.types != nullptr) addType(section, child, &composed.element);
     return composed;
 }

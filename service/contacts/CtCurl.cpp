@@ -132,9 +132,30 @@ std::string CtCurl::peopleBase() const {
     return server_address::peopleBase(*mpAccount);
 }
 
-bool CtCurl::isOwn(const std::string& url) const {
+// A server that knows itself by another name, behind a proxy or by its number, writes its links so. The token goes nowhere but to
+// the account's own.
+std::string CtCurl::atOwnServer(const std::string& url) {
     const std::string origin = originOfUrl(url);
-    return !origin.empty() && origin == originOfUrl(feedBase());
+    const std::string own = originOfUrl(feedBase());
+    if (!origin.starts_with("http") || own.empty()) return {};
+    if (origin == own) {
+        mAskedServer = own;
+        return url;
+    }
+    // A link of the server that the account had before says nothing about the new one.
+    if (mAskedServer != own) return {};
+    const CurlUrl parsed(curl_url());
+    if (!parsed || curl_url_set(parsed.get(), CURLUPART_URL, url.c_str(), 0) != CURLUE_OK) return {};
+    const std::string query = partOf(parsed.get(), CURLUPART_QUERY);
+    SYNC_INFO("%s is asked of the account's server", url.c_str());
+    return own + partOf(parsed.get(), CURLUPART_PATH) + (query.empty() ? "" : "?" + query);
+}
+
+int CtCurl::notAsked(const std::string& url) {
+    SYNC_ERR("%s is no address that can be asked", url.c_str());
+    mHttpStatus = 0;
+    mHasAsked = false;
+    return kFailed;
 }
 
 bool CtCurl::isAskedToWait() const {
@@ -231,7 +252,8 @@ int CtCurl::getImageImpl(const std::string& url, const std::string& etag, CtStag
     return fetchImage(transfer, photo);
 }
 
-int CtCurl::upsertImageImpl(const std::string& url, const std::string& etag, const std::string& path) {
+int CtCurl::upsertImageImpl(const std::string& url, const std::string& etag, const std::string& path,
+                            std::string* reply) {
     long size = 0;
     const FileHandle file = openImage(path, &size);
     if (!file) {
@@ -244,6 +266,8 @@ int CtCurl::upsertImageImpl(const std::string& url, const std::string& etag, con
     addMatch(&transfer.headers, etag);
     transfer.bodyFile = file.get();
     transfer.bodyFileSize = size;
+    reply->clear();
+    transfer.reply = reply;
     return exchange(transfer);
 }
 
@@ -262,13 +286,10 @@ int CtCurl::getOrbitImageImpl(const std::string& url, CtStagedPhoto* photo) {
 // --- operations
 
 int CtCurl::get(const std::string& url, std::string* text) {
-    if (!isOwn(url)) {
-        SYNC_ERR("%s is not on the account's server, it is not asked", url.c_str());
-        mHttpStatus = 0;
-        return kFailed;
-    }
+    const std::string own = atOwnServer(url);
+    if (own.empty()) return notAsked(url);
     return decide("Getting XML from server Failed!", Access::kAccount, Timeouts::kRepeated,
-                  [&] { return getImpl(url, text); });
+                  [&] { return getImpl(own, text); });
 }
 
 int CtCurl::insert(CtItemType type, const std::string& entry, std::string* reply) {
@@ -301,18 +322,16 @@ int CtCurl::remove(const std::string& editUrl, const std::string& etag, std::str
 }
 
 int CtCurl::getImage(const std::string& photoUrl, const std::string& photoEtag, CtStagedPhoto* photo) {
-    if (!isOwn(photoUrl)) {
-        SYNC_ERR("the photo %s is not on the account's server, it is not fetched", photoUrl.c_str());
-        mHttpStatus = 0;
-        return kFailed;
-    }
+    const std::string own = atOwnServer(photoUrl);
+    if (own.empty()) return notAsked(photoUrl);
     return decide("Getting Image from server Failed!", Access::kAccount, Timeouts::kRepeated,
-                  [&] { return getImageImpl(photoUrl, photoEtag, photo); });
+                  [&] { return getImageImpl(own, photoEtag, photo); });
 }
 
-int CtCurl::upsertImage(const std::string& photoUrl, const std::string& photoEtag, const std::string& path) {
+int CtCurl::upsertImage(const std::string& photoUrl, const std::string& photoEtag, const std::string& path,
+                        std::string* reply) {
     return decide("Updating item on server Failed!", Access::kAccount, Timeouts::kRepeated,
-                  [&] { return upsertImageImpl(photoUrl, photoEtag, path); });
+                  [&] { return upsertImageImpl(photoUrl, photoEtag, path, reply); });
 }
 
 int CtCurl::getOrbit(const std::string& personId, std::string* profile) {

@@ -28,8 +28,8 @@ public:
     // client lives. Without a trailing slash.
     [[nodiscard]] std::string feedBase() const;
     [[nodiscard]] std::string peopleBase() const;
-    // Whether a URL that the server gave leads to the server itself; nothing else gets the account's token.
-    [[nodiscard]] bool isOwn(const std::string& url) const;
+    // The URL that the server gave, at the account's server: nothing else gets the account's token. Empty when it is none.
+    [[nodiscard]] std::string atOwnServer(const std::string& url);
 
     [[nodiscard]] int get(const std::string& url, std::string* text);
     [[nodiscard]] int insert(CtItemType type, const std::string& entry, std::string* reply);
@@ -41,7 +41,7 @@ public:
                                CtStagedPhoto* photo);
     // An empty etag: there was no photo. `path` is below the root.
     [[nodiscard]] int upsertImage(const std::string& photoUrl, const std::string& photoEtag,
-                                  const std::string& path);
+                                  const std::string& path, std::string* reply);
     // Without authorisation, as the next.
     [[nodiscard]] int getOrbit(const std::string& personId, std::string* profile);
     [[nodiscard]] int getOrbitImage(const std::string& imageUrl, CtStagedPhoto* photo);
@@ -58,6 +58,7 @@ private:
     enum class Timeouts { kRepeated, kFinal };
 
     [[nodiscard]] HttpTransfer makeTransfer(const std::string& url, const char* method, Access access);
+    [[nodiscard]] int notAsked(const std::string& url);
     // One exchange: 0 with lastHttpStatus(), -1, or -2 when it timed out.
     [[nodiscard]] int exchange(HttpTransfer& transfer);
     [[nodiscard]] int sendEntry(const char* method, const std::string& url, const std::string& etag,
@@ -70,7 +71,7 @@ private:
     [[nodiscard]] int removeImpl(const std::string& url, const std::string& etag, std::string* reply);
     [[nodiscard]] int getImageImpl(const std::string& url, const std::string& etag, CtStagedPhoto* photo);
     [[nodiscard]] int upsertImageImpl(const std::string& url, const std::string& etag,
-                                      const std::string& path);
+                                      const std::string& path, std::string* reply);
     [[nodiscard]] int getOrbitImpl(const std::string& url, std::string* profile);
     [[nodiscard]] int getOrbitImageImpl(const std::string& url, CtStagedPhoto* photo);
 
@@ -86,7 +87,8 @@ private:
     std::string mUsedToken;
     long mHttpStatus = 0;
     bool mHasAsked = false;
-    long mTimeout = 30;  // seconds
+    std::string mAskedServer;  // of the last URL that was the server's own
+    long mTimeout = 30;        // seconds
 };
 
 // The URL with its size parameter set to 720.

@@ -1,5 +1,10 @@
 #include "contacts/CtUpSyncTask.h"
 
+#include <glib.h>
+
+#include <string_view>
+#include <utility>
+
 #include "common/HttpStatus.h"
 #include "common/SyncLog.h"
 #include "common/UrlText.h"
@@ -22,6 +27,23 @@ CtAnswer answerOf(long status) {
     constexpr long kClientError = 400;
     return status >= kClientError && status < http_status::kServerError ? CtAnswer::kRefused
                                                                         : CtAnswer::kUnclear;
+}
+
+// Whoever answers so, as the page where a network wants a login, is not the provider, and has done nothing.
+CtUpReply notOfProvider(CtUpReply reply) {
+    reply.answer = CtAnswer::kUnclear;
+    reply.result = kFailed;
+    reply.reason = "the answer is not one of the provider's";
+    return reply;
+}
+
+bool isPage(const std::string& text) {
+    const size_t begin = text.find_first_not_of(" \t\r\n");
+    if (begin == std::string::npos) return false;
+    const auto startsWith = [&](std::string_view word) {
+        return g_ascii_strncasecmp(text.c_str() + begin, word.data(), word.size()) == 0;
+    };
+    return startsWith("<html") || startsWith("<!doctype");
 }
 
 }  // namespace
@@ -66,15 +88,19 @@ CtUpReply CtUpSyncTask::update(CtItemType type, const std::string& id, const std
     std::string text;
     const std::string url = CtIdUtil::makeEditHref(mpCurl->feedBase(), type, id) + kJson;
     CtUpReply reply = judge(mpCurl->update(url, etag, entry, &text));
-    if (reply.isAccepted() && CtEntryMetaDataParser::getMetaData(text, &reply.meta) != kOk)
-        SYNC_ERR("%s", kKeepsEtag);
-    return reply;
+    if (!reply.isAccepted() || CtEntryMetaDataParser::getMetaData(text, &reply.meta) == kOk) return reply;
+    SYNC_ERR("%s", kKeepsEtag);
+    if (!text.empty()) return notOfProvider(std::move(reply));
+    CtUpReply now = read(type, id);
+    if (!now.isAccepted()) return notOfProvider(std::move(now));
+    return now;
 }
 
 CtUpReply CtUpSyncTask::remove(CtItemType type, const std::string& id, const std::string& etag) {
     std::string text;
     CtUpReply reply =
         judge(mpCurl->remove(CtIdUtil::makeEditHref(mpCurl->feedBase(), type, id), etag, &text));
+    if (reply.isAccepted() && isPage(text)) reply = notOfProvider(std::move(reply));
     if (!reply.isAccepted() && reply.answer != CtAnswer::kGone) SYNC_ERR("fail");
     return reply;
 }
@@ -85,7 +111,9 @@ std::string CtUpSyncTask::photoUrl(const std::string& contactId) const {
 
 CtUpReply CtUpSyncTask::upsertPhoto(const std::string& contactId, const std::string& photoEtag,
                                     const std::string& path) {
-    CtUpReply reply = judge(mpCurl->upsertImage(photoUrl(contactId), photoEtag, path));
+    std::string text;
+    CtUpReply reply = judge(mpCurl->upsertImage(photoUrl(contactId), photoEtag, path, &text));
+    if (reply.isAccepted() && isPage(text)) reply = notOfProvider(std::move(reply));
     if (!mpCurl->hasAsked()) {
         // That says nothing of the server: the other items go on.
         reply.answer = CtAnswer::kRefused;
@@ -107,6 +135,7 @@ CtUpReply CtUpSyncTask::upsertPhoto(const std::string& contactId, const std::str
 CtUpReply CtUpSyncTask::removePhoto(const std::string& contactId, const std::string& photoEtag) {
     std::string text;
     CtUpReply reply = judge(mpCurl->remove(photoUrl(contactId), photoEtag, &text));
+    if (reply.isAccepted() && isPage(text)) return notOfProvider(std::move(reply));
     if (reply.answer == CtAnswer::kGone) reply.answer = CtAnswer::kAccepted;
     if (!reply.isAccepted()) return reply;
     if (!text.empty() && CtEntryMetaDataParser::getMetaData(text, &reply.meta) == kOk) return reply;

@@ -39,6 +39,11 @@ void clearMarks(CtGroupSyncRow* row) {
     row->deleted = row->dirty = 0;
 }
 
+// Whether the server's entry is to be looked at before it is tried again. One answer that it is gone is not believed either.
+bool mayHaveMovedOn(const CtUpReply& reply) {
+    return reply.answer == CtAnswer::kConflict || reply.answer == CtAnswer::kGone;
+}
+
 // Whether nobody but the server may delete the item. The record that said so is gone.
 bool isOfServer(const CtContactSyncRow& /*row*/) {
     return false;
@@ -182,7 +187,7 @@ void CtUploader::sendGroup(CtGroupSyncRow& row) {
     if (name.empty()) return fail<CtGroupKind>(row, reply);
     if (!row.uri.empty()) {
         reply = mTask.update(CtItemType::kGroup, row.uri, row.etag, GroupComposer::compose(name, row.etag));
-        if (reply.answer == CtAnswer::kConflict || row.etag.empty()) {
+        if (mayHaveMovedOn(reply) || row.etag.empty()) {
             reply = mTask.read(CtItemType::kGroup, row.uri);
             if (reply.isAccepted()) {
                 SYNC_ERR("group(%s) has moved on, the device's change wins", row.uri.c_str());
@@ -259,8 +264,15 @@ bool CtUploader::sendFields(CtContactSyncRow& row, contacts_record_h record) {
         return false;
     }
     row.dirty = waitsForGroup(record) ? 1 : 0;
+    JsonObject* entry = json_access::objectIn(reply.meta.entry.get());
+    if (entry != nullptr && mpComposer->composeFields(entry) != mpComposer->composeFields(record)) {
+        // What the server made of it must come down: then the etag stays behind.
+        SYNC_INFO("contact(%s) is not what was sent, it is compared again", reply.meta.id.c_str());
+        row.etag.clear();
+        reply.meta.etag.clear();
+    }
     store<CtContactKind>(row, reply, version);
-    if (reply.meta.entry)
+    if (entry != nullptr)
         mSentContacts.push_back({row.contact_id, version, json_text::textOf(reply.meta.entry.get())});
     return true;
 }
@@ -300,7 +312,7 @@ CtUpReply CtUploader::updateContact(const CtContactSyncRow& row, contacts_record
             }
         }
         reply = mTask.update(CtItemType::kContact, row.uri, etag, mpComposer->compose(record, etag, origin));
-        if (reply.answer != CtAnswer::kConflict) break;
+        if (!mayHaveMovedOn(reply)) break;
     }
     return reply;
 }
@@ -370,11 +382,12 @@ void CtUploader::sendDeleted(CtItemType type, typename Kind::Row& row) {
         if (attempt > 0 || row.etag.empty()) {
             reply = mTask.read(type, row.uri);
             if (!reply.isAccepted()) break;
-            SYNC_ERR("%s(%s) has moved on, the device's deletion wins", Kind::kName, row.uri.c_str());
+            if (row.etag != reply.meta.etag)
+                SYNC_ERR("%s(%s) has moved on, the device's deletion wins", Kind::kName, row.uri.c_str());
             row.etag = reply.meta.etag;
         }
         reply = mTask.remove(type, row.uri, row.etag);
-        if (reply.answer != CtAnswer::kConflict) break;
+        if (!mayHaveMovedOn(reply)) break;
     }
     if (!reply.isAccepted() && reply.answer != CtAnswer::kGone) return fail<Kind>(row, reply);
     ++mSent;

@@ -67,6 +67,27 @@ const std::vector<Sample>& eventSamples() {
          R"({"start": "2026-02-28", "end": "2026-03-01"})"},
         {"days by their number", event("DTSTART;VALUE=DATE:20260228\nDURATION:P1W\n"),
          R"({"end": "2026-03-07"})"},
+        {"a day across the change of the clocks, by its length",
+         event("DTSTART;TZID=Europe/Berlin:20260328T120000\nDURATION:P1DT1H\n"
+               "BEGIN:VALARM\nACTION:DISPLAY\nTRIGGER;RELATED=END:-PT24H30M\nEND:VALARM\n"
+               "BEGIN:VALARM\nACTION:DISPLAY\nTRIGGER:-P1D\nEND:VALARM\n"),
+         R"({"start": "2026-03-28T11:00:00Z", "end": "2026-03-29T11:00:00Z", "reminders": [30, 1440]})"},
+        {"hours across the change of the clocks",
+         event("DTSTART;TZID=Europe/Berlin:20260328T120000\nDURATION:PT24H\n"),
+         R"({"end": "2026-03-29T11:00:00Z"})"},
+        {"a week across the change of the clocks in autumn",
+         event("DTSTART;TZID=Europe/Berlin:20261020T120000\nDURATION:P1W\n"),
+         R"({"end": "2026-10-27T11:00:00Z"})"},
+        {"a day of UTC", event("DTSTART:20260328T120000Z\nDURATION:P1D\n"),
+         R"({"end": "2026-03-29T12:00:00Z"})"},
+        {"an alarm before an end of another zone, across the change of the clocks",
+         event("DTSTART;TZID=Europe/Berlin:20260329T010000\nDTEND:20260329T020000Z\n"
+               "BEGIN:VALARM\nACTION:DISPLAY\nTRIGGER;RELATED=END:-PT2H30M\nEND:VALARM\n"),
+         R"({"start": "2026-03-29T00:00:00Z", "end": "2026-03-29T02:00:00Z", "reminders": [30]})"},
+        {"an alarm before the end of a day without an end",
+         event("DTSTART;VALUE=DATE:20260228\nBEGIN:VALARM\nACTION:DISPLAY\n"
+               "TRIGGER;RELATED=END:-P1DT1H\nEND:VALARM\n"),
+         R"({"reminders": [60]})"},
         {"words of all kinds",
          event("DTSTART:20260701T080000Z\nCLASS:confidential\nTRANSP:TRANSPARENT\nSTATUS:X-NEW\nSUMMARY:"
                "second\n"),

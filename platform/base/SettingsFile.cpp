@@ -67,6 +67,16 @@ std::optional<Value> parse(const std::string& key, const std::string& content) {
     return value;
 }
 
+bool readAll(int fd, std::string* content) {
+    char chunk[4096];
+    for (;;) {
+        const ssize_t count = ::read(fd, chunk, sizeof chunk);
+        if (count < 0 && errno == EINTR) continue;
+        if (count <= 0) return count == 0;
+        content->append(chunk, static_cast<size_t>(count));
+    }
+}
+
 bool writeAll(int fd, const std::string& content) {
     size_t done = 0;
     while (done < content.size()) {
@@ -117,14 +127,14 @@ std::optional<Value> read(const std::string& key) {
     std::string content;
     struct stat info {};
     // A folder of longer keys is no key, and nothing but a plain file is read.
-    if (fstat(fd, &info) == 0 && S_ISREG(info.st_mode)) {
-        char chunk[4096];
-        for (ssize_t count = 0; (count = ::read(fd, chunk, sizeof chunk)) > 0;) {
-            content.append(chunk, static_cast<size_t>(count));
-        }
-    }
+    const bool isFile = fstat(fd, &info) == 0 && S_ISREG(info.st_mode);
+    const bool isWhole = isFile && readAll(fd, &content);
     close(fd);
-    if (!S_ISREG(info.st_mode)) return std::nullopt;
+    if (!isFile) return std::nullopt;
+    if (!isWhole) {
+        dlog_print(DLOG_ERROR, kTag, "the file of %s cannot be read, the key counts as unset", key.c_str());
+        return std::nullopt;
+    }
     std::optional<Value> value = parse(key, content);
     if (!value)
         dlog_print(DLOG_ERROR, kTag, "the file of %s is damaged, the key counts as unset", key.c_str());

@@ -77,24 +77,6 @@ bool readAll(int fd, std::string* content) {
     }
 }
 
-bool writeAll(int fd, const std::string& content) {
-    size_t done = 0;
-    while (done < content.size()) {
-        const ssize_t count = ::write(fd, content.data() + done, content.size() - done);
-        if (count < 0 && errno == EINTR) continue;
-        if (count <= 0) return false;
-        done += static_cast<size_t>(count);
-    }
-    return true;
-}
-
-void syncFolder(const std::string& folder) {
-    const int fd = open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (fd == -1) return;
-    (void)fsync(fd);
-    close(fd);
-}
-
 }  // namespace
 
 bool isValidKey(std::string_view key) {
@@ -144,22 +126,9 @@ std::optional<Value> read(const std::string& key) {
 
 int write(const std::string& key, const Value& value) {
     if (const int code = makeFolder(folderOf(key)); code != PLATFORM_ERROR_NONE) return code;
-    const std::string folder = rootedPath(folderOf(key));
-    std::string temporary = folder + "/.XXXXXX";
-    const int fd = mkostemp(temporary.data(), O_CLOEXEC);
-    if (fd == -1) return codeOfErrno(errno);
-    bool written =
-        writeAll(fd, contentOf(key, value)) && fchmod(fd, 0644) == 0 && giveToFolderOwner(fd, temporary);
-    if (written && !isMemory(key)) written = fsync(fd) == 0;
-    int error = written ? 0 : errno;
-    close(fd);
-    if (written && rename(temporary.c_str(), fileOf(key).c_str()) != 0) error = errno;
-    if (error != 0) {
-        unlink(temporary.c_str());
-        return codeOfErrno(error);
-    }
-    if (!isMemory(key)) syncFolder(folder);
-    return PLATFORM_ERROR_NONE;
+    constexpr unsigned kMode = 0644;
+    const bool isDone = replaceFile(fileOf(key), contentOf(key, value), kMode, /*isDurable=*/!isMemory(key));
+    return isDone ? PLATFORM_ERROR_NONE : codeOfErrno(errno);
 }
 
 int remove(const std::string& key) {

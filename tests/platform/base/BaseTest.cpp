@@ -165,6 +165,12 @@ TEST(Log, TextFromOutsideForgesNoLine) {
     dlog_set_sink(nullptr, nullptr);
 }
 
+TEST(Log, TheJournalsSeveritiesHaveALetterEach) {
+    std::string letters;
+    for (int severity = 0; severity < 8; ++severity) letters += dlog_letter_of_syslog(severity);
+    EXPECT_EQ(letters, "EEEEWIID");
+}
+
 TEST(Database, OnlyDatabasesAreOpened) {
     const TestRoot root;
     const std::string file = root.at("/tmp/x.db").string();

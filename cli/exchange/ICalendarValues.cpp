@@ -19,6 +19,8 @@ constexpr std::string_view kMailto = "MAILTO:";
 constexpr std::string_view kUntil = "UNTIL=";
 constexpr int kMinutesPerDay = 1440;
 constexpr int kMinutesPerHour = 60;
+// Ten thousand years. A zone is asked for the end, and goes through every change until then.
+constexpr int64_t kMostDays = 3'652'425;
 // Stand as they are in an address; the others are percent-encoded, so that no address ends its line.
 constexpr const char* kAddressCharacters = "!$&'*+,;=:@/?";
 
@@ -59,6 +61,7 @@ std::optional<Duration> durationOf(const std::string& text) {
     const int64_t sign = duration.is_neg != 0 ? -1 : 1;
     const int64_t days = int64_t{duration.weeks} * 7 + duration.days;
     const int64_t minutes = int64_t{duration.hours} * 60 + duration.minutes;
+    if (days > kMostDays || minutes > kMostDays * kMinutesPerDay) return std::nullopt;
     return Duration{sign * days, sign * (minutes * 60 + duration.seconds)};
 }
 

@@ -17,7 +17,7 @@ struct Duration {
     int64_t days = 0;
     int64_t seconds = 0;
 };
-// Nothing for a malformed one.
+// Nothing for a malformed one, or one of more than ten thousand years.
 std::optional<Duration> durationOf(const std::string& text);
 // "-PT15M".
 std::string beforeStart(int64_t minutes);

@@ -81,10 +81,8 @@ std::string whyItEnded(const DaemonProcess& process) {
            "); its log tells why: " + platform::rootedPath(DaemonProcess::kLog);
 }
 
-// False when `pid` is still there at the deadline.
-bool waitUntilGone(int pid, Clock::time_point deadline) {
-    const Descriptor process(static_cast<int>(syscall(SYS_pidfd_open, pid, 0)));
-    if (!process) return errno == ESRCH;
+// False when the process is still there at the deadline.
+bool waitUntilGone(const Descriptor& process, Clock::time_point deadline) {
     for (;;) {
         const auto left =
             std::chrono::duration_cast<std::chrono::milliseconds>(deadline - Clock::now()).count();
@@ -169,11 +167,15 @@ bool stop() {
     if (!device::isPrivate()) throw Failure(systemctl("stop"));
     const std::optional<int> pid = servingPid();
     if (!pid) return false;
-    if (kill(*pid, SIGTERM) != 0 && errno != ESRCH) {
+    const Descriptor process(static_cast<int>(syscall(SYS_pidfd_open, *pid, 0)));
+    // The number may have gone to another process since it was told; that of a process that still answers has not.
+    if ((!process && errno == ESRCH) || (process && servingPid() != pid)) return false;
+    if (!process ||
+        (syscall(SYS_pidfd_send_signal, process.get(), SIGTERM, nullptr, 0) != 0 && errno != ESRCH)) {
         throw Failure("the daemon (process " + std::to_string(*pid) +
                       ") cannot be ended: " + std::strerror(errno));
     }
-    if (!waitUntilGone(*pid, Clock::now() + kStopLimit)) {
+    if (!waitUntilGone(process, Clock::now() + kStopLimit)) {
         throw Failure("the daemon (process " + std::to_string(*pid) +
                       ") was asked to end and still runs; try again");
     }

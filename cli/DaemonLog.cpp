@@ -2,10 +2,12 @@
 
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <syslog.h>
 #include <systemd/sd-journal.h>
 #include <time.h>
 
 #include <cerrno>
+#include <charconv>
 #include <cstring>
 #include <memory>
 
@@ -13,6 +15,7 @@
 #include "Device.h"
 #include "Failure.h"
 #include "Handles.h"
+#include "platform/log.h"
 #include "platform/root.h"
 
 namespace daemon_log {
@@ -88,8 +91,10 @@ std::string lineOf(sd_journal* journal) {
     localtime_r(&seconds, &parts);
     char text[32];
     (void)strftime(text, sizeof text, "%m-%d %H:%M:%S", &parts);
-    const bool isGrave = fieldOf(journal, "PRIORITY") == "3";
-    return std::string(text) + (isGrave ? " E/" : " I/") + fieldOf(journal, "TAG") + ": " +
+    int severity = LOG_INFO;
+    const std::string priority = fieldOf(journal, "PRIORITY");
+    std::from_chars(priority.data(), priority.data() + priority.size(), severity);
+    return std::string(text) + " " + dlog_letter_of_syslog(severity) + "/" + fieldOf(journal, "TAG") + ": " +
            fieldOf(journal, "MESSAGE");
 }
 

@@ -12,6 +12,7 @@
 
 #include <array>
 #include <cerrno>
+#include <cstdio>
 #include <cstring>
 #include <filesystem>
 
@@ -23,6 +24,7 @@ namespace {
 
 constexpr const char* kProgram = "vantor-pim-sync";
 constexpr mode_t kLogMode = 0600;
+constexpr off_t kMostLogBytes = 10 * 1024 * 1024;
 
 std::string findProgram() {
     std::error_code ignored;
@@ -38,6 +40,11 @@ std::string findProgram() {
 
 Descriptor openLog() {
     const std::string path = platform::rootedPath(DaemonProcess::kLog);
+    struct stat info {};
+    const bool isLarge =
+        lstat(path.c_str(), &info) == 0 && S_ISREG(info.st_mode) && info.st_size > kMostLogBytes;
+    // Where that fails it goes on growing, which is better than no daemon.
+    if (isLarge) (void)rename(path.c_str(), (path + ".1").c_str());
     Descriptor log(open(path.c_str(), O_WRONLY | O_CREAT | O_APPEND | O_NOFOLLOW | O_CLOEXEC, kLogMode));
     if (!log) throw Failure(path + " cannot be written: " + std::strerror(errno));
     return log;

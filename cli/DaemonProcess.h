@@ -8,7 +8,8 @@
 
 class DaemonProcess {
 public:
-    // Standard output and standard error of the daemon go to this file, below the root.
+    // Standard output and standard error of the daemon go to this file, below the root. One of more than 10 MB becomes
+    // daemon.log.1 at a start.
     static constexpr const char* kLog = "/opt/usr/data/vantor-pim-sync/daemon.log";
 
     // The program beside the tool's own, else from PATH. A Failure when it cannot be run.

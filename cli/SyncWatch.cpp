@@ -47,11 +47,16 @@ private:
 class Wakers {
 public:
     explicit Wakers(bool* isEnding) {
-        for (const int signal : {SIGINT, SIGTERM, SIGHUP}) g_unix_signal_add(signal, end, isEnding);
-        for (const auto kind : kKindsWatched) vantor_pim_sync_add_state_changed_cb(kind, wake, nullptr);
+        for (size_t i = 0; i < kSignals.size(); ++i)
+            mSignals[i] = g_unix_signal_add(kSignals[i], end, isEnding);
+        // Without notifications (no daemon yet, or no files for them) the clock shows every change a second later.
+        for (const auto kind : kKindsWatched)
+            static_cast<void>(vantor_pim_sync_add_state_changed_cb(kind, wake, nullptr));
     }
     ~Wakers() {
-        for (const auto kind : kKindsWatched) vantor_pim_sync_remove_state_changed_cb(kind, wake, nullptr);
+        for (const guint source : mSignals) g_source_remove(source);
+        for (const auto kind : kKindsWatched)
+            static_cast<void>(vantor_pim_sync_remove_state_changed_cb(kind, wake, nullptr));
     }
     Wakers(const Wakers&) = delete;
     Wakers& operator=(const Wakers&) = delete;
@@ -65,6 +70,7 @@ public:
     }
 
 private:
+    static constexpr std::array kSignals{SIGINT, SIGTERM, SIGHUP};
     static constexpr std::array kKindsWatched{VANTOR_PIM_SYNC_TYPE_CALENDAR, VANTOR_PIM_SYNC_TYPE_CONTACTS};
 
     static void wake(vantor_pim_sync_type_e, void*) {}
@@ -76,6 +82,8 @@ private:
         *static_cast<bool*>(isOver) = true;
         return G_SOURCE_REMOVE;
     }
+
+    std::array<guint, kSignals.size()> mSignals{};
 };
 
 std::string jsonLine(const std::vector<SyncStatus>& all) {

@@ -18,7 +18,7 @@ namespace token_file {
 
 namespace {
 
-constexpr mode_t kMode = 0600;
+constexpr unsigned kMode = 0600;
 constexpr size_t kMostBytes = 64 * 1024;
 
 std::string nameOf(int accountId) {
@@ -37,16 +37,6 @@ Descriptor openFolder() {
     Descriptor folder(open(path.c_str(), O_RDONLY | O_DIRECTORY | O_NOFOLLOW | O_CLOEXEC));
     if (!folder && errno != ENOENT) throw Failure(path + " cannot be opened: " + std::strerror(errno));
     return folder;
-}
-
-bool writeAll(int fd, const std::string& text) {
-    for (size_t at = 0; at < text.size();) {
-        const ssize_t put = ::write(fd, text.data() + at, text.size() - at);
-        if (put < 0 && errno == EINTR) continue;
-        if (put <= 0) return false;
-        at += static_cast<size_t>(put);
-    }
-    return fsync(fd) == 0;
 }
 
 }  // namespace
@@ -71,22 +61,7 @@ std::optional<std::string> read(int accountId) {
 }
 
 void write(int accountId, const std::string& token) {
-    const std::string name = nameOf(accountId);
-    const std::string fresh = "." + name + "." + std::to_string(getpid());
-    const Descriptor folder = openFolder();
-    if (!folder) fail(name, "written");
-    const Descriptor file(
-        openat(folder.get(), fresh.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, kMode));
-    if (!file) fail(name, "written");
-    const std::string path = platform::rootedPath(device::kTrustedFolder) + "/" + fresh;
-    if (!platform::giveToFolderOwner(file.get(), path) || !writeAll(file.get(), token) ||
-        renameat(folder.get(), fresh.c_str(), folder.get(), name.c_str()) != 0) {
-        const int error = errno;
-        unlinkat(folder.get(), fresh.c_str(), 0);
-        errno = error;
-        fail(name, "written");
-    }
-    fsync(folder.get());
+    if (!platform::replaceFile(path(accountId), token, kMode)) fail(nameOf(accountId), "written");
 }
 
 std::string path(int accountId) {

@@ -23,13 +23,6 @@ Reply entryReply(const Call& call, const FeedEntry& entry) {
     return jsonReply(plainEntry(entry, call.origin));
 }
 
-std::string chosenId(const Json& body) {
-    const auto found = body.find("id");
-    if (found == body.end()) return "";
-    if (!found->is_string()) throw ApiError{400, "invalid", "Invalid value for: id", "id"};
-    return found->get<std::string>();
-}
-
 // Every text of the fields, without the names of members and the addresses that types and groups have.
 void addTexts(const Json& value, std::string& out) {
     if (value.is_string()) {
@@ -84,7 +77,7 @@ void AdminContactService::addFeedRoutes(Router& router, FeedKind kind, const std
     router.add("POST", feed, Access::kAdmin, [this, kind](const Call& call) {
         const Json body = jsonBody(call);
         const auto lock = mContext.store.guard();
-        return entryReply(call, mContext.store.contacts(call.ids[0]).insert(kind, body, chosenId(body)));
+        return entryReply(call, mContext.store.contacts(call.ids[0]).insert(kind, body, textOf(body, "id")));
     });
     router.add("GET", feed + "/*", Access::kAdmin, [this, kind](const Call& call) {
         const auto lock = mContext.store.guard();

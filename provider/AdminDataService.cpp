@@ -20,13 +20,6 @@ Reply eventReply(const EventText& text) {
     return reply;
 }
 
-std::string textMember(const Json& body, const char* name) {
-    const auto found = body.find(name);
-    if (found == body.end()) return "";
-    if (!found->is_string()) throw ApiError{400, "invalid", std::string("Invalid value for: ") + name, name};
-    return found->get<std::string>();
-}
-
 bool isRaw(const Call& call) {
     return call.param("raw") == "true";
 }
@@ -123,8 +116,7 @@ void AdminDataService::addAccountRoutes(Router& router) {
     router.add("POST", "/admin/accounts", Access::kAdmin, [this](const Call& call) {
         const Json body = jsonBody(call);
         const auto lock = mContext.store.guard();
-        return jsonReply(
-            accountJson(mContext.store.addAccount(textMember(body, "email"), textMember(body, "name"))));
+        return jsonReply(accountJson(mContext.store.addAccount(textOf(body, "email"), textOf(body, "name"))));
     });
     router.add("GET", "/admin/accounts/*", Access::kAdmin, [this](const Call& call) {
         const auto lock = mContext.store.guard();
@@ -157,11 +149,11 @@ void AdminDataService::addCalendarRoutes(Router& router) {
     });
     router.add("POST", calendars + "/share", Access::kAdmin, [this, entry](const Call& call) {
         const Json body = jsonBody(call);
-        const std::string role = textMember(body, "accessRole");
+        const std::string role = textOf(body, "accessRole");
         const auto lock = mContext.store.guard();
         Account& account = mContext.store.account(call.ids[0]);
-        mContext.store.share(account, textMember(body, "id"), role.empty() ? "writer" : role);
-        return entry(account, textMember(body, "id"));
+        mContext.store.share(account, textOf(body, "id"), role.empty() ? "writer" : role);
+        return entry(account, textOf(body, "id"));
     });
     router.add("PATCH", calendars + "/*", Access::kAdmin, [this, entry](const Call& call) {
         const Json body = jsonBody(call);
@@ -204,7 +196,7 @@ void AdminDataService::addEventRoutes(Router& router) {
     router.add("POST", events, Access::kAdmin, [this](const Call& call) {
         const Json body = jsonBody(call);
         const auto lock = mContext.store.guard();
-        if (isRaw(call)) return putRaw(call, call.param("id", textMember(body, "id")), body);
+        if (isRaw(call)) return putRaw(call, call.param("id", textOf(body, "id")), body);
         return eventReply(mContext.store.calendar(call.ids[0]).insert(body, adminWrite(call)).text);
     });
     router.add("GET", events + "/*", Access::kAdmin, [this](const Call& call) {
@@ -229,10 +221,10 @@ Reply AdminDataService::seed(const Call& call) {
     const Json body = jsonBody(call);
     const auto count = body.find("events");
     if (count == body.end() || !count->is_number_unsigned()) {
-        throw ApiError{400, "invalid", "Invalid value for: events", "events"};
+        invalid("events");
     }
     const auto lock = mContext.store.guard();
-    std::string calendarId = textMember(body, "calendarId");
+    std::string calendarId = textOf(body, "calendarId");
     if (calendarId.empty()) {
         const auto& accounts = mContext.store.accounts();
         if (accounts.empty() || accounts.begin()->second.calendars.empty()) {

@@ -21,17 +21,6 @@ struct SystemGroup {
 constexpr SystemGroup kSystemGroups[] = {{"6", "System Group: My Contacts", "Contacts"},
                                          {"starred", "Starred in Merrow", "Starred"}};
 
-[[noreturn]] void invalid(const std::string& member, const std::string& why) {
-    throw ApiError{400, "invalid", "Invalid value for: " + member + ": " + why, member};
-}
-
-std::string textOf(const Json& object, const char* name) {
-    const auto found = object.find(name);
-    if (found == object.end()) return "";
-    if (!found->is_string()) invalid(name, "must be a string");
-    return found->get<std::string>();
-}
-
 // The id at the end of a group's address, whatever the host; empty for another text.
 std::string groupOf(const std::string& href, const std::string& email) {
     const std::string feed = std::string(kFeeds) + "groups/";

@@ -45,10 +45,6 @@ constexpr const char* kOwnMembers[] = {
     "link", "gd$deleted", "photo",   "deleted", "gContact$systemGroup"};
 constexpr int kMaxDepth = 16;
 
-[[noreturn]] void invalid(const std::string& member, const std::string& why) {
-    throw ApiError{400, "invalid", "Invalid value for: " + member + ": " + why, member};
-}
-
 const ListMember* listMember(const std::string& name) {
     const auto* found = std::find_if(std::begin(kListMembers), std::end(kListMembers),
                                      [&](const ListMember& row) { return name == row.name; });
@@ -60,7 +56,7 @@ bool has(const Json& element, const char* attribute) {
     return found != element.end() && found->is_string() && !found->get_ref<const std::string&>().empty();
 }
 
-std::string textOf(const Json& element, const char* attribute) {
+std::string textOrNone(const Json& element, const char* attribute) {
     return has(element, attribute) ? element.at(attribute).get<std::string>() : "";
 }
 
@@ -98,11 +94,11 @@ void checkListed(const ListMember& row, const Json& element) {
 void checkEvent(const Json& event) {
     const auto when = event.find("gd$when");
     if (when == event.end() || !when->is_object()) invalid("gContact$event", "needs gd:when");
-    if (!parseDate(textOf(*when, "startTime"))) invalid("gContact$event", "startTime must be YYYY-MM-DD");
+    if (!parseDate(textOrNone(*when, "startTime"))) invalid("gContact$event", "startTime must be YYYY-MM-DD");
 }
 
 void checkBirthday(const Json& birthday) {
-    std::string when = textOf(birthday, "when");
+    std::string when = textOrNone(birthday, "when");
     if (when.starts_with("--")) when = "2000-" + when.substr(2);
     if (!parseDate(when)) invalid("gContact$birthday", "when must be YYYY-MM-DD or --MM-DD");
 }
@@ -139,7 +135,7 @@ std::string titleOf(const Json& fields) {
     if (name == fields.end()) return "";
     const auto part = [&](const char* member) {
         const auto found = name->find(member);
-        return found == name->end() || !found->is_object() ? "" : textOf(*found, "$t");
+        return found == name->end() || !found->is_object() ? "" : textOrNone(*found, "$t");
     };
     std::string title = part("gd$fullName");
     if (!title.empty()) return title;

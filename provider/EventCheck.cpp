@@ -10,10 +10,6 @@ namespace provider {
 
 namespace {
 
-[[noreturn]] void invalid(const std::string& member, const std::string& why) {
-    throw ApiError{400, "invalid", "Invalid value for: " + member + ": " + why, member};
-}
-
 struct WordMember {
     std::string_view member;
     std::initializer_list<std::string_view> words;

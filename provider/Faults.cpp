@@ -18,10 +18,6 @@ constexpr KindName kKindNames[] = {{FaultKind::kStatus, "status"},
                                    {FaultKind::kShortGzip, "short-gzip"},
                                    {FaultKind::kBody, "body"}};
 
-[[noreturn]] void invalid(const std::string& member, const std::string& why) {
-    throw ApiError{400, "invalid", "Invalid value for: " + member + ": " + why, member};
-}
-
 int wholeNumber(const Json& body, const char* name, int fallback, int low, int high) {
     const auto found = body.find(name);
     if (found == body.end()) return fallback;

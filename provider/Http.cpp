@@ -31,6 +31,17 @@ void checkSize(const Call& call, std::size_t limit) {
 
 }  // namespace
 
+void invalid(const std::string& member, const std::string& why) {
+    throw ApiError{400, "invalid", "Invalid value for: " + member + (why.empty() ? "" : ": " + why), member};
+}
+
+std::string textOf(const Json& object, const char* name, const std::string& fallback) {
+    const auto found = object.find(name);
+    if (found == object.end()) return fallback;
+    if (!found->is_string()) invalid(name, "must be a string");
+    return found->get<std::string>();
+}
+
 std::string errorBody(const ApiError& error) {
     Json entry = {{"domain", "global"}, {"reason", error.reason}, {"message", error.message}};
     if (!error.location.empty()) {

@@ -20,6 +20,11 @@ struct ApiError {
     std::string location;  // member or parameter at fault; empty: none
 };
 
+// Throws the ApiError 400 of a member that is not as it must be; `why` is for people.
+[[noreturn]] void invalid(const std::string& member, const std::string& why = "");
+// A member that is a text; fallback when it is not there. Throws ApiError for any other value.
+std::string textOf(const Json& object, const char* name, const std::string& fallback = "");
+
 // {"error":{"errors":[{"domain","reason","message"}],"code","message"}}
 std::string errorBody(const ApiError& error);
 

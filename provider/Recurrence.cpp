@@ -53,8 +53,8 @@ bool isNumber(std::string_view value, int low, int high, bool isSigned) {
     int number = 0;
     const auto [end, error] = std::from_chars(value.data(), value.data() + value.size(), number);
     if (error != std::errc() || end != value.data() + value.size()) return false;
-    if (isSigned) number = std::abs(number);
-    return number >= low && number <= high;
+    // Not by its absolute value: the least number has none.
+    return (number >= low && number <= high) || (isSigned && number >= -high && number <= -low);
 }
 
 bool isDay(std::string_view value) {

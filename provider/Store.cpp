@@ -7,17 +7,6 @@ namespace provider {
 
 namespace {
 
-[[noreturn]] void invalid(const std::string& member) {
-    throw ApiError{400, "invalid", "Invalid value for: " + member, member};
-}
-
-std::string textOf(const Json& object, const char* name, const std::string& fallback) {
-    const auto found = object.find(name);
-    if (found == object.end()) return fallback;
-    if (!found->is_string()) invalid(name);
-    return found->get<std::string>();
-}
-
 void checkRole(const std::string& role) {
     if (role != "owner" && role != "writer" && role != "reader") invalid("accessRole");
 }
@@ -45,7 +34,7 @@ void setMembers(Calendar& calendar, const Json& members) {
 }
 
 void checkMembers(const Json& members) {
-    for (const CalendarMember& row : kCalendarMembers) textOf(members, row.name, "");
+    for (const CalendarMember& row : kCalendarMembers) textOf(members, row.name);
     checkColor(textOf(members, "backgroundColor", "#000000"));
     if (!isTimeZone(textOf(members, "timeZone", "UTC"))) invalid("timeZone");
     checkRole(textOf(members, "accessRole", "owner"));
@@ -214,7 +203,7 @@ TaskList& Store::addTaskList(Account& account, const Json& members) {
         throw ApiError{409, "duplicate", "The task list exists.", "id"};
     auto list = std::make_unique<TaskList>(listId, mRevisions);
     list->title = textOf(members, "title", listId);
-    list->etag = textOf(members, "etag", "");
+    list->etag = textOf(members, "etag");
     if (list->etag.empty()) list->etag = etagOf(mRevisions.next());
     return *account.taskLists.emplace_back(std::move(list));
 }
@@ -316,7 +305,7 @@ void Store::load(const Json& state) {
 // Events stand as {"id","event"}, taken as they are, or as plain event bodies, checked and completed.
 void Store::loadCalendar(const Json& state) {
     if (!state.is_object()) invalid("calendars");
-    const std::string calendarId = textOf(state, "id", "");
+    const std::string calendarId = textOf(state, "id");
     if (calendarId.empty() || mCalendars.count(calendarId) != 0) invalid("calendars.id");
     checkMembers(state);
     auto& calendar = mCalendars[calendarId] = std::make_unique<Calendar>(calendarId, mRevisions);
@@ -327,32 +316,32 @@ void Store::loadCalendar(const Json& state) {
         const auto kept = event.find("event");
         if (kept == event.end()) {
             calendar->insert(event, {"", true});
-        } else if (!kept->is_object() || textOf(event, "id", "").empty()) {
+        } else if (!kept->is_object() || textOf(event, "id").empty()) {
             invalid("calendars.events");
         } else {
-            calendar->put(textOf(event, "id", ""), *kept);
+            calendar->put(textOf(event, "id"), *kept);
         }
     }
     for (const Json& deleted : listOf(state, "deleted")) {
         if (!deleted.is_string()) invalid("calendars.deleted");
         calendar->putDeleted(deleted.get<std::string>());
     }
-    calendar->etag = textOf(state, "etag", "");
+    calendar->etag = textOf(state, "etag");
     if (calendar->etag.empty()) calendar->etag = etagOf(mRevisions.next());
     calendar->updated = textOf(state, "updated", stampOf(mRevisions.last()));
 }
 
 void Store::loadAccount(const Json& state) {
     if (!state.is_object()) invalid("accounts");
-    Account& account = addBareAccount(textOf(state, "email", ""), textOf(state, "name", ""));
+    Account& account = addBareAccount(textOf(state, "email"), textOf(state, "name"));
     if (state.contains("refreshToken")) {
-        account.refreshToken = textOf(state, "refreshToken", "");
+        account.refreshToken = textOf(state, "refreshToken");
     } else {
         issueRefreshToken(account);
     }
     for (const Json& item : listOf(state, "calendars")) {
         if (!item.is_object()) invalid("accounts.calendars");
-        const std::string calendarId = textOf(item, "id", "");
+        const std::string calendarId = textOf(item, "id");
         CalendarEntry& entry = addEntry(account, calendarId, textOf(item, "accessRole", "owner"));
         entry.etag = textOf(item, "etag", calendar(calendarId).etag);
     }
@@ -372,7 +361,7 @@ void Store::loadTaskList(Account& account, const Json& state) {
 void Store::loadPerson(const Json& state) {
     if (!state.is_object() || !state.contains("profile") || !state.at("profile").is_object())
         invalid("people");
-    Person& person = putPerson(textOf(state, "id", ""), state.at("profile"));
+    Person& person = putPerson(textOf(state, "id"), state.at("profile"));
     if (state.contains("photo")) person.photo = Image::load(state.at("photo"));
 }
 

@@ -14,10 +14,6 @@ constexpr const char* kOwnMembers[] = {"kind", "id", "etag", "updated", "selfLin
 constexpr const char* kTextMembers[] = {"title", "notes"};
 constexpr const char* kTimeMembers[] = {"due", "completed"};
 
-[[noreturn]] void invalid(const std::string& member, const std::string& why) {
-    throw ApiError{400, "invalid", "Invalid value for: " + member + ": " + why, member};
-}
-
 [[noreturn]] void notFound() {
     throw ApiError{404, "notFound", "Task not found.", ""};
 }

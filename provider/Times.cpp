@@ -64,11 +64,7 @@ bool readOffset(std::string_view text, std::optional<int>& offset) {
     return true;
 }
 
-[[noreturn]] void invalid(const std::string& member, const std::string& why) {
-    throw ApiError{400, "invalid", "Invalid value for: " + member + ": " + why, member};
-}
-
-const std::string& textOf(const Json& value, const std::string& member) {
+const std::string& stringOf(const Json& value, const std::string& member) {
     if (!value.is_string()) invalid(member, "must be a string");
     return value.get_ref<const std::string&>();
 }
@@ -148,17 +144,17 @@ EventTime readTime(const Json& value, const std::string& member) {
     if (hasDate == value.contains("dateTime")) invalid(member, "exactly one of date and dateTime is needed");
     EventTime time;
     if (hasDate) {
-        const auto day = parseDate(textOf(value.at("date"), member + ".date"));
+        const auto day = parseDate(stringOf(value.at("date"), member + ".date"));
         if (!day) invalid(member + ".date", "not a date");
         time.allDay = true;
         time.local = *day;
     } else {
-        const auto parsed = parseDateTime(textOf(value.at("dateTime"), member + ".dateTime"));
+        const auto parsed = parseDateTime(stringOf(value.at("dateTime"), member + ".dateTime"));
         if (!parsed) invalid(member + ".dateTime", "not an RFC 3339 time");
         time = *parsed;
     }
     if (value.contains("timeZone")) {
-        time.zone = textOf(value.at("timeZone"), member + ".timeZone");
+        time.zone = stringOf(value.at("timeZone"), member + ".timeZone");
         if (!isTimeZone(time.zone)) invalid(member + ".timeZone", "unknown time zone");
     }
     if (!time.allDay && !time.offset && time.zone.empty()) {

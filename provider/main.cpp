@@ -28,15 +28,18 @@ Json readJson(const std::string& file) {
     return body;
 }
 
-// Whole or not at all: a crash while writing leaves the old file.
+// Whole or not at all: a crash while writing leaves the old file. It holds tokens, so nobody else may read it.
 void writeState(const std::string& file, const Json& state) {
     const std::string temporary = file + ".new";
     const std::string text = state.dump(-1, ' ', false, Json::error_handler_t::replace);
-    std::FILE* out = std::fopen(temporary.c_str(), "we");
+    std::remove(temporary.c_str());  // of a run that was cut short, with whatever mode it has
+    const int fd = open(temporary.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
+    std::FILE* out = fd != -1 ? fdopen(fd, "w") : nullptr;
     if (out == nullptr) throw std::runtime_error("cannot write " + temporary);
     const bool isWritten = std::fwrite(text.data(), 1, text.size(), out) == text.size() &&
                            std::fflush(out) == 0 && fsync(fileno(out)) == 0;
     if (std::fclose(out) != 0 || !isWritten || std::rename(temporary.c_str(), file.c_str()) != 0) {
+        std::remove(temporary.c_str());
         throw std::runtime_error("cannot write " + file);
     }
 }

@@ -44,7 +44,8 @@ size_t skipComponent(const std::vector<TextLine>& lines, size_t at) {
 struct ICalendarReader::Frame {
     std::optional<When> start;
     std::optional<When> end;
-    std::optional<int64_t> durationSec;
+    std::optional<ical_values::Duration> duration;
+    calendar_time_s ends{};  // whichever of the two says it
     std::string zoneName;
     const ContentLine* rule = nullptr;
     std::vector<const ContentLine*> exdates;
@@ -174,9 +175,7 @@ void ICalendarReader::readTodo(const Parts& parts, CalendarItem& item) {
         if (line.name == "DUE") {
             item.fields["due"] = time_text::composeRfc3339(readTime(line, line.value).time);
         } else if (line.name == "COMPLETED") {
-            const When when = readTime(line, line.value);
-            item.fields["completed"] = time_text::composeRfc3339(
-                time_text::isDate(when.time) ? mZones.floating().toUtc(when.wallSec) : when.time.utime);
+            item.fields["completed"] = time_text::composeRfc3339(instantOf(readTime(line, line.value).time));
         } else if (!readShared(line, item)) {
             noteOther(line);
         }
@@ -217,8 +216,8 @@ bool ICalendarReader::readEventLine(const ContentLine& line, Frame& frame, Calen
                      CalendarItem&) { to.end = self.readTime(text, text.value); }},
         {"DURATION",
          [](Self&, const Line& text, Frame& to, CalendarItem&) {
-             to.durationSec = ical_values::durationSec(text.value);
-             if (!to.durationSec) throw Failure("its DURATION cannot be read");
+             to.duration = ical_values::durationOf(text.value);
+             if (!to.duration) throw Failure("its DURATION cannot be read");
          }},
         {"RRULE",
          [](Self&, const Line& text, Frame& to, CalendarItem&) {
@@ -249,20 +248,30 @@ bool ICalendarReader::readEventLine(const ContentLine& line, Frame& frame, Calen
     return false;
 }
 
-void ICalendarReader::setTimes(const Frame& frame, CalendarItem& item) {
+int64_t ICalendarReader::instantOf(const calendar_time_s& time) const {
+    return time_text::isDate(time) ? mZones.floating().toUtc(ical_values::wallOf(time)) : time.utime;
+}
+
+calendar_time_s ICalendarReader::endOf(const Frame& frame) {
+    if (frame.end) return frame.end->time;
     const When& start = *frame.start;
-    const bool isOfDays = time_text::isDate(start.time);
-    calendar_time_s end = start.time;
-    if (frame.end) {
-        end = frame.end->time;
-    } else {
-        int64_t seconds = frame.durationSec.value_or(isOfDays ? kDaySec : 0);
-        if (isOfDays) seconds = (seconds + kDaySec - 1) / kDaySec * kDaySec;
-        end = isOfDays ? ical_values::dateOf(start.wallSec + seconds) : end;
-        if (!isOfDays) end.utime += seconds;
+    if (time_text::isDate(start.time)) {
+        const auto length = frame.duration.value_or(ical_values::Duration{.days = 1});
+        const int64_t days = length.days + (length.seconds + kDaySec - 1) / kDaySec;
+        return ical_values::dateOf(start.wallSec + days * kDaySec);
     }
+    const auto length = frame.duration.value_or(ical_values::Duration{});
+    const int64_t wallSec = start.wallSec + length.days * kDaySec;
+    calendar_time_s end = start.time;
+    end.utime = (start.zone != nullptr ? start.zone->toUtc(wallSec) : wallSec) + length.seconds;
+    return end;
+}
+
+void ICalendarReader::setTimes(Frame& frame, CalendarItem& item) {
+    const When& start = *frame.start;
+    frame.ends = endOf(frame);
     item.fields["start"] = time_text::composeRfc3339(start.time);
-    item.fields["end"] = time_text::composeRfc3339(end);
+    item.fields["end"] = time_text::composeRfc3339(frame.ends);
     item.zone = start.zone;
     item.wallTimeOfDay = ((start.wallSec % kDaySec) + kDaySec) % kDaySec;
     const std::string zone = start.zone != nullptr ? start.zone->name() : std::string();
@@ -329,17 +338,15 @@ void ICalendarReader::readAlarm(const std::vector<ContentLine>& alarm, const Fra
         return;
     }
     if (action == "AUDIO") mpLosses->add("VALARM (the sound)");
-    const When& start = *frame.start;
+    const int64_t startSec = instantOf(frame.start->time);
     std::optional<int64_t> before;
     if (content_line::upper(trigger->parameter("VALUE")) == "DATE-TIME") {
-        const int64_t zero =
-            time_text::isDate(start.time) ? mZones.floating().toUtc(start.wallSec) : start.time.utime;
-        before = zero - readTime(*trigger, trigger->value).time.utime;
-    } else if (const auto after = ical_values::durationSec(trigger->value)) {
-        before = -*after;
+        before = startSec - instantOf(readTime(*trigger, trigger->value).time);
+    } else if (const auto after = ical_values::durationOf(trigger->value)) {
+        // A day of a reminder has 24 hours: the store counts minutes, and 1440 of them are written as a day.
+        before = -(after->days * kDaySec + after->seconds);
         const bool isFromEnd = content_line::upper(trigger->parameter("RELATED")) == "END";
-        if (isFromEnd)
-            *before -= frame.end ? frame.end->wallSec - start.wallSec : frame.durationSec.value_or(0);
+        if (isFromEnd) *before -= instantOf(frame.ends) - startSec;
     }
     constexpr int64_t kMinuteSec = 60;
     constexpr int64_t kMostMinutes = int64_t{366} * 24 * 60;

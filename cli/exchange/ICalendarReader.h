@@ -42,7 +42,10 @@ private:
     void readTodo(const Parts& parts, CalendarItem& item);
     // False when the line is none of an event's own.
     bool readEventLine(const ContentLine& line, Frame& frame, CalendarItem& item);
-    void setTimes(const Frame& frame, CalendarItem& item);
+    void setTimes(Frame& frame, CalendarItem& item);
+    static calendar_time_s endOf(const Frame& frame);
+    // A day begins with its midnight in the zone of times that name none.
+    [[nodiscard]] int64_t instantOf(const calendar_time_s& time) const;
     void readRule(const ContentLine& line, const Frame& frame, CalendarItem& item);
     void readExdates(const Frame& frame, CalendarItem& item);
     void readAttendee(const ContentLine& line, CalendarItem& item);

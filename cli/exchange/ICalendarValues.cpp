@@ -19,6 +19,8 @@ constexpr std::string_view kMailto = "MAILTO:";
 constexpr std::string_view kUntil = "UNTIL=";
 constexpr int kMinutesPerDay = 1440;
 constexpr int kMinutesPerHour = 60;
+// Ten thousand years. A zone is asked for the end, and goes through every change until then.
+constexpr int64_t kMostDays = 3'652'425;
 // Stand as they are in an address; the others are percent-encoded, so that no address ends its line.
 constexpr const char* kAddressCharacters = "!$&'*+,;=:@/?";
 
@@ -51,14 +53,16 @@ std::string withInstant(std::string rule, const std::function<int64_t(int64_t)>&
 
 }  // namespace
 
-std::optional<int64_t> durationSec(const std::string& text) {
+std::optional<Duration> durationOf(const std::string& text) {
     if (text.size() > kMostValueBytes) return std::nullopt;
     icalerror_set_errors_are_fatal(0);
     const icaldurationtype duration = icaldurationtype_from_string(text.c_str());
     if (icaldurationtype_is_bad_duration(duration) != 0) return std::nullopt;
-    const int64_t seconds = ((int64_t{duration.weeks} * 7 + duration.days) * 24 + duration.hours) * 3600 +
-                            int64_t{duration.minutes} * 60 + duration.seconds;
-    return duration.is_neg != 0 ? -seconds : seconds;
+    const int64_t sign = duration.is_neg != 0 ? -1 : 1;
+    const int64_t days = int64_t{duration.weeks} * 7 + duration.days;
+    const int64_t minutes = int64_t{duration.hours} * 60 + duration.minutes;
+    if (days > kMostDays || minutes > kMostDays * kMinutesPerDay) return std::nullopt;
+    return Duration{sign * days, sign * (minutes * 60 + duration.seconds)};
 }
 
 std::string beforeStart(int64_t minutes) {

@@ -12,8 +12,13 @@
 
 namespace exchange::ical_values {
 
-// Nothing for a malformed one.
-std::optional<int64_t> durationSec(const std::string& text);
+// Days are those of the calendar, which may have 23 or 25 hours; the seconds are exact. Both have the same sign.
+struct Duration {
+    int64_t days = 0;
+    int64_t seconds = 0;
+};
+// Nothing for a malformed one, or one of more than ten thousand years.
+std::optional<Duration> durationOf(const std::string& text);
 // "-PT15M".
 std::string beforeStart(int64_t minutes);
 

@@ -102,8 +102,7 @@ inline constexpr CompanyText kCompanyTexts[] = {{"TITLE", "title"},
                                                 {"X-VANTOR-ORG-LOCATION", "location"},
                                                 {"X-VANTOR-ORG-SYMBOL", "symbol"}};
 
-// --- messengers: the scheme of IMPP, and the properties that older cards have
-// ---------------------------------------------
+// --- messengers: the scheme of IMPP, and the properties that older cards have ----------------------------------------
 struct CardMessenger {
     std::string_view scheme;
     std::string_view protocol;
@@ -125,14 +124,15 @@ inline constexpr CardMessenger kMessengers[] = {{"x-vantor-talk", "VANTOR_TALK",
                                                 {"x-im", "other", ""},
                                                 {"im", "other", "", true}};
 
-// --- properties of their own
-// -------------------------------------------------------------------------------------------
-inline constexpr std::string_view kLabelProperty = "X-ABLABEL";  // of the property in the same group
-inline constexpr std::string_view kDateProperty =
-    "X-ABDATE";  // any date but the first birthday and anniversary
+// --- properties of their own ------------------------------------------------------------------------------------
+
+// Of the property in the same group.
+inline constexpr std::string_view kLabelProperty = "X-ABLABEL";
+// Any date but the first birthday and anniversary.
+inline constexpr std::string_view kDateProperty = "X-ABDATE";
 inline constexpr std::string_view kNamesProperty = "X-ABRELATEDNAMES";
-inline constexpr std::string_view kFieldProperty =
-    "X-VANTOR-FIELD";  // a field of the user's own; its label is the key
+// A field of the user's own; its label is the key.
+inline constexpr std::string_view kFieldProperty = "X-VANTOR-FIELD";
 
 // Bookkeeping of whoever wrote the card; nobody misses it. FN is made of the name.
 inline constexpr std::string_view kSilentCardProperties[] = {

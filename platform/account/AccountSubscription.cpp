@@ -53,10 +53,13 @@ private:
             mWatch.reset();
             return PLATFORM_ERROR_IO;
         }
-        return store().read("SELECT coalesce(max(sequence), 0) FROM events", {}, [this](sqlite3_stmt* row) {
-            mSeen = sqlite3_column_int64(row, 0);
-            return false;
-        });
+        const int code =
+            store().read("SELECT coalesce(max(sequence), 0) FROM events", {}, [this](sqlite3_stmt* row) {
+                mSeen = sqlite3_column_int64(row, 0);
+                return false;
+            });
+        if (code != PLATFORM_ERROR_NONE) mWatch.reset();
+        return code;
     }
 
     void look() {

@@ -67,22 +67,14 @@ std::optional<Value> parse(const std::string& key, const std::string& content) {
     return value;
 }
 
-bool writeAll(int fd, const std::string& content) {
-    size_t done = 0;
-    while (done < content.size()) {
-        const ssize_t count = ::write(fd, content.data() + done, content.size() - done);
+bool readAll(int fd, std::string* content) {
+    char chunk[4096];
+    for (;;) {
+        const ssize_t count = ::read(fd, chunk, sizeof chunk);
         if (count < 0 && errno == EINTR) continue;
-        if (count <= 0) return false;
-        done += static_cast<size_t>(count);
+        if (count <= 0) return count == 0;
+        content->append(chunk, static_cast<size_t>(count));
     }
-    return true;
-}
-
-void syncFolder(const std::string& folder) {
-    const int fd = open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
-    if (fd == -1) return;
-    (void)fsync(fd);
-    close(fd);
 }
 
 }  // namespace
@@ -117,14 +109,14 @@ std::optional<Value> read(const std::string& key) {
     std::string content;
     struct stat info {};
     // A folder of longer keys is no key, and nothing but a plain file is read.
-    if (fstat(fd, &info) == 0 && S_ISREG(info.st_mode)) {
-        char chunk[4096];
-        for (ssize_t count = 0; (count = ::read(fd, chunk, sizeof chunk)) > 0;) {
-            content.append(chunk, static_cast<size_t>(count));
-        }
-    }
+    const bool isFile = fstat(fd, &info) == 0 && S_ISREG(info.st_mode);
+    const bool isWhole = isFile && readAll(fd, &content);
     close(fd);
-    if (!S_ISREG(info.st_mode)) return std::nullopt;
+    if (!isFile) return std::nullopt;
+    if (!isWhole) {
+        dlog_print(DLOG_ERROR, kTag, "the file of %s cannot be read, the key counts as unset", key.c_str());
+        return std::nullopt;
+    }
     std::optional<Value> value = parse(key, content);
     if (!value)
         dlog_print(DLOG_ERROR, kTag, "the file of %s is damaged, the key counts as unset", key.c_str());
@@ -134,22 +126,9 @@ std::optional<Value> read(const std::string& key) {
 
 int write(const std::string& key, const Value& value) {
     if (const int code = makeFolder(folderOf(key)); code != PLATFORM_ERROR_NONE) return code;
-    const std::string folder = rootedPath(folderOf(key));
-    std::string temporary = folder + "/.XXXXXX";
-    const int fd = mkostemp(temporary.data(), O_CLOEXEC);
-    if (fd == -1) return codeOfErrno(errno);
-    bool written =
-        writeAll(fd, contentOf(key, value)) && fchmod(fd, 0644) == 0 && giveToFolderOwner(fd, temporary);
-    if (written && !isMemory(key)) written = fsync(fd) == 0;
-    int error = written ? 0 : errno;
-    close(fd);
-    if (written && rename(temporary.c_str(), fileOf(key).c_str()) != 0) error = errno;
-    if (error != 0) {
-        unlink(temporary.c_str());
-        return codeOfErrno(error);
-    }
-    if (!isMemory(key)) syncFolder(folder);
-    return PLATFORM_ERROR_NONE;
+    constexpr unsigned kMode = 0644;
+    const bool isDone = replaceFile(fileOf(key), contentOf(key, value), kMode, /*isDurable=*/!isMemory(key));
+    return isDone ? PLATFORM_ERROR_NONE : codeOfErrno(errno);
 }
 
 int remove(const std::string& key) {

@@ -144,9 +144,3 @@ vconf_type_e vconf_keynode_get_type(const keynode_t* node) {
 int vconf_keynode_get_int(const keynode_t* node) {
     return node->value.type == VCONF_TYPE_INT ? node->value.number : 0;
 }
-bool vconf_keynode_get_bool(const keynode_t* node) {
-    return node->value.type == VCONF_TYPE_BOOL && node->value.number != 0;
-}
-const char* vconf_keynode_get_str(const keynode_t* node) {
-    return node->value.type == VCONF_TYPE_STRING ? node->value.text.c_str() : "";
-}

@@ -38,7 +38,8 @@ public:
     [[nodiscard]] int write(std::initializer_list<Statement> statements, int* changes = nullptr);
     [[nodiscard]] int64_t lastRowId() const { return sqlite3_last_insert_rowid(mHandle); }
 
-    // Calls `use` for each row; return false from it to end the reading. The store is not locked during `use` of another call.
+    // Calls `use` for each row; return false from it to end the reading. Meanwhile the store is kept from other threads;
+    // `use` itself may call it.
     [[nodiscard]] int read(const char* sql, std::initializer_list<Param> params,
                            const std::function<bool(sqlite3_stmt*)>& use);
 

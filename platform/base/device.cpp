@@ -1,5 +1,7 @@
 #include "platform/device.h"
 
+#include <linux/route.h>
+
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
@@ -19,23 +21,65 @@ struct connection_s {};
 
 namespace platform::device {
 
-std::string defaultInterface(const std::string& routeFile) {
+namespace {
+
+// The one of the lowest metric, of those that lead somewhere.
+class BestRoute {
+public:
+    void offer(const std::string& interface, unsigned long metric, unsigned long flags) {
+        const bool isUsable = (flags & RTF_UP) != 0 && (flags & RTF_REJECT) == 0;
+        if (!isUsable || (!mInterface.empty() && metric >= mMetric)) return;
+        mInterface = interface;
+        mMetric = metric;
+    }
+    [[nodiscard]] const std::string& interface() const { return mInterface; }
+
+private:
+    std::string mInterface;
+    unsigned long mMetric = 0;
+};
+
+bool isZero(const std::string& digits) {
+    return digits.find_first_not_of('0') == std::string::npos;
+}
+
+std::string bestOf4(const std::string& routeFile) {
     std::ifstream file(routeFile);
     std::string line;
     std::getline(file, line);  // the head
-    std::string best;
-    long bestMetric = std::numeric_limits<long>::max();
+    BestRoute best;
     while (std::getline(file, line)) {
         std::istringstream fields(line);
-        std::string interface, destination, gateway, flags, references, use, mask;
-        long metric = 0;
-        if (!(fields >> interface >> destination >> gateway >> flags >> references >> use >> metric >> mask))
-            continue;
-        if (destination != "00000000" || mask != "00000000" || metric >= bestMetric) continue;
-        best = interface;
-        bestMetric = metric;
+        std::string interface, destination, gateway, references, use, mask;
+        unsigned long flags = 0;
+        unsigned long metric = 0;
+        fields >> interface >> destination >> gateway >> std::hex >> flags >> std::dec >> references >> use >>
+            metric >> mask;
+        if (fields && isZero(destination) && isZero(mask)) best.offer(interface, metric, flags);
     }
-    return best;
+    return best.interface();
+}
+
+std::string bestOf6(const std::string& routeFile) {
+    std::ifstream file(routeFile);
+    BestRoute best;
+    for (std::string line; std::getline(file, line);) {
+        std::istringstream fields(line);
+        std::string destination, length, source, sourceLength, gateway, references, use, interface;
+        unsigned long metric = 0;
+        unsigned long flags = 0;
+        fields >> destination >> length >> source >> sourceLength >> gateway >> std::hex >> metric >>
+            references >> use >> flags >> interface;
+        if (fields && isZero(destination) && isZero(length)) best.offer(interface, metric, flags);
+    }
+    return best.interface();
+}
+
+}  // namespace
+
+std::string defaultInterface(const std::string& routeFile, const std::string& route6File) {
+    const std::string interface = bestOf4(routeFile);
+    return interface.empty() ? bestOf6(route6File) : interface;
 }
 
 connection_type_e interfaceType(const std::string& interfacesFolder, const std::string& interface) {
@@ -81,8 +125,8 @@ int connection_create(connection_h* connection) {
 
 int connection_get_type(connection_h connection, connection_type_e* type) {
     if (connection == nullptr || type == nullptr) return PLATFORM_ERROR_INVALID_PARAMETER;
-    *type = platform::device::interfaceType("/sys/class/net",
-                                            platform::device::defaultInterface("/proc/net/route"));
+    using namespace platform::device;
+    *type = interfaceType("/sys/class/net", defaultInterface("/proc/net/route", "/proc/net/ipv6_route"));
     return PLATFORM_ERROR_NONE;
 }
 

@@ -63,16 +63,7 @@ int key_storage_set(const char* name, const char* value) {
     const std::string_view text(value);
     if (text.size() >= kMaxValueBytes) return PLATFORM_ERROR_INVALID_PARAMETER;
     if (const int code = platform::makeFolder(kFolder, 0700); code != PLATFORM_ERROR_NONE) return code;
-    std::string temporary = platform::rootedPath(std::string(kFolder) + "/.XXXXXX");
-    const int fd = mkostemp(temporary.data(), O_CLOEXEC);  // mode 0600
-    if (fd == -1) return platform::codeOfErrno(errno);
-    errno = EIO;
-    const bool written = write(fd, text.data(), text.size()) == static_cast<ssize_t>(text.size()) &&
-                         platform::giveToFolderOwner(fd, temporary) && fsync(fd) == 0;
-    int error = written ? 0 : errno;
-    close(fd);
-    if (error == 0 && rename(temporary.c_str(), pathOf(name).c_str()) != 0) error = errno;
-    if (error == 0) return PLATFORM_ERROR_NONE;
-    unlink(temporary.c_str());
-    return platform::codeOfErrno(error);
+    constexpr unsigned kMode = 0600;
+    return platform::replaceFile(pathOf(name), text, kMode) ? PLATFORM_ERROR_NONE
+                                                            : platform::codeOfErrno(errno);
 }

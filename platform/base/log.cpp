@@ -26,6 +26,7 @@ struct PriorityName {
     char letter;
     int syslog;
 };
+// From the least grave on.
 constexpr PriorityName kPriorities[] = {
     {DLOG_DEBUG, "debug", 'D', 7},
     {DLOG_INFO, "info", 'I', 6},
@@ -209,6 +210,12 @@ void dlog_set_threshold(log_priority lowestShown) {
 
 bool dlog_is_shown(log_priority priority) {
     return priority >= threshold().load();
+}
+
+char dlog_letter_of_syslog(int severity) {
+    const auto isAsGrave = [severity](const PriorityName& row) { return severity <= row.syslog; };
+    const auto row = std::find_if(std::rbegin(kPriorities), std::rend(kPriorities), isAsGrave);
+    return row != std::rend(kPriorities) ? row->letter : kPriorities[0].letter;
 }
 
 void dlog_set_sink(void (*write)(log_priority, const char*, const char*, void*), void* userData) {

@@ -15,6 +15,7 @@
 #include <thread>
 
 #include "AccountService.h"
+#include "DaemonProcess.h"
 #include "Device.h"
 #include "SyncState.h"
 #include "TokenFile.h"
@@ -85,10 +86,15 @@ TEST_F(DaemonTool, StartsDetachedAndStopsForGood) {
     EXPECT_THAT(result.error, HasSubstr("account add"));
 
     account_service::insert(7, "me@example.com");
+    const std::string log = mTool.root().at(DaemonProcess::kLog);
+    constexpr uintmax_t kLarge = 11 * 1024 * 1024;
+    std::filesystem::resize_file(log, kLarge);
     // Would not come back before the daemon ends if that held the pipes that runCommand reads.
     ASSERT_EQ(mTool.run({"daemon", "start"}).status, 0);
     EXPECT_EQ(mTool.run({"daemon", "start"}).status, 0);
     const int daemon = pid();
+    EXPECT_EQ(std::filesystem::file_size(log + ".1"), kLarge);
+    EXPECT_LT(std::filesystem::file_size(log), kLarge);
     // The daemon keeps what belongs to its memory from everybody but the superuser.
     std::error_code refused;
     const auto input = std::filesystem::read_symlink("/proc/" + std::to_string(daemon) + "/fd/0", refused);

@@ -135,6 +135,8 @@ TEST(Recurrence, KnowsGoodLinesFromBad) {
                              "RRULE:FREQ=WEEKLY;BYDAY=0MO",
                              "RRULE:FREQ=WEEKLY;BYDAY=MO WE",
                              "RRULE:FREQ=MONTHLY;BYMONTHDAY=32",
+                             "RRULE:FREQ=MONTHLY;BYMONTHDAY=-32",
+                             "RRULE:FREQ=MONTHLY;BYMONTHDAY=-2147483648",
                              "RRULE:FREQ=YEARLY;BYMONTH=0",
                              "RRULE:FREQ=YEARLY;BYMONTH=99999999999",
                              "RRULE:FREQ=DAILY;WKST=1",

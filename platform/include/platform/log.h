@@ -53,6 +53,9 @@ void dlog_set_threshold(log_priority lowestShown);
 // Whether a line of this priority would be shown: lets callers skip expensive messages.
 bool dlog_is_shown(log_priority priority);
 
+// The letter of PRIORITY for a severity of syslog (0 to 7), which the journal knows the lines by.
+char dlog_letter_of_syslog(int severity);
+
 // Tests only: every shown line also goes to `sink` (NULL switches it off again).
 void dlog_set_sink(void (*sink)(log_priority priority, const char* tag, const char* message, void* userData),
                    void* userData);

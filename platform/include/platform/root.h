@@ -24,4 +24,10 @@ std::string rootedPath(std::string_view absolute);
 // False with errno.
 [[nodiscard]] bool giveToFolderOwner(int fd, const std::string& path);
 
+// Puts `content` at `path` (of the machine), in a folder that is there and no link, as the folder's owner's. Readers see
+// the former content or the new one, never half, and so does whoever looks after the power failed. Not `isDurable`: for
+// what ends with the boot anyway; nothing is waited for. False with errno: the former content is still there.
+[[nodiscard]] bool replaceFile(const std::string& path, std::string_view content, unsigned mode,
+                               bool isDurable = true);
+
 }  // namespace platform

@@ -42,7 +42,5 @@ int vconf_ignore_key_changed(const char* key, vconf_callback_fn callback);
 
 const char* vconf_keynode_get_name(const keynode_t* node);
 vconf_type_e vconf_keynode_get_type(const keynode_t* node);
-// 0, false or "" when the key was unset or has another type.
+// 0 when the key was unset or has another type.
 int vconf_keynode_get_int(const keynode_t* node);
-bool vconf_keynode_get_bool(const keynode_t* node);
-const char* vconf_keynode_get_str(const keynode_t* node);

@@ -165,6 +165,12 @@ TEST(Log, TextFromOutsideForgesNoLine) {
     dlog_set_sink(nullptr, nullptr);
 }
 
+TEST(Log, TheJournalsSeveritiesHaveALetterEach) {
+    std::string letters;
+    for (int severity = 0; severity < 8; ++severity) letters += dlog_letter_of_syslog(severity);
+    EXPECT_EQ(letters, "EEEEWIID");
+}
+
 TEST(Database, OnlyDatabasesAreOpened) {
     const TestRoot root;
     const std::string file = root.at("/tmp/x.db").string();
@@ -290,16 +296,26 @@ TEST(Device, StorageAndNetwork) {
     EXPECT_LE(uint64_t{info.f_bsize} * info.f_bavail, UINT32_MAX);
     const std::string routes = root.at("/tmp/route").string();
     const std::string head = "Iface\tDestination\tGateway\tFlags\tRefCnt\tUse\tMetric\tMask\n";
+    const std::string nowhere(32, '0');
+    const std::string any = nowhere + " 00 " + nowhere + " 00 fe800000000000000000000000000001 ";
+    const std::string lines6 = "fe80" + std::string(28, '0') + " 40 " + nowhere + " 00 " + nowhere +
+                               " 00000001 00000001 00000000 00000001 eth1\n" + any +
+                               "00000400 00000001 00000000 00000003 eth1\n" + any +
+                               "00000064 00000001 00000000 00000003 wwan0\n" + any +
+                               "00000001 00000001 00000000 00200200 lo\n";
     struct Row {
-        const char* lines;
+        std::string lines;
+        std::string lines6;
         const char* interface;
     };
     for (const Row& row :
-         {Row{"", ""}, Row{"eth0\t0000FEA9\t0\t1\t0\t0\t0\t0000FFFF\n", ""}, Row{"broken\n", ""},
+         {Row{"", "", ""}, Row{"eth0\t0000FEA9\t0\t1\t0\t0\t0\t0000FFFF\n", "", ""},
+          Row{"broken\n", "broken\n", ""}, Row{"*\t00000000\t0\t0201\t0\t0\t0\t00000000\n", lines6, "wwan0"},
           Row{"eth0\t00000000\t0\t3\t0\t0\t200\t00000000\nwlan0\t00000000\t0\t3\t0\t0\t100\t00000000\n",
-              "wlan0"}}) {
+              lines6, "wlan0"}}) {
         std::ofstream(routes) << head << row.lines;
-        EXPECT_EQ(platform::device::defaultInterface(routes), row.interface);
+        std::ofstream(routes + "6") << row.lines6;
+        EXPECT_EQ(platform::device::defaultInterface(routes, routes + "6"), row.interface);
     }
     const std::string net = root.at("/tmp/net").string();
     std::filesystem::create_directories(net + "/wlan0/wireless");

@@ -4,6 +4,7 @@
 #include <sqlite3.h>
 #include <sys/stat.h>
 
+#include <atomic>
 #include <fstream>
 #include <nlohmann/json.hpp>
 #include <thread>
@@ -179,13 +180,23 @@ TEST(CalMetaDataDBHelper, ATransactionIsWholeAndShutsOthersOut) {
     const TestRoot root;
     CalMetaDataDBHelper store;
     std::thread other;
+    std::atomic<bool> isThere = false;
+    std::atomic<bool> isDone = false;
     {
         SyncTransaction transaction(store.database());
         ASSERT_TRUE(transaction.begun());
         ASSERT_EQ(store.insertEvent(eventRow(1, 1, "a")), kOk);
-        other = std::thread([&store] { EXPECT_EQ(store.insertEvent(eventRow(2, 1, "b")), kOk); });
-        std::this_thread::sleep_for(std::chrono::milliseconds(30));  // lets the other one run into the lock
+        other = std::thread([&] {
+            isThere = true;
+            isThere.notify_one();
+            EXPECT_EQ(store.insertEvent(eventRow(2, 1, "b")), kOk);
+            isDone = true;
+        });
+        isThere.wait(false);
+        std::this_thread::sleep_for(
+            std::chrono::milliseconds(30));  // without the lock it would be done by now
         ASSERT_EQ(store.insertEvent(eventRow(3, 1, "c")), kOk);
+        EXPECT_FALSE(isDone);
     }  // undone
     other.join();
     std::vector<CalEventMetaData> rows;

@@ -213,7 +213,7 @@ int HttpTransfer::perform() {
         list.reset(longer);
     }
     Sink sink{*this};
-    SendGuard guard{.writes = std::string_view(method) != "GET"};
+    SendGuard guard{.writes = std::string_view(method) != "GET" && !changesNothing};
     curl_easy_setopt(curl.get(), CURLOPT_HTTPHEADER, list.get());
     curl_easy_setopt(curl.get(), CURLOPT_URL, url.c_str());
     setCommonOptions(curl.get(), *this, &sink);

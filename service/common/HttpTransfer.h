@@ -49,6 +49,8 @@ struct HttpTransfer {
     size_t maxReplyBytes = kMaxReplyBytes;
     bool withReplyHead = false;  // status line and headers go into the reply as well
 
+    bool changesNothing =
+        false;  // of a method other than GET: sent again on a new connection where the kept one is dead
     long timeout = 30;  // seconds
     IProgressObserver* observer = nullptr;
     std::shared_ptr<HttpShare> share = nullptr;

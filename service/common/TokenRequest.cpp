@@ -34,6 +34,7 @@ int requestAccessToken(Account& account, IProgressObserver* observer, std::share
                           .body = body.c_str(),
                           .reply = response,
                           .withReplyHead = true,
+                          .changesNothing = true,
                           .timeout = timeout,
                           .observer = observer,
                           .share = std::move(share)};

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "common/SentMark.h"
 #include "common/SyncLog.h"
 #include "platform/calendar_read.h"
 
@@ -79,14 +80,17 @@ int CalBookSnapshot::readRecordStates() {
 void CalBookSnapshot::readUnconfirmed() {
     for (size_t i = 0; i < mRows.size(); ++i) {
         const CalEventMetaData& row = mRows[i];
-        if (!row.uri.empty() || row.etag != kUnconfirmedEtag || row.original_event_id != 0) continue;
+        if (!row.uri.empty() || !sent_mark::isOn(row.etag) || row.original_event_id != 0) continue;
+        if (row.etag != sent_mark::kNamesNothing) mUnconfirmed.emplace(row.etag, i);
         calendar_record_h raw = nullptr;
         if (calendar_db_get_record(mKind.view, row.event_id, &raw) != PLATFORM_ERROR_NONE) continue;
         const CalendarRecord record(raw);
         // The version comes with the content: an edit after this look is still to be found.
-        mRecords[row.event_id].version = intOf(raw, mKind.version);
-        mRecords[row.event_id].hasDates = mKind.hasSeries() && !textOf(raw, CALENDAR_EVENT_EXDATE).empty();
-        mUnconfirmed.emplace(mKind.comparable(raw), i);
+        CalRecordState& state = mRecords[row.event_id];
+        state.version = intOf(raw, mKind.version);
+        state.hasDates = mKind.hasSeries() && !textOf(raw, CALENDAR_EVENT_EXDATE).empty();
+        state.sentMark = sent_mark::of(mKind.comparable(raw));
+        if (state.sentMark != row.etag) mUnconfirmed.emplace(state.sentMark, i);
     }
 }
 
@@ -123,8 +127,8 @@ int CalBookSnapshot::orphan(const std::string& uri) const {
     return found == mOrphans.end() ? 0 : found->second;
 }
 
-const CalEventMetaData* CalBookSnapshot::unconfirmed(const std::string& body) const {
-    const auto found = mUnconfirmed.find(body);
+const CalEventMetaData* CalBookSnapshot::unconfirmed(const std::string& mark) const {
+    const auto found = mUnconfirmed.find(mark);
     return found == mUnconfirmed.end() ? nullptr : &mRows[found->second];
 }
 

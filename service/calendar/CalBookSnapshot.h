@@ -21,7 +21,9 @@ struct CalRecordState {
     int syncedVersion = 0;  // of the sync's own last write, 0 when it never wrote it
     std::string etag;       // as stored with the sync's own last write; only of a record without a row
     bool isBehind = false;  // its uid or etag is not its row's
-    bool hasDates = false;  // cancelled instances; known of an item that may have reached the server
+    // Known of an item that may have reached the server:
+    bool hasDates = false;      // cancelled instances
+    std::string sentMark = {};  // of what it says now
 
     [[nodiscard]] bool isEnginesOwnWrite() const { return syncedVersion != 0 && syncedVersion == version; }
 };
@@ -44,8 +46,8 @@ public:
     [[nodiscard]] const CalRecordState* record(int eventId) const;
     // The id of a record that the sync once wrote for `uri` and that has no row, 0 when none.
     [[nodiscard]] int orphan(const std::string& uri) const;
-    // The row of an item that may have reached the server and that says the same as `body`, NULL when none.
-    [[nodiscard]] const CalEventMetaData* unconfirmed(const std::string& body) const;
+    // The row of an item that may have reached the server and that was sent, or is now, with this mark; NULL when none.
+    [[nodiscard]] const CalEventMetaData* unconfirmed(const std::string& mark) const;
     [[nodiscard]] bool hasUnconfirmed() const { return !mUnconfirmed.empty(); }
     // Rows that the server knows by a uri of their own: what a complete list may delete.
     [[nodiscard]] std::vector<const CalEventMetaData*> knownToServer() const;
@@ -81,7 +83,8 @@ private:
     std::unordered_map<int, size_t> mByEventId;           // ordinary events
     std::map<InstanceKey, size_t> mInstances;
     std::unordered_map<int, CalRecordState> mRecords;
-    std::unordered_map<std::string, int> mOrphans;    // by server id
-    std::unordered_set<int> mDeletedByUser;           // not examined yet
-    std::multimap<std::string, size_t> mUnconfirmed;  // rows by what their records say
+    std::unordered_map<std::string, int> mOrphans;  // by server id
+    std::unordered_set<int> mDeletedByUser;         // not examined yet
+    std::multimap<std::string, size_t>
+        mUnconfirmed;  // rows by marks: of what was sent, and of what their records say
 };

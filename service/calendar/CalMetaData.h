@@ -29,11 +29,8 @@ struct CalEventMetaData {
     int sequence = 0;
     std::string recurrence_id;
     std::string uri;   // the server's event id; empty until uploaded or downloaded
-    std::string etag;  // without a uri: kUnconfirmedEtag or empty
+    std::string etag;  // without a uri: a SentMark or empty
 };
-
-// Marks a row without uri whose item may have reached the server: it was sent, or was about to be, and no answer told.
-inline constexpr const char* kUnconfirmedEtag = "unconfirmed";
 
 // A to-do.
 struct CalTodoMetaData {

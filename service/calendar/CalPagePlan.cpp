@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "calendar/CalJsonParser.h"
+#include "common/SentMark.h"
 #include "common/SyncLog.h"
 #include "common/SyncResult.h"
 
@@ -107,7 +108,8 @@ private:
     [[nodiscard]] const CalEventMetaData* unconfirmedRow(const CalListInfo& entry) const {
         JsonObject* json = jsonObjectOf(entry.json);
         if (!mSnapshot.hasUnconfirmed() || json == nullptr) return nullptr;
-        const CalEventMetaData* row = mSnapshot.unconfirmed(mKind.comparable(json));
+        const std::string says = mKind.comparable(json);
+        const CalEventMetaData* row = says.empty() ? nullptr : mSnapshot.unconfirmed(sent_mark::of(says));
         return row != nullptr && !mTakenRows.contains(row->event_id) ? row : nullptr;
     }
 
@@ -119,9 +121,12 @@ private:
         planned.row = sent;
         planned.row.uri = entry->id;
         planned.row.etag = entry->etag;
-        // Cancelled instances go up after their series, and were not part of what was sent.
-        planned.row.dirty = mSnapshot.record(sent.event_id)->hasDates ? 1 : 0;
-        planned.row.version = mSnapshot.record(sent.event_id)->version;
+        if (const CalRecordState* state = mSnapshot.record(sent.event_id)) {
+            // Cancelled instances go up after their series, and were not part of what was sent; neither was a later edit.
+            const bool isEdited = sent.etag != sent_mark::kNamesNothing && sent.etag != state->sentMark;
+            planned.row.dirty = state->hasDates || isEdited ? 1 : 0;
+            planned.row.version = state->version;
+        }
         planned.rowWrite = RowWrite::kUpdate;
         planned.ownWrite = false;
         planned.sent = entry;

@@ -7,6 +7,7 @@
 #include "calendar/CalItemWriter.h"
 #include "calendar/CalTransaction.h"
 #include "common/PageReader.h"
+#include "common/SentMark.h"
 #include "common/SyncLog.h"
 #include "platform/calendar_read.h"
 
@@ -106,7 +107,7 @@ void CalUploader::endWith(const Row& row, const UpReply& reply, End end) {
 // Items of an earlier run whose answer was lost: those that the server lists are ours already.
 int CalUploader::findSentItems() {
     const bool some = std::any_of(mRows.begin(), mRows.end(), [](const Row& row) {
-        return row.uri.empty() && row.etag == kUnconfirmedEtag && row.dirty != 0;
+        return row.uri.empty() && sent_mark::isOn(row.etag) && (row.dirty != 0 || row.deleted != 0);
     });
     if (!some) return kOk;
     CalBookSnapshot snapshot(mKind);
@@ -132,16 +133,33 @@ int CalUploader::findSentItems() {
 }
 
 int CalUploader::markAsSent() {
+    std::vector<int> ids;
+    for (const Row& row : mRows) {
+        if (isNewToServer(row)) ids.push_back(row.event_id);
+    }
+    mRecords.expect(std::move(ids));
+    std::vector<Row> marked;
+    for (const Row& row : mRows) {
+        CalendarRecord record;
+        if (!isNewToServer(row) || mRecords.take(row.event_id, &record) != PLATFORM_ERROR_NONE) continue;
+        marked.push_back(row);
+        marked.back().etag = sent_mark::of(mKind.comparable(record.get()));
+    }
     SyncTransaction transaction(mpStore->database());
     if (!transaction.begun()) return kFailed;
-    for (Row& row : mRows) {
-        if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || row.original_event_id != 0) continue;
-        if (row.etag == kUnconfirmedEtag || isParked(row)) continue;
-        Row marked = row;
-        marked.etag = kUnconfirmedEtag;
-        if (mpStore->updateItem(marked) != kOk) return kFailed;
+    for (const Row& row : marked) {
+        if (mpStore->updateItem(row) != kOk) return kFailed;
     }
     return transaction.commit();
+}
+
+bool CalUploader::isNewToServer(const Row& row) const {
+    return row.uri.empty() && row.dirty != 0 && row.deleted == 0 && row.original_event_id == 0 &&
+           !isParked(row) && !waitsForList(row);
+}
+
+bool CalUploader::waitsForList(const Row& row) const {
+    return mSkipUnconfirmed && row.uri.empty() && sent_mark::isOn(row.etag);
 }
 
 // --- items
@@ -175,7 +193,7 @@ int CalUploader::sendDirty() {
 }
 
 void CalUploader::sendItem(Row& row) {
-    if (mSkipUnconfirmed && row.uri.empty() && row.etag == kUnconfirmedEtag) return;
+    if (waitsForList(row)) return;
     CalendarRecord record;
     if (const int code = mRecords.take(row.event_id, &record); code != PLATFORM_ERROR_NONE) {
         // Deleted since the marks were set: the next walk finds that.
@@ -289,7 +307,8 @@ void CalUploader::removeGone(Row& row, int version) {
 
 void CalUploader::sendDeleted(Row& row) {
     if (row.uri.empty()) {
-        if (row.etag == kUnconfirmedEtag) {
+        if (waitsForList(row)) return;
+        if (row.etag == sent_mark::kNamesNothing) {
             SYNC_ERR("%s(%d) was deleted before the server's answer to it was known", mKind.itemName,
                      row.event_id);
         }

@@ -59,6 +59,9 @@ private:
     // --- new items
     [[nodiscard]] int findSentItems();
     [[nodiscard]] int markAsSent();
+    [[nodiscard]] bool isNewToServer(const Row& row) const;
+    // An item of an earlier run without an answer, while the list could not be read.
+    [[nodiscard]] bool waitsForList(const Row& row) const;
 
     // --- items
     [[nodiscard]] std::vector<Row*> dirtyItems();

@@ -3,9 +3,6 @@
 
 #include <string>
 
-// Marks a row without uri whose item may have reached the server: it was sent, or was about to be, and no answer told.
-inline constexpr const char* kCtUnconfirmedEtag = "unconfirmed";
-
 struct CtContactSyncRow {
     int contact_id = 0;
     int addressbook_id = 0;
@@ -14,7 +11,7 @@ struct CtContactSyncRow {
     int image_dirty = 0;
     int deleted = 0;         // the deletion is to be sent
     std::string uri;         // the server's id of the entry; empty until uploaded or downloaded
-    std::string etag;        // without a uri: kCtUnconfirmedEtag or empty
+    std::string etag;        // without a uri: a SentMark or empty
     std::string photo_etag;  // of the photo last downloaded or uploaded
     std::string updated;     // ISO 8601 UTC with milliseconds
 };

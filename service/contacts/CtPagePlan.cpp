@@ -1,5 +1,6 @@
 #include "contacts/CtPagePlan.h"
 
+#include "common/SentMark.h"
 #include "common/SyncLog.h"
 #include "platform/contacts_read.h"
 
@@ -12,7 +13,17 @@ void markEdited(CtContactSyncRow* row) {
 void markEdited(CtGroupSyncRow* /*row*/) {}
 
 // Where an entry stands between the server, the rows and the device.
-enum class Standing { kNew, kSent, kLost, kUnchanged, kChanged, kDeviceWins, kOrphan, kEditedOrphan };
+enum class Standing {
+    kNew,
+    kSent,
+    kEditedSent,
+    kLost,
+    kUnchanged,
+    kChanged,
+    kDeviceWins,
+    kOrphan,
+    kEditedOrphan
+};
 
 template <class Kind>
 struct Finding {
@@ -43,11 +54,14 @@ Finding<Kind> find(const CtEntryInfo& entry, const CtSnapshot<Kind>& snapshot, C
         finding.row.version = state.isEnginesOwnWrite() ? state.version : state.syncedVersion;
         finding.version = state.version;
         finding.standing = state.isEnginesOwnWrite() ? Standing::kOrphan : Standing::kEditedOrphan;
-    } else if (const auto known = sent->find(says); !says.empty() && known != sent->end()) {
-        finding.row = known->second;
-        finding.version = snapshot.record(finding.row.*Kind::kId)->version;
-        finding.standing = Standing::kSent;
-        sent->erase(known);
+    } else if (const auto known = sent->find(sent_mark::of(says)); !says.empty() && known != sent->end()) {
+        finding.row = known->second.row;
+        const CtRecordState* state = snapshot.record(finding.row.*Kind::kId);
+        finding.version = state != nullptr ? state->version : kAnyVersion;
+        finding.standing =
+            state != nullptr && !known->second.isEdited ? Standing::kSent : Standing::kEditedSent;
+        std::erase_if(
+            *sent, [&](const auto& other) { return other.second.row.*Kind::kId == finding.row.*Kind::kId; });
         SYNC_INFO("%s(%s) is the device's %d, which was sent before", Kind::kName, entry.id.c_str(),
                   finding.row.*Kind::kId);
     }
@@ -77,37 +91,40 @@ bool hasRow(Standing standing) {
            standing != Standing::kEditedOrphan;
 }
 
-}  // namespace
+// The row learns of the server's entry, the device's change stays.
+bool isRowOnly(Standing standing) {
+    return standing == Standing::kDeviceWins || standing == Standing::kEditedOrphan ||
+           standing == Standing::kEditedSent;
+}
 
-CtSentRows<CtContactKind> readSentContacts(const CtSnapshot<CtContactKind>& snapshot,
-                                           const ContactComposer& composer) {
-    CtSentRows<CtContactKind> sent;
-    for (const CtContactSyncRow& row : snapshot.rows()) {
+template <class Kind, class Says>
+CtSentRows<Kind> readSent(const CtSnapshot<Kind>& snapshot, Says says) {
+    CtSentRows<Kind> sent;
+    for (const typename Kind::Row& row : snapshot.rows()) {
+        if (!row.uri.empty() || !sent_mark::isOn(row.etag)) continue;
         contacts_record_h raw = nullptr;
-        if (!row.uri.empty() || row.etag != kCtUnconfirmedEtag || row.dirty == 0 ||
-            snapshot.record(row.contact_id) == nullptr ||
-            contacts_db_get_record(_contacts_contact, row.contact_id, &raw) != PLATFORM_ERROR_NONE) {
-            continue;
-        }
+        const bool isThere = snapshot.record(row.*Kind::kId) != nullptr &&
+                             contacts_db_get_record(Kind::kView, row.*Kind::kId, &raw) == PLATFORM_ERROR_NONE;
         const ContactsRecord record(raw);
-        sent.emplace(composer.composeFields(raw), row);
+        const std::string mark = isThere ? sent_mark::of(says(raw)) : std::string();
+        if (row.etag != sent_mark::kNamesNothing)
+            sent.emplace(row.etag, CtSentRow<Kind>{row, mark != row.etag});
+        if (isThere && mark != row.etag) sent.emplace(mark, CtSentRow<Kind>{row});
     }
     return sent;
 }
 
+}  // namespace
+
+CtSentRows<CtContactKind> readSentContacts(const CtSnapshot<CtContactKind>& snapshot,
+                                           const ContactComposer& composer) {
+    return readSent(snapshot, [&](contacts_record_h record) { return composer.composeFields(record); });
+}
+
 CtSentRows<CtGroupKind> readSentGroups(const CtSnapshot<CtGroupKind>& snapshot) {
-    CtSentRows<CtGroupKind> sent;
-    for (const CtGroupSyncRow& row : snapshot.rows()) {
-        contacts_record_h raw = nullptr;
-        if (!row.uri.empty() || row.etag != kCtUnconfirmedEtag || row.dirty == 0 ||
-            snapshot.record(row.group_id) == nullptr ||
-            contacts_db_get_record(_contacts_group, row.group_id, &raw) != PLATFORM_ERROR_NONE) {
-            continue;
-        }
-        const ContactsRecord record(raw);
-        sent.emplace(contacts_read::textOf(raw, CONTACTS_GROUP_NAME), row);
-    }
-    return sent;
+    return readSent(snapshot, [](contacts_record_h record) {
+        return contacts_read::textOf(record, CONTACTS_GROUP_NAME);
+    });
 }
 
 CtContactBatch planContacts(const CtContactPage& page, const CtSnapshot<CtContactKind>& snapshot,
@@ -119,7 +136,7 @@ CtContactBatch planContacts(const CtContactPage& page, const CtSnapshot<CtContac
         Finding<CtContactKind> finding = find(*entry, snapshot, sent, says);
         const Standing standing = finding.standing;
         const CtRowWrite rowWrite = hasRow(standing) ? CtRowWrite::kUpdate : CtRowWrite::kInsert;
-        if (standing == Standing::kDeviceWins || standing == Standing::kEditedOrphan) {
+        if (isRowOnly(standing)) {
             batch.rows.push_back({finding.row, rowWrite});
             continue;
         }
@@ -165,7 +182,7 @@ std::vector<CtGroupItem> planGroups(const CtGroupPage& page, const CtSnapshot<Ct
         item.row.starred = entry->title == ct_wire::kStarredGroup ? 1 : 0;
         item.rowWrite = hasRow(standing) ? CtRowWrite::kUpdate : CtRowWrite::kInsert;
         item.expectedVersion = finding.version;
-        item.isRowOnly = standing == Standing::kDeviceWins || standing == Standing::kEditedOrphan;
+        item.isRowOnly = isRowOnly(standing);
         if (standing == Standing::kLost) {
             item.lostId = std::exchange(item.row.group_id, 0);
             item.expectedVersion = kAnyVersion;

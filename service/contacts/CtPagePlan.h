@@ -3,6 +3,7 @@
 //   listed          row              device's record       plan
 //   listed          none             none                  insert
 //   listed          sent, no answer  says the same         update, and the row takes id and etag
+//   listed          sent, no answer  edited or deleted     the row takes id and etag: the device's change wins
 //   listed          none             own, untouched        update
 //   listed          none             own, user edited it   the row is taken over as dirty: the device's change wins
 //   etag equal      any              any                   nothing, but for a photo or a membership that is still missing; a lost
@@ -19,9 +20,14 @@
 #include "contacts/CtGroupMap.h"
 #include "contacts/CtSnapshot.h"
 
-// Contacts and groups that an earlier run sent without an answer, by what they say.
+// Contacts and groups that an earlier run sent without an answer, by their marks: of what was sent, and of what they say now.
 template <class Kind>
-using CtSentRows = std::unordered_multimap<std::string, typename Kind::Row>;
+struct CtSentRow {
+    typename Kind::Row row;
+    bool isEdited = false;  // since it was sent
+};
+template <class Kind>
+using CtSentRows = std::unordered_multimap<std::string, CtSentRow<Kind>>;
 
 [[nodiscard]] CtSentRows<CtContactKind> readSentContacts(const CtSnapshot<CtContactKind>& snapshot,
                                                          const ContactComposer& composer);

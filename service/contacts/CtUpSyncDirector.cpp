@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "common/Account.h"
+#include "common/SentMark.h"
 #include "common/SyncLog.h"
 #include "contacts/CtDataManager.h"
 #include "contacts/CtDownSyncDirector.h"
@@ -22,9 +23,7 @@ int CtUpSyncDirector::findSentItems(int addressBookId) {
     if (store->getAllContacts(addressBookId, &contacts) != kOk ||
         store->getAllGroups(addressBookId, &groups) != kOk)
         return kFailed;
-    const auto isUnconfirmed = [](const auto& row) {
-        return row.uri.empty() && row.etag == kCtUnconfirmedEtag;
-    };
+    const auto isUnconfirmed = [](const auto& row) { return row.uri.empty() && sent_mark::isOn(row.etag); };
     if (std::none_of(contacts.begin(), contacts.end(), isUnconfirmed) &&
         std::none_of(groups.begin(), groups.end(), isUnconfirmed)) {
         return kOk;

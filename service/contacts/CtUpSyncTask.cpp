@@ -151,7 +151,10 @@ CtUpReply CtUpSyncTask::removePhoto(const std::string& contactId, const std::str
 
 CtUpReply CtUpSyncTask::read(CtItemType type, const std::string& id) {
     std::string text;
-    CtUpReply reply = judge(mpCurl->get(CtIdUtil::makeEditHref(mpCurl->feedBase(), type, id) + kJson, &text));
+    const std::string url = CtIdUtil::makeEditHref(mpCurl->feedBase(), type, id) + kJson;
+    CtUpReply reply = judge(mpCurl->get(url, &text));
+    // One answer that it is gone is not believed.
+    if (reply.answer == CtAnswer::kGone) reply = judge(mpCurl->get(url, &text));
     if (!reply.isAccepted()) return reply;
     if (CtEntryMetaDataParser::getMetaData(text, &reply.meta) == kOk && reply.meta.id == id) return reply;
     reply.answer = CtAnswer::kUnclear;

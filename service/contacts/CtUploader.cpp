@@ -2,6 +2,7 @@
 
 #include "common/JsonAccess.h"
 #include "common/JsonText.h"
+#include "common/SentMark.h"
 #include "common/SyncLog.h"
 #include "contacts/CtRecordRead.h"
 #include "contacts/CtTransaction.h"
@@ -67,7 +68,9 @@ CtUploader::CtUploader(CtMetaDataDBHelper* store, int addressBookId, CtCurl* cur
 int CtUploader::run() {
     std::vector<CtGroupSyncRow> groups;
     std::vector<CtContactSyncRow> contacts;
-    if (mpStore->getAllGroups(mAddressBookId, &groups) != kOk || markAsSent<CtGroupKind>(&groups) != kOk) {
+    const auto nameOf = [](contacts_record_h group) { return textOf(group, CONTACTS_GROUP_NAME); };
+    if (mpStore->getAllGroups(mAddressBookId, &groups) != kOk ||
+        markAsSent<CtGroupKind>(&groups, &mGroupRecords, nameOf) != kOk) {
         failOfStore(kStoreFails);
         return mResult;
     }
@@ -75,13 +78,14 @@ int CtUploader::run() {
         if (!isOver() && row.dirty != 0 && row.deleted == 0 && !isParked<CtGroupKind>(row)) sendGroup(row);
     }
     // After the groups, so that memberships name those that were just made.
-    if (mGroups.load(*mpStore, mAddressBookId) != kOk ||
-        mpStore->getAllContacts(mAddressBookId, &contacts) != kOk ||
-        markAsSent<CtContactKind>(&contacts) != kOk) {
+    const bool isLoaded = mGroups.load(*mpStore, mAddressBookId) == kOk &&
+                          mpStore->getAllContacts(mAddressBookId, &contacts) == kOk;
+    mpComposer = std::make_unique<ContactComposer>(mGroups.composer(mpCurl->feedBase()));
+    const auto fieldsOf = [this](contacts_record_h contact) { return mpComposer->composeFields(contact); };
+    if (!isLoaded || markAsSent<CtContactKind>(&contacts, &mContactRecords, fieldsOf) != kOk) {
         failOfStore(kStoreFails);
         return mResult;
     }
-    mpComposer = std::make_unique<ContactComposer>(mGroups.composer(mpCurl->feedBase()));
     sendContacts(&contacts);
     for (CtContactSyncRow& row : contacts) {
         if (!isOver() && row.deleted != 0 && !isParked<CtContactKind>(row))
@@ -120,16 +124,25 @@ void CtUploader::failOfStore(const char* text) {
     if (mFailure.empty()) mFailure = text;
 }
 
-template <class Kind>
-int CtUploader::markAsSent(std::vector<typename Kind::Row>* rows) {
+template <class Kind, class Says>
+int CtUploader::markAsSent(std::vector<typename Kind::Row>* rows, ContactsRecordsAhead* records, Says says) {
+    std::vector<typename Kind::Row*> marked;
+    std::vector<int> ids;
+    for (auto& row : *rows) {
+        if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || isParked<Kind>(row)) continue;
+        marked.push_back(&row);
+        ids.push_back(row.*Kind::kId);
+    }
+    records->expect(std::move(ids));
+    for (typename Kind::Row* row : marked) {
+        ContactsRecord record;
+        const bool isRead = records->take(row->*Kind::kId, &record) == PLATFORM_ERROR_NONE;
+        row->etag = sent_mark::of(isRead ? says(record.get()) : std::string());
+    }
     SyncTransaction transaction(mpStore->database());
     if (!transaction.begun()) return kFailed;
-    for (auto& row : *rows) {
-        if (!row.uri.empty() || row.dirty == 0 || row.deleted != 0 || row.etag == kCtUnconfirmedEtag ||
-            isParked<Kind>(row))
-            continue;
-        row.etag = kCtUnconfirmedEtag;
-        if (Kind::update(*mpStore, row) != kOk) return kFailed;
+    for (const typename Kind::Row* row : marked) {
+        if (Kind::update(*mpStore, *row) != kOk) return kFailed;
     }
     return transaction.commit();
 }
@@ -152,7 +165,7 @@ void CtUploader::renew(typename Kind::Row& row) {
     SYNC_ERR("%s(%s) was deleted on the server and changed on the device, it is sent as new", Kind::kName,
              row.uri.c_str());
     row.uri.clear();
-    row.etag = kCtUnconfirmedEtag;
+    row.etag = sent_mark::kNamesNothing;
     forgetPhoto(&row);
     if (Kind::update(*mpStore, row) != kOk) mIsOver = true;
 }
@@ -365,7 +378,7 @@ template <class Kind>
 void CtUploader::sendDeleted(CtItemType type, typename Kind::Row& row) {
     const int id = row.*Kind::kId;
     if (row.uri.empty()) {
-        if (row.etag == kCtUnconfirmedEtag)
+        if (row.etag == sent_mark::kNamesNothing)
             SYNC_ERR("%s(%d) was deleted before the server's answer to it was known", Kind::kName, id);
         if (Kind::forget(*mpStore, id) == kOk) return;
         mIsOver = true;

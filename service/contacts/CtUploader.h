@@ -57,8 +57,9 @@ private:
     void failOfStore(const char* text);
     template <class Kind>
     void store(typename Kind::Row& row, const CtUpReply& reply, int version);
-    template <class Kind>
-    [[nodiscard]] int markAsSent(std::vector<typename Kind::Row>* rows);
+    template <class Kind, class Says>
+    [[nodiscard]] int markAsSent(std::vector<typename Kind::Row>* rows, ContactsRecordsAhead* records,
+                                 Says says);
     template <class Kind>
     void sendDeleted(CtItemType type, typename Kind::Row& row);
     // Forgets what the server knew of the item: it is sent as new.

@@ -234,6 +234,29 @@ TEST_P(Polite, OneWrongAnswerIsNeitherSuccessNorTheEndOfAnItem) {
     mPair.expectQuiet(1);
 }
 
+// What was sent is known in the list although the device's item no longer says it.
+TEST_P(Polite, AnItemWhoseAnswerWasLostIsFoundAlthoughItWasEditedOrDeleted) {
+    for (const bool isDeleted : {false, true}) {
+        SCOPED_TRACE(isDeleted);
+        const std::string sent = isDeleted ? "sent, then deleted" : "sent, then edited";
+        mPair.installFault(
+            {{"method", "POST"}, {"path", GetParam().path}, {"kind", "reset"}, {"afterHandling", true}});
+        const int id = add(sent);
+        ASSERT_TRUE(eventually([&] { return idsOf(sent).size() == 1; }));
+        mPair.expectFaultsUsed();
+        if (isDeleted) {
+            EXPECT_EQ(mPair.device.tool({GetParam().noun, "delete", std::to_string(id)}).status, 0);
+        } else {
+            edit(id, "edited");
+        }
+        EXPECT_EQ(mPair.sync(1).status, 0) << mPair.device.daemonLog();
+        EXPECT_EQ(idsOf(sent).size(), 0U);
+        EXPECT_EQ(idsOf("edited").size(), 1U);
+        EXPECT_EQ(mPair.sync(1).status, 0) << "lets go of what was deleted";
+        mPair.expectQuiet(1);
+    }
+}
+
 INSTANTIATE_TEST_SUITE_P(Kinds, Polite, testing::ValuesIn(kKinds),
                          [](const testing::TestParamInfo<Kind>& row) { return std::string(row.param.name); });
 

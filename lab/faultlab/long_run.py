@@ -6,9 +6,9 @@ import time
 from dataclasses import dataclass
 
 from faultlab import account, checker, points
-from faultlab.history import History
-from faultlab.provider import Provider, people_path
-from faultlab.random_kills import FIELDS, SERIES, Both, DeviceEditor, ServerEditor
+from faultlab.provider import people_path
+from faultlab.random_kills import FIELDS, SERIES, DeviceEditor, ServerEditor
+from faultlab.synced import synced
 
 SETTLED = 50  # syncs until everything has its size
 EDITED_AFTER, DELETED_AFTER = 2, 5
@@ -156,26 +156,15 @@ def sync_many(run, changes, device, outcome):
 
 def trial_of(worker, run):
     outcome = points.Outcome(run, hit="run")
-    device, history = worker.fresh_device(), History()
-    seed = device.root.parent / "provider.json"
-    seed.write_text(json.dumps(account.SEED))
-    with Provider(worker.port, str(seed)) as provider:
-        try:
-            for fill in account.FILL.values():
-                fill(provider, history)
-            device.initialize(provider)
-            device.add_account(provider)
-            device.sync()
-            device.tool("daemon", "stop")
-            device.wrapper = LEAK_CHECK if run.valgrind else []
-            device.start()
-            sync_many(run, Changes(provider, device, history, run.seed), device, outcome)
-            if not outcome.problems and points.sync_until_quiet(Both(device, provider), "all", outcome):
-                outcome.problems += checker.judge(provider, device, {1: history}, ["calendar", "contacts"])
-            if not device.stop(SYNC_S) or device.exit_status() != 0:
-                outcome.problems.append(f"the daemon ended with {device.exit_status()}; its log has the leak check's words")
-        finally:
-            device.kill()
+    with synced(worker) as trial:
+        device, provider, history = trial
+        device.wrapper = LEAK_CHECK if run.valgrind else []
+        device.start()
+        sync_many(run, Changes(provider, device, history, run.seed), device, outcome)
+        if not outcome.problems and points.sync_until_quiet(trial, "all", outcome):
+            outcome.problems += checker.judge(provider, device, {1: history}, ["calendar", "contacts"])
+        if not device.stop(SYNC_S) or device.exit_status() != 0:
+            outcome.problems.append(f"the daemon ended with {device.exit_status()}; its log has the leak check's words")
     return outcome
 
 

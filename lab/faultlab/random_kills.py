@@ -5,12 +5,11 @@ import random
 import threading
 import time
 from dataclasses import dataclass
-from typing import NamedTuple
 
 from faultlab import account, checker, points
 from faultlab.device import ToolFailed
-from faultlab.history import History
-from faultlab.provider import Provider, Refused, events_path, people_path, tasks_path
+from faultlab.provider import Refused, events_path, people_path, tasks_path
+from faultlab.synced import synced
 
 KILLS = 30
 SHORT_KILLS = 10
@@ -164,11 +163,6 @@ class ServerEditor(Editor):
             raise
 
 
-class Both(NamedTuple):
-    device: object
-    provider: object
-
-
 def _kill_at_random(device, chance, kills):
     for _ in range(kills):
         if not device.is_running():
@@ -181,32 +175,21 @@ def _kill_at_random(device, chance, kills):
 
 def trial_of(worker, run):
     outcome = points.Outcome(run, hit="killed")
-    device, history = worker.fresh_device(), History()
-    seed = device.root.parent / "provider.json"
-    seed.write_text(json.dumps(account.SEED))
-    with Provider(worker.port, str(seed)) as provider:
-        try:
-            for fill in account.FILL.values():
-                fill(provider, history)
-            device.initialize(provider)
-            device.add_account(provider)
-            device.sync()
-            device.tool("daemon", "stop")
-            for task in ServerEditor.KNOWN["todo"]:
-                history.may_be_lost(f"task-{task[-1]} of the server")
-            editors = [DeviceEditor(run.seed, history, device), ServerEditor(run.seed + 1, history, provider)]
-            for editor in editors:
-                editor.start()
-            _kill_at_random(device, random.Random(run.seed), run.kills)
-            for editor in editors:
-                editor.must_end.set()
-                editor.join()
-                if editor.failure:
-                    outcome.problems.append(f"an edit failed: {editor.failure!r}")
-            points.sync_until_quiet(Both(device, provider), "all", outcome)
-            outcome.problems += checker.judge(provider, device, {1: history}, ["calendar", "contacts"])
-        finally:
-            device.kill()
+    with synced(worker) as trial:
+        device, provider, history = trial
+        for task in ServerEditor.KNOWN["todo"]:
+            history.may_be_lost(f"task-{task[-1]} of the server")
+        editors = [DeviceEditor(run.seed, history, device), ServerEditor(run.seed + 1, history, provider)]
+        for editor in editors:
+            editor.start()
+        _kill_at_random(device, random.Random(run.seed), run.kills)
+        for editor in editors:
+            editor.must_end.set()
+            editor.join()
+            if editor.failure:
+                outcome.problems.append(f"an edit failed: {editor.failure!r}")
+        points.sync_until_quiet(trial, "all", outcome)
+        outcome.problems += checker.judge(provider, device, {1: history}, ["calendar", "contacts"])
     return outcome
 
 

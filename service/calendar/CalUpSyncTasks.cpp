@@ -108,12 +108,13 @@ UpReply CalUpSyncTask::insert(const std::string& bookUri, const std::string& bod
 }
 
 UpReply CalUpSyncTask::update(const std::string& bookUri, const std::string& uri, const std::string& body) {
+    int result = kOk;
     UpReply reply = twice([&] {
         std::string answer;
-        const int result = (mCurl.*mRequests.update)(bookUri, uri, body, &answer);
-        if (result != kOk) SYNC_ERR("CalCurl update fail(%d)", result);
+        result = (mCurl.*mRequests.update)(bookUri, uri, body, &answer);
         return judge(result, answer);
     });
+    if (result != kOk) SYNC_ERR("CalCurl update fail(%d)", result);
     if (reply.answer != UpAnswer::kAccepted || reply.uri.empty() || reply.uri == uri) return reply;
     reply.answer = UpAnswer::kUnclear;
     reply.result = kFailed;
@@ -122,12 +123,14 @@ UpReply CalUpSyncTask::update(const std::string& bookUri, const std::string& uri
 }
 
 UpReply CalUpSyncTask::remove(const std::string& bookUri, const std::string& uri) {
-    return twice([&] {
+    int result = kOk;
+    UpReply reply = twice([&] {
         std::string answer;
-        const int result = (mCurl.*mRequests.remove)(bookUri, uri, &answer);
-        if (result != kOk) SYNC_ERR("CalCurl update fail(%d)", result);
+        result = (mCurl.*mRequests.remove)(bookUri, uri, &answer);
         return judge(result, answer);
     });
+    if (result != kOk) SYNC_ERR("CalCurl update fail(%d)", result);
+    return reply;
 }
 
 CalUpSyncEventTask::CalUpSyncEventTask(Account* account, IProgressObserver* observer,

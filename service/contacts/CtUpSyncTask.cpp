@@ -92,8 +92,9 @@ CtUpReply CtUpSyncTask::update(CtItemType type, const std::string& id, const std
     SYNC_ERR("%s", kKeepsEtag);
     if (!text.empty()) return notOfProvider(std::move(reply));
     CtUpReply now = read(type, id);
-    if (!now.isAccepted()) return notOfProvider(std::move(now));
-    return now;
+    // An account that may ask no longer, or a server that is away, is told as that.
+    if (now.isAccepted() || now.answer == CtAnswer::kNoAnswer) return now;
+    return notOfProvider(std::move(now));
 }
 
 CtUpReply CtUpSyncTask::remove(CtItemType type, const std::string& id, const std::string& etag) {

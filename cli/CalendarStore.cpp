@@ -14,7 +14,7 @@ CalendarStore::~CalendarStore() {
 
 namespace {
 
-using Service =
+using CalendarService =
     store_access::Service<calendar_query_create, calendar_db_get_records_with_query, CalendarList>;
 using store_access::Filter;
 
@@ -22,7 +22,7 @@ using store_access::Filter;
 
 CalendarList CalendarStore::find(const char* view, const std::vector<Filter>& filters, unsigned sortBy,
                                  std::span<const unsigned> projection) {
-    return store_access::find<Service>("the calendar store", view, filters, sortBy, projection);
+    return store_access::find<CalendarService>("the calendar store", view, filters, sortBy, projection);
 }
 
 CalendarList CalendarStore::calendars(std::optional<int> account) {

@@ -7,7 +7,7 @@ namespace {
 
 using record_access::intOf;
 using store_access::Filter;
-using Service =
+using ContactsService =
     store_access::Service<contacts_query_create, contacts_db_get_records_with_query, ContactsList>;
 
 }  // namespace
@@ -22,7 +22,7 @@ ContactsStore::~ContactsStore() {
 
 ContactsList ContactsStore::find(const char* view, const std::vector<Filter>& filters, unsigned sortBy,
                                  std::span<const unsigned> projection) {
-    return store_access::find<Service>("the contacts store", view, filters, sortBy, projection);
+    return store_access::find<ContactsService>("the contacts store", view, filters, sortBy, projection);
 }
 
 std::vector<ContactsList> ContactsStore::ofAccount(const View& view, std::optional<int> account,

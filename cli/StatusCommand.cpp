@@ -8,13 +8,13 @@
 
 namespace {
 
-struct Options {
+struct StatusOptions {
     int account = 0;
     bool isJson = false;
 };
 
-std::shared_ptr<Options> declare(CLI::App& app) {
-    auto options = std::make_shared<Options>();
+std::shared_ptr<StatusOptions> declare(CLI::App& app) {
+    auto options = std::make_shared<StatusOptions>();
     command::addId(app, "ACCOUNT", options->account, "Only this account");
     command::addJson(app, options->isJson);
     return options;

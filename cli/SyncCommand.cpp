@@ -17,20 +17,20 @@ namespace {
 constexpr const char* kAll = "all";
 constexpr int kMostStartTries = 5;
 
-struct Options {
+struct SyncOptions {
     int account = 0;
     std::string kind = kAll;
     bool waits = false;
 };
 
-void declare(CLI::App& app, Options& options) {
+void declare(CLI::App& app, SyncOptions& options) {
     command::addId(app, "ACCOUNT", options.account, "The account")->required();
     app.add_option("KIND", options.kind, "calendar, contacts or all (which is meant when nothing is said)")
         ->check(CLI::IsMember({"calendar", "contacts", kAll}));
 }
 
 // "all" is what is switched on.
-std::vector<vantor_pim_sync_type_e> kindsOf(const Options& options) {
+std::vector<vantor_pim_sync_type_e> kindsOf(const SyncOptions& options) {
     if (const auto one = valueOf(kKinds, options.kind)) return {static_cast<vantor_pim_sync_type_e>(*one)};
     const AccountRecord record = sync_client::account(options.account);
     if (record == nullptr) {
@@ -95,7 +95,7 @@ std::string waitFor(SyncWait& wait, int account, vantor_pim_sync_type_e kind, in
                         : text;
 }
 
-void sync(const Options& options) {
+void sync(const SyncOptions& options) {
     daemon_link::requireRunning();
     SyncWait wait;
     std::string problems;
@@ -127,7 +127,7 @@ void sync(const Options& options) {
 }
 
 // Like a service manager: what does not run is stopped already.
-void stop(const Options& options) {
+void stop(const SyncOptions& options) {
     daemon_link::requireRunning();
     for (const vantor_pim_sync_type_e kind : kindsOf(options)) {
         const int code = vantor_pim_sync_stop(options.account, kind);
@@ -147,7 +147,7 @@ void stop(const Options& options) {
 }  // namespace
 
 Action buildSync(CLI::App& app) {
-    auto options = std::make_shared<Options>();
+    auto options = std::make_shared<SyncOptions>();
     declare(app, *options);
     app.add_flag("--wait", options->waits,
                  "Return when the sync has ended; exit status 0 only if it ended well");
@@ -158,7 +158,7 @@ Action buildSync(CLI::App& app) {
 }
 
 Action buildStop(CLI::App& app) {
-    auto options = std::make_shared<Options>();
+    auto options = std::make_shared<SyncOptions>();
     declare(app, *options);
     return [options] {
         stop(*options);

@@ -11,6 +11,23 @@ if(VPS_SANITIZE)
     target_link_options(vps_options INTERFACE -fsanitize=${VPS_SANITIZE})
 endif()
 
+# vps_unity(TARGET ...): several files of these targets are compiled as one. Their templates and headers cost most of a build,
+# and are read once for all. Names in anonymous namespaces have to differ within such a target; a file whose names are the
+# same as in its siblings by design is compiled apart (SKIP_UNITY_BUILD_INCLUSION).
+option(VPS_UNITY "Compile several files of the larger targets as one" ON)
+function(vps_unity)
+    if(NOT VPS_UNITY)
+        return()
+    endif()
+    set_target_properties(${ARGN} PROPERTIES UNITY_BUILD ON UNITY_BUILD_BATCH_SIZE 10)
+    if(CMAKE_CXX_COMPILER_ID STREQUAL GNU)
+        # What is in no header cannot clash; GCC takes every file but the outermost for one.
+        foreach(target IN LISTS ARGN)
+            target_compile_options(${target} PRIVATE -Wno-subobject-linkage)
+        endforeach()
+    endif()
+endfunction()
+
 if(NOT BUILD_TESTING)
     return()
 endif()
@@ -24,6 +41,7 @@ function(vps_add_test name)
     # Tests are small and many; optimising their templates, and reading these headers for each, would take most of a build's time.
     target_compile_options(${name} PRIVATE -O0 -g0)
     target_precompile_headers(${name} REUSE_FROM test_headers)
+    vps_unity(${name})
     if(NOT ARG_TIMEOUT)
         set(ARG_TIMEOUT 120)
     endif()

@@ -6,10 +6,6 @@ namespace provider {
 
 namespace {
 
-Reply done() {
-    return jsonReply(Json::object());
-}
-
 // An entry's own members are plain here: the id is no address.
 Json plainEntry(const FeedEntry& entry, const std::string& origin) {
     Json out = {{"id", entry.id}, {"etag", entry.etag}, {"updated", entry.updated}};

@@ -7,10 +7,6 @@ namespace {
 // More than a person would read.
 constexpr std::size_t kMaxNews = 200;
 
-Reply done() {
-    return jsonReply(Json::object());
-}
-
 std::string emailOf(const Json& body) {
     const auto email = body.find("email");
     if (email == body.end() || !email->is_string()) {

@@ -10,10 +10,6 @@ WriteOptions adminWrite(const Call& call) {
     return {call.header("If-Match"), true};
 }
 
-Reply done() {
-    return jsonReply(Json::object());
-}
-
 Reply eventReply(const EventText& text) {
     Reply reply;
     reply.body = text.text();

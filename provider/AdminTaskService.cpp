@@ -5,10 +5,6 @@ namespace provider {
 
 namespace {
 
-Reply done() {
-    return jsonReply(Json::object());
-}
-
 ListItems listItems(const std::vector<std::unique_ptr<Task>>& tasks) {
     const auto text = [&tasks](std::size_t i, const char* name) {
         const auto found = tasks[i]->body.find(name);

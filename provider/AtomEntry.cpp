@@ -12,7 +12,7 @@ namespace provider {
 
 namespace {
 
-constexpr int kMaxDepth = 16;
+constexpr int kMaxXmlDepth = 16;
 
 [[noreturn]] void malformed(const std::string& why) {
     throw ApiError{400, "parseError", "Invalid entry: " + why, ""};
@@ -78,7 +78,7 @@ void addMember(Json& to, const std::string& member, Json value) {
 }
 
 Json elementJson(pugi::xml_node node, int depth) {
-    if (depth > kMaxDepth) malformed("nested too deeply");
+    if (depth > kMaxXmlDepth) malformed("nested too deeply");
     Json out = Json::object();
     for (const pugi::xml_attribute attribute : node.attributes()) {
         const std::string name = attribute.name();

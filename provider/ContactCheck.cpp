@@ -40,10 +40,10 @@ constexpr ListMember kListMembers[] = {
     {"gContact$hobby"},
     {"gContact$language"},
 };
-constexpr const char* kOwnMembers[] = {
+constexpr const char* kEntryOwnMembers[] = {
     "id",   "etag",       "gd$etag", "updated", "published",           "category",
     "link", "gd$deleted", "photo",   "deleted", "gContact$systemGroup"};
-constexpr int kMaxDepth = 16;
+constexpr int kMaxJsonDepth = 16;
 
 const ListMember* listMember(const std::string& name) {
     const auto* found = std::find_if(std::begin(kListMembers), std::end(kListMembers),
@@ -62,7 +62,7 @@ std::string textOrNone(const Json& element, const char* attribute) {
 
 // Attributes and texts are strings, everything else is an element or a list of them.
 void checkShape(const std::string& name, const Json& value, int depth) {
-    if (depth > kMaxDepth) invalid(name, "nested too deeply");
+    if (depth > kMaxJsonDepth) invalid(name, "nested too deeply");
     if (value.is_array()) {
         if (!isListMember(name)) invalid(name, "must be there only once");
         for (const Json& item : value) {
@@ -91,7 +91,7 @@ void checkListed(const ListMember& row, const Json& element) {
         invalid(row.name, std::string("needs ") + row.attribute);
 }
 
-void checkEvent(const Json& event) {
+void checkContactEvent(const Json& event) {
     const auto when = event.find("gd$when");
     if (when == event.end() || !when->is_object()) invalid("gContact$event", "needs gd:when");
     if (!parseDate(textOrNone(*when, "startTime"))) invalid("gContact$event", "startTime must be YYYY-MM-DD");
@@ -110,7 +110,7 @@ bool isListMember(const std::string& member) {
 }
 
 void dropOwnMembers(Json& fields) {
-    for (const char* member : kOwnMembers) fields.erase(member);
+    for (const char* member : kEntryOwnMembers) fields.erase(member);
 }
 
 void checkFields(FeedKind kind, const Json& fields) {
@@ -123,7 +123,7 @@ void checkFields(FeedKind kind, const Json& fields) {
     }
     const auto events = fields.find("gContact$event");
     if (events != fields.end()) {
-        for (const Json& event : *events) checkEvent(event);
+        for (const Json& event : *events) checkContactEvent(event);
     }
     if (fields.contains("gContact$birthday")) checkBirthday(fields.at("gContact$birthday"));
     if (kind == FeedKind::kGroup && (!fields.contains("title") || !has(fields.at("title"), "$t")))

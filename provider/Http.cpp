@@ -88,6 +88,10 @@ Reply jsonReply(const Json& body, int status) {
     return reply;
 }
 
+Reply done() {
+    return jsonReply(Json::object());
+}
+
 void requireBody(const Call& call, std::string_view wantedMedia) {
     const std::string type = contentType(call);
     const std::string media = type.substr(0, type.find_first_of("; "));

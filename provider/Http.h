@@ -56,6 +56,8 @@ struct Reply {
 };
 
 Reply jsonReply(const Json& body, int status = 200);
+// Of a service that has nothing to tell: an empty object.
+Reply done();
 
 // Throws 400 without a body, 413 above the limit, 415 when the content type is another one or not in UTF-8.
 void requireBody(const Call& call, std::string_view wantedMedia);

@@ -10,7 +10,7 @@ namespace provider {
 namespace {
 
 // Set by the provider alone; what a client sends for them is not taken.
-constexpr const char* kOwnMembers[] = {"kind", "id", "etag", "updated", "selfLink", "position"};
+constexpr const char* kTaskOwnMembers[] = {"kind", "id", "etag", "updated", "selfLink", "position"};
 constexpr const char* kTextMembers[] = {"title", "notes"};
 constexpr const char* kTimeMembers[] = {"due", "completed"};
 
@@ -46,7 +46,7 @@ Task* TaskList::find(const std::string& taskId) const {
 
 void TaskList::store(Task& task, Json body) {
     dropNulls(body);
-    for (const char* member : kOwnMembers) body.erase(member);
+    for (const char* member : kTaskOwnMembers) body.erase(member);
     if (!body.contains("title")) body["title"] = "";
     if (!body.contains("status")) body["status"] = "needsAction";
     checkTask(body);

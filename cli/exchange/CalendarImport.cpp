@@ -11,7 +11,7 @@ namespace exchange {
 
 namespace {
 
-constexpr BulkWriter::Calls kCalls{
+constexpr BulkWriter::Calls kCalendarCalls{
     [](calendar_list_h list, const record_write_options_s& options) {
         return calendar_db_insert_records(list, options);
     },
@@ -36,7 +36,7 @@ void CalendarImport::run(ItemReader& reader) {
     read(reader);
     joinInstances();
     KnownItems known = mRecords.known();
-    BulkWriter writer(kCalls, mReport, mOptions.isDryRun);
+    BulkWriter writer(kCalendarCalls, mReport, mOptions.isDryRun);
     for (const CalendarItem& item : mItems) decide(item, known, writer);
     for (const CalendarItem* item : mUndecided)
         settle(*item, known.findByKeys(mRecords.keysOf(mRecords.say(mRecords.make(*item).get()))), writer);

@@ -16,7 +16,7 @@ namespace {
 
 using record_access::intOf;
 
-constexpr BulkWriter::Calls kCalls{
+constexpr BulkWriter::Calls kContactsCalls{
     [](contacts_list_h list, const record_write_options_s& options) {
         return contacts_db_insert_records(list, options);
     },
@@ -77,7 +77,7 @@ KnownItems ContactsImport::known() const {
 
 void ContactsImport::run(ItemReader& reader) {
     KnownItems known = this->known();
-    BulkWriter writer(kCalls, mReport, mOptions.isDryRun);
+    BulkWriter writer(kContactsCalls, mReport, mOptions.isDryRun);
     RawItem raw;
     while (reader.next(&raw)) take(raw, known, writer);
     for (const Card& card : mUndecided)

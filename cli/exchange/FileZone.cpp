@@ -10,7 +10,7 @@ namespace exchange {
 
 namespace {
 
-constexpr size_t kMostBytes = 65536;
+constexpr size_t kMostZoneBytes = 65536;
 
 struct ComponentDeleter {
     void operator()(icalcomponent* component) const noexcept { icalcomponent_free(component); }
@@ -64,7 +64,7 @@ void FileZone::Deleter::operator()(_icaltimezone* zone) const noexcept {
 }
 
 FileZone::FileZone(const std::string& component) {
-    if (component.size() > kMostBytes) return;
+    if (component.size() > kMostZoneBytes) return;
     icalerror_set_errors_are_fatal(0);
     Component parsed(icalparser_parse_string(component.c_str()));
     if (!isZone(parsed.get())) return;

@@ -22,8 +22,6 @@ namespace {
 constexpr long kTimeoutSeconds = 60;
 constexpr int kMaxAttempts = 5;
 constexpr long kUnauthorized = 401;
-constexpr const char* kCalendars = "/calendar/v3/calendars/";
-constexpr const char* kLists = "/tasks/v1/lists/";
 // The service takes updates of tasks under another prefix than everything else.
 constexpr const char* kUpdateLists = "/tasks/v3/list/";
 constexpr const char* kEtagFields = "?fields=etag%2Cid";
@@ -43,7 +41,7 @@ HttpMethod methodOf(std::string_view text) {
 }
 
 std::string eventPath(const std::string& calendarId) {
-    return kCalendars + url_text::segment(calendarId) + "/events";
+    return cal_path::kCalendars + url_text::segment(calendarId) + "/events";
 }
 
 std::string eventPath(const std::string& calendarId, const std::string& eventId) {
@@ -101,7 +99,7 @@ int CalCurl::getEtagUri(const std::string& calendarId, const std::string& eventI
 }
 
 int CalCurl::insertTodo(const std::string& listId, const std::string& body, std::string* response) {
-    return checked("insertTodo", performCurl(taskPath(kLists, listId), "POST", &body, response));
+    return checked("insertTodo", performCurl(taskPath(cal_path::kLists, listId), "POST", &body, response));
 }
 
 int CalCurl::updateTodo(const std::string& listId, const std::string& taskId, const std::string& body,
@@ -111,12 +109,12 @@ int CalCurl::updateTodo(const std::string& listId, const std::string& taskId, co
 }
 
 int CalCurl::removeTodo(const std::string& listId, const std::string& taskId, std::string* response) {
-    return checked("removeTodo", performCurl(taskPath(kLists, listId, taskId), "DELETE", nullptr, response));
+    return checked("removeTodo", performCurl(taskPath(cal_path::kLists, listId, taskId), "DELETE", nullptr, response));
 }
 
 int CalCurl::getTodoEtagUri(const std::string& listId, const std::string& taskId, std::string* response) {
     return checked("getTodoEtagUri",
-                   performCurl(taskPath(kLists, listId, taskId) + kEtagFields, "GET", nullptr, response));
+                   performCurl(taskPath(cal_path::kLists, listId, taskId) + kEtagFields, "GET", nullptr, response));
 }
 
 int CalCurl::get(const std::string& path, std::string* response) {

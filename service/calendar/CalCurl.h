@@ -9,6 +9,12 @@
 
 #include "common/SyncCurl.h"
 
+// What the paths of items begin with; the encoded id of the calendar or the list follows.
+namespace cal_path {
+inline constexpr const char* kCalendars = "/calendar/v3/calendars/";
+inline constexpr const char* kLists = "/tasks/v1/lists/";
+}  // namespace cal_path
+
 class CalCurl {
 public:
     CalCurl(Account* account, IProgressObserver* observer, std::shared_ptr<HttpShare> share = nullptr);

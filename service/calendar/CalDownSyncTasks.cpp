@@ -11,9 +11,6 @@ using sync_result::kOk;
 
 namespace {
 
-constexpr const char* kCalendars = "/calendar/v3/calendars/";
-constexpr const char* kLists = "/tasks/v1/lists/";
-
 std::string withToken(std::string path, const std::string& pageToken) {
     if (pageToken.empty()) return path;
     path += path.find('?') == std::string::npos ? '?' : '&';
@@ -72,14 +69,14 @@ int CalDownSyncBookListTask::getList(const std::string& pageToken, CalListPage* 
 
 int CalDownSyncEventListTask::getList(const std::string& calendarId, CalListPage* page) {
     return fetch(&CalCurl::get,
-                 kCalendars + url_text::segment(calendarId) +
+                 cal_path::kCalendars + url_text::segment(calendarId) +
                      "/events?fields=items(etag%2Cid%2Csummary)&maxResults=100000000",
                  "set string fail", &CalJsonParser::getEventList, page);
 }
 
 int CalDownSyncEventListTask::getListPage(const std::string& calendarId, const std::string& pageToken,
                                           CalListPage* page) {
-    const std::string path = kCalendars + url_text::segment(calendarId) +
+    const std::string path = cal_path::kCalendars + url_text::segment(calendarId) +
                              "/events?fields=items(etag%2Cid%2Csummary)%2CnextPageToken&maxResults=50";
     return fetch(&CalCurl::get, withToken(path, pageToken), "set string fail",
                  &CalJsonParser::getEventListPage, page);
@@ -88,7 +85,7 @@ int CalDownSyncEventListTask::getListPage(const std::string& calendarId, const s
 int CalDownSyncEventListTask::getAllPage(const std::string& calendarId, const std::string& pageToken,
                                          CalListPage* page) {
     return fetch(&CalCurl::get,
-                 withToken(kCalendars + url_text::segment(calendarId) + "/events?maxResults=50", pageToken),
+                 withToken(cal_path::kCalendars + url_text::segment(calendarId) + "/events?maxResults=50", pageToken),
                  "set string fail", &CalJsonParser::getEventAllPage, page);
 }
 
@@ -99,14 +96,14 @@ int CalDownSyncTodoBookListTask::getList(const std::string& pageToken, CalListPa
 
 int CalDownSyncTodoListTask::getListPage(const std::string& listId, const std::string& pageToken,
                                          CalListPage* page) {
-    const std::string path = kLists + url_text::segment(listId) +
+    const std::string path = cal_path::kLists + url_text::segment(listId) +
                              "/tasks?fields=items(etag%2Cid%2Ctitle)%2CnextPageToken&maxResults=50";
     return fetch(&CalCurl::getTodo, withToken(path, pageToken), "setString fail",
                  &CalJsonParser::getTodoListPage, page);
 }
 
 int CalDownSyncTodoTask::get(const std::string& listId, const std::string& taskId, JsonNodePtr* task) {
-    const std::string path = kLists + url_text::segment(listId) + "/tasks/" + url_text::segment(taskId);
+    const std::string path = cal_path::kLists + url_text::segment(listId) + "/tasks/" + url_text::segment(taskId);
     if (const int result = request(&CalCurl::getTodo, path, "setString fail"); result != kOk) return result;
     *task = mParser.takeRoot();
     return kOk;

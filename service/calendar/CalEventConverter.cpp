@@ -22,22 +22,9 @@ bool setInt(calendar_record_h record, unsigned property, int value) {
     return calendar_record_set_int(record, property, value) == PLATFORM_ERROR_NONE;
 }
 
-// Members that are copied as they are, when present.
-struct TextMember {
-    const char* name;
-    unsigned property;
-};
-constexpr TextMember kTextMembers[] = {
-    {"id", CALENDAR_EVENT_UID},
-    {"summary", CALENDAR_EVENT_SUMMARY},
-    {"description", CALENDAR_EVENT_DESCRIPTION},
-    {"location", CALENDAR_EVENT_LOCATION},
-    {"etag", CALENDAR_EVENT_SYNC_DATA2},
-};
-
 template <size_t N>
-bool setTexts(JsonObject* item, const TextMember (&members)[N], calendar_record_h record) {
-    for (const TextMember& member : members) {
+bool setTexts(JsonObject* item, const cal_mapping::TextMember (&members)[N], calendar_record_h record) {
+    for (const cal_mapping::TextMember& member : members) {
         const std::optional<std::string> value = json_access::text(item, member.name);
         if (value && !setText(record, member.property, *value)) return false;
     }
@@ -146,7 +133,7 @@ int CalJsonParser::convertEvent(JsonObject* event, CalendarRecord* out) {
         return kFailed;
     }
     CalendarRecord record(raw);
-    if (!setTexts(event, kTextMembers, raw) || !setStates(event, raw) ||
+    if (!setTexts(event, cal_mapping::kEventTexts, raw) || !setStates(event, raw) ||
         !parseTime(event, "start", CALENDAR_EVENT_START, raw) ||
         !parseTime(event, "end", CALENDAR_EVENT_END, raw) || !setOrganizer(event, raw)) {
         SYNC_ERR("fail");
@@ -168,17 +155,13 @@ int CalJsonParser::convertEvent(JsonObject* event, CalendarRecord* out) {
 }
 
 int CalJsonParser::convertTodo(JsonObject* task, CalendarRecord* out) {
-    constexpr TextMember kTodoMembers[] = {{"id", CALENDAR_TODO_UID},
-                                           {"title", CALENDAR_TODO_SUMMARY},
-                                           {"notes", CALENDAR_TODO_NOTE},
-                                           {"etag", CALENDAR_TODO_SYNC_DATA2}};
     calendar_record_h raw = nullptr;
     if (task == nullptr || calendar_record_create(_calendar_todo, &raw) != PLATFORM_ERROR_NONE) {
         SYNC_ERR("calendar record create fail");
         return kFailed;
     }
     CalendarRecord record(raw);
-    bool set = setTexts(task, kTodoMembers, raw);
+    bool set = setTexts(task, cal_mapping::kTodoTexts, raw);
     const std::string status = json_access::textOr(task, "status", "");
     set = set &&
           setInt(

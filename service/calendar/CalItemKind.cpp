@@ -8,26 +8,27 @@
 
 using calendar_read::intOf;
 using calendar_read::textOf;
+using sync_result::kOk;
+
+std::string CalItemKind::build(calendar_record_h record) const {
+    CalJsonObject body;
+    return compose(record, &body) == kOk ? body.getJsonString() : std::string();
+}
 
 // Through the record and back, so that defaults and spellings of the server do not matter.
 std::string CalItemKind::comparable(JsonObject* item) const {
     CalendarRecord record;
-    return convert(item, &record) == sync_result::kOk ? buildComparable(record.get()) : std::string();
+    return convert(item, &record) == kOk ? comparableOfConverted(record.get()) : std::string();
+}
+
+std::string CalItemKind::comparableOfConverted(calendar_record_h record) const {
+    CalJsonObject body;
+    return composeComparable(record, &body) == kOk ? body.getJsonString() : std::string();
 }
 
 std::string CalItemKind::comparable(calendar_record_h record) const {
-    CalJsonParser parser;
-    const std::string body = build(record);
-    return !body.empty() && parser.setString(body) == sync_result::kOk ? comparable(parser.root())
-                                                                       : std::string();
-}
-
-bool CalItemKind::saysTheSame(JsonObject* item, calendar_record_h record) const {
-    CalendarRecord server;
-    if (convert(item, &server) != sync_result::kOk) return true;
-    const std::string says = buildComparable(server.get());
-    // Mostly equal without the way through the JSON.
-    return says == buildComparable(record) || says == comparable(record);
+    CalJsonObject body;
+    return compose(record, &body) == kOk ? comparable(body.object()) : std::string();
 }
 
 namespace {
@@ -77,8 +78,8 @@ const CalItemKind kEventKind = {
     .seriesId = CALENDAR_EVENT_ORIGINAL_EVENT_ID,
     .recurrenceId = CALENDAR_EVENT_RECURRENCE_ID,
     .convert = CalJsonParser::convertEvent,
-    .build = cal_json::eventBody,
-    .buildComparable = cal_json::comparableEventBody,
+    .compose = cal_json::composeEvent,
+    .composeComparable = cal_json::composeComparableEvent,
     .serverFields = kEventServerFields,
     .takeServerFields = takeEventFields,
     .texts = {.notJson = "This is not event json",
@@ -108,8 +109,8 @@ const CalItemKind kTodoKind = {
     .seriesId = 0,
     .recurrenceId = 0,
     .convert = CalJsonParser::convertTodo,
-    .build = cal_json::todoBody,
-    .buildComparable = cal_json::todoBody,
+    .compose = cal_json::composeTodo,
+    .composeComparable = cal_json::composeTodo,
     .serverFields = kTodoServerFields,
     .takeServerFields = takeTodoFields,
     .texts = {.notJson = "checkException fail",

@@ -6,6 +6,7 @@
 #include <span>
 #include <string>
 
+#include "calendar/CalJsonObject.h"
 #include "platform/calendar.h"
 
 struct CalItemKind {
@@ -25,10 +26,10 @@ struct CalItemKind {
     unsigned seriesId;
     unsigned recurrenceId;
 
-    // The server's JSON as a new record, and a record as the body of a request (empty when it cannot be built).
+    // The server's JSON as a new record, and a record as the body of a request; 0 or -1.
     int (*convert)(JsonObject* json, CalendarRecord* out);
-    std::string (*build)(calendar_record_h record);
-    std::string (*buildComparable)(calendar_record_h record);  // without what servers fill in on their own
+    int (*compose)(calendar_record_h record, CalJsonObject* body);
+    int (*composeComparable)(calendar_record_h record, CalJsonObject* body);  // without what servers fill in on their own
 
     // What is not sent, or what the server fills in; read from its answer to an upload. False when a value cannot be set.
     std::span<const unsigned> serverFields;
@@ -50,12 +51,14 @@ struct CalItemKind {
 
     [[nodiscard]] bool hasSeries() const { return seriesId != 0; }
 
+    // A record as the text of a body; empty when it cannot be written.
+    [[nodiscard]] std::string build(calendar_record_h record) const;
     // What both sides can say of an item, as text: equal when the device's record and the server's item say the same. Empty when
     // the item cannot be converted.
     [[nodiscard]] std::string comparable(calendar_record_h record) const;
     [[nodiscard]] std::string comparable(JsonObject* item) const;
-    // Whether the server's item says what the device's record says; true when it does not say enough to tell.
-    [[nodiscard]] bool saysTheSame(JsonObject* item, calendar_record_h record) const;
+    // The same of a record that was just made of a server's item; it may lose what is not compared.
+    [[nodiscard]] std::string comparableOfConverted(calendar_record_h record) const;
 };
 
 extern const CalItemKind kEventKind;

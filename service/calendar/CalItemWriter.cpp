@@ -122,7 +122,9 @@ int CalItemWriter::writeRecords(CalPagePlan* plan, Batch* batch) {
     for (const PlannedEvent& planned : plan->events) {
         if (!planned.sent) continue;
         const CalWriteBack sent{planned.row.event_id, planned.row.version, planned.row.uri, planned.row.etag};
-        if (!writeBack(mpSnapshot->kind(), sent, jsonObjectOf(planned.sent->json))) return kFailed;
+        CalendarRecord server;
+        (void)mpSnapshot->kind().convert(jsonObjectOf(planned.sent->json), &server);
+        if (!writeBack(mpSnapshot->kind(), sent, server.get())) return kFailed;
     }
     resolveSeries(plan, batch);
     if (insertException(plan, batch) != kOk || updateException(plan, batch) != kOk) return kFailed;

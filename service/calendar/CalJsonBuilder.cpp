@@ -17,19 +17,11 @@ using sync_result::kOk;
 
 namespace {
 
-struct TextMember {
-    const char* name;
-    unsigned property;
-};
-constexpr TextMember kEventTexts[] = {{"summary", CALENDAR_EVENT_SUMMARY},
-                                      {"description", CALENDAR_EVENT_DESCRIPTION},
-                                      {"location", CALENDAR_EVENT_LOCATION}};
-constexpr TextMember kTodoTexts[] = {{"title", CALENDAR_TODO_SUMMARY}, {"notes", CALENDAR_TODO_NOTE}};
-
 template <size_t N>
-void addTexts(calendar_record_h record, const TextMember (&members)[N], CalJsonObject& object) {
-    for (const TextMember& member : members)
-        object.addStringMember(member.name, textOf(record, member.property));
+void addTexts(calendar_record_h record, const cal_mapping::TextMember (&members)[N], CalJsonObject& object) {
+    for (const cal_mapping::TextMember& member : members) {
+        if (member.isSent) object.addStringMember(member.name, textOf(record, member.property));
+    }
 }
 
 // The word of a value; the fallback for a value that no row has.
@@ -57,11 +49,12 @@ bool forEachChild(calendar_record_h record, unsigned property, Use use) {
     return true;
 }
 
-// The body that `add` builds, empty when it fails.
 template <class Add>
-std::string bodyOf(Add add) {
+int compose(CalJsonObject* body, Add add) {
     CalJsonBuilder builder;
-    return add(builder) == kOk ? builder.object().getJsonString() : std::string();
+    if (add(builder) != kOk) return kFailed;
+    *body = builder.takeObject();
+    return kOk;
 }
 
 // NULL when it cannot be read.
@@ -89,7 +82,7 @@ int CalJsonBuilder::begin(calendar_record_h record) {
 
 int CalJsonBuilder::addEvent(calendar_record_h record) {
     if (begin(record) != kOk) return kFailed;
-    addTexts(record, kEventTexts, mObject);
+    addTexts(record, cal_mapping::kEventTexts, mObject);
     if (setTime(record, "start", CALENDAR_EVENT_START) != kOk ||
         setTime(record, "end", CALENDAR_EVENT_END) != kOk)
         return kFailed;
@@ -191,7 +184,7 @@ int CalJsonBuilder::addException(calendar_record_h record, const std::string& se
 
 int CalJsonBuilder::addTodo(calendar_record_h record) {
     if (begin(record) != kOk) return kFailed;
-    addTexts(record, kTodoTexts, mObject);
+    addTexts(record, cal_mapping::kTodoTexts, mObject);
     const int status = intOf(record, CALENDAR_TODO_STATUS);
     mObject.addStringMember("status",
                             wordOf(cal_mapping::kTodoStatus, status, cal_mapping::kTodoStatusOther));
@@ -233,21 +226,24 @@ int CalJsonBuilder::setDue(calendar_record_h record) {
 
 namespace cal_json {
 
-std::string eventBody(calendar_record_h record) {
-    return bodyOf([record](CalJsonBuilder& builder) { return builder.addEvent(record); });
+int composeEvent(calendar_record_h record, CalJsonObject* body) {
+    return compose(body, [record](CalJsonBuilder& builder) { return builder.addEvent(record); });
+}
+
+int composeTodo(calendar_record_h record, CalJsonObject* body) {
+    return compose(body, [record](CalJsonBuilder& builder) { return builder.addTodo(record); });
+}
+
+int composeComparableEvent(calendar_record_h record, CalJsonObject* body) {
+    const int code = calendar_record_set_str(record, CALENDAR_EVENT_START_TZID, "");
+    return code == PLATFORM_ERROR_NONE ? composeEvent(record, body) : kFailed;
 }
 
 std::string convertException2Json(calendar_record_h record, const std::string& seriesUri) {
-    return bodyOf([&](CalJsonBuilder& builder) { return builder.addException(record, seriesUri); });
-}
-
-std::string todoBody(calendar_record_h record) {
-    return bodyOf([record](CalJsonBuilder& builder) { return builder.addTodo(record); });
-}
-
-std::string comparableEventBody(calendar_record_h record) {
-    if (calendar_record_set_str(record, CALENDAR_EVENT_START_TZID, "") != PLATFORM_ERROR_NONE) return {};
-    return eventBody(record);
+    CalJsonObject body;
+    const int result =
+        compose(&body, [&](CalJsonBuilder& builder) { return builder.addException(record, seriesUri); });
+    return result == kOk ? body.getJsonString() : std::string();
 }
 
 }  // namespace cal_json

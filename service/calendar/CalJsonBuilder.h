@@ -4,6 +4,7 @@
 #pragma once
 
 #include <string>
+#include <utility>
 
 #include "calendar/CalJsonObject.h"
 #include "platform/calendar.h"
@@ -17,7 +18,7 @@ public:
     // A task's body.
     [[nodiscard]] int addTodo(calendar_record_h record);
 
-    [[nodiscard]] CalJsonObject& object() { return mObject; }
+    [[nodiscard]] CalJsonObject takeObject() { return std::move(mObject); }
 
 private:
     // An empty body for the record.
@@ -33,11 +34,12 @@ private:
 
 namespace cal_json {
 
-// Bodies as text, empty when the record cannot be read.
-[[nodiscard]] std::string eventBody(calendar_record_h record);
+// Bodies; 0, or -1 when the record cannot be read.
+[[nodiscard]] int composeEvent(calendar_record_h record, CalJsonObject* body);
+[[nodiscard]] int composeTodo(calendar_record_h record, CalJsonObject* body);
+// An event's body without the name of its time zone, which servers fill in on their own; the record loses it.
+[[nodiscard]] int composeComparableEvent(calendar_record_h record, CalJsonObject* body);
+// The body as text, empty when the record cannot be read.
 [[nodiscard]] std::string convertException2Json(calendar_record_h record, const std::string& seriesUri);
-[[nodiscard]] std::string todoBody(calendar_record_h record);
-// An event's body without the name of its time zone, which servers fill in on their own.
-[[nodiscard]] std::string comparableEventBody(calendar_record_h record);
 
 }  // namespace cal_json

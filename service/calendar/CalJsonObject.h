@@ -25,9 +25,10 @@ public:
     [[nodiscard]] bool hasMember(const char* name) const;
 
     [[nodiscard]] std::string getJsonString() const;
+    // Ends with this.
+    [[nodiscard]] JsonObject* object() const { return json_node_get_object(mpNode.get()); }
 
 private:
-    [[nodiscard]] JsonObject* object() const { return json_node_get_object(mpNode.get()); }
 
     JsonNodePtr mpNode;
 };

@@ -7,6 +7,8 @@
 #include <optional>
 #include <string_view>
 
+#include "platform/calendar.h"
+
 namespace cal_mapping {
 
 struct NameOf {
@@ -43,6 +45,22 @@ inline constexpr int kTodoCompleted = 2;
 inline constexpr NameOf kTodoStatus[] = {{kTodoNeedsAction, "needsAction"}, {kTodoCompleted, "completed"}};
 inline constexpr std::string_view kTodoStatusOther = "needsAction";
 inline constexpr std::string_view kServerHasDue = "due";  // CALENDAR_TODO_SYNC_DATA1
+
+// Members that are copied as they are.
+struct TextMember {
+    const char* name;
+    unsigned property;
+    bool isSent;  // the others are the server's own
+};
+inline constexpr TextMember kEventTexts[] = {{"id", CALENDAR_EVENT_UID, false},
+                                             {"summary", CALENDAR_EVENT_SUMMARY, true},
+                                             {"description", CALENDAR_EVENT_DESCRIPTION, true},
+                                             {"location", CALENDAR_EVENT_LOCATION, true},
+                                             {"etag", CALENDAR_EVENT_SYNC_DATA2, false}};
+inline constexpr TextMember kTodoTexts[] = {{"id", CALENDAR_TODO_UID, false},
+                                            {"title", CALENDAR_TODO_SUMMARY, true},
+                                            {"notes", CALENDAR_TODO_NOTE, true},
+                                            {"etag", CALENDAR_TODO_SYNC_DATA2, false}};
 
 inline constexpr int kAttendeeOrganizer = 3;
 inline constexpr int kMeetingOwn = 1;

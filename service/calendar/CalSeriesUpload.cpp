@@ -109,14 +109,14 @@ void CalUploader::sendInstance(const Row& series, int seriesVersion, Row& row, c
         SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName, uri.c_str());
     }
     std::string etag = before.etag;
-    JsonNodePtr item;
-    const UpAnswer answer = update(row, uri, body, &etag, &item);
+    CalendarRecord server;
+    const UpAnswer answer = update(row, uri, body, &etag, &server);
     if (answer != UpAnswer::kAccepted && answer != UpAnswer::kGone) return;
     row.uri = uri;
     if (answer == UpAnswer::kGone) return removeGone(row, version);
     row.etag = etag;
     row.dirty = 0;
-    store(row, version, seriesVersion, std::move(item));  // an exception is as old as its series
+    store(row, version, seriesVersion, std::move(server));  // an exception is as old as its series
 }
 
 bool CalUploader::sendDates(Row& series, calendar_record_h record) {

@@ -146,7 +146,7 @@ int CalTodoDataManager::deleteTodos(int calendarId, const std::list<std::string>
 int CalTodoDataManager::getTodo(int todoId, std::string* json) {
     CalendarRecord record;
     if (getRecord(todoId, &record) != kOk) return kFailed;
-    *json = cal_json::todoBody(record.get());
+    *json = kTodoKind.build(record.get());
     return json->empty() ? kFailed : kOk;
 }
 

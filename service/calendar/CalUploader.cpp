@@ -19,6 +19,8 @@ using sync_result::kTokenFailed;
 namespace {
 
 constexpr const char* kStoreFails = "the device's stores cannot be written";
+// Each time costs a commit; an edit that comes after it waits for the next run.
+constexpr size_t kMarkedAtOnce = 32;
 
 }  // namespace
 
@@ -39,7 +41,7 @@ int CalUploader::run() {
                                       [](const Row& row) { return row.dirty != 0 || row.deleted != 0; });
     if (!hasMarks) return kOk;
     if (CalManager::isReadOnly(mBook.calendar_id)) return dropMarks();
-    if (findSentItems() != kOk || markAsSent() != kOk) {
+    if (findSentItems() != kOk) {
         if (mFailure.empty()) mFailure = kStoreFails;
         mResult = mResult != kOk ? mResult : kFailed;
     } else if (const int result = sendDirty(); result != kOk) {
@@ -132,23 +134,13 @@ int CalUploader::findSentItems() {
     return readRows();
 }
 
-int CalUploader::markAsSent() {
-    std::vector<int> ids;
-    for (const Row& row : mRows) {
-        if (isNewToServer(row)) ids.push_back(row.event_id);
-    }
-    mRecords.expect(std::move(ids));
-    std::vector<Row> marked;
-    for (const Row& row : mRows) {
-        CalendarRecord record;
-        if (!isNewToServer(row) || mRecords.take(row.event_id, &record) != PLATFORM_ERROR_NONE) continue;
-        marked.push_back(row);
-        marked.back().etag = sent_mark::of(mKind.comparable(record.get()));
-    }
+int CalUploader::markAsSent(std::span<const Outgoing> items) {
     SyncTransaction transaction(mpStore->database());
     if (!transaction.begun()) return kFailed;
-    for (const Row& row : marked) {
-        if (mpStore->updateItem(row) != kOk) return kFailed;
+    for (const Outgoing& item : items) {
+        if (!item.body || !isNewToServer(*item.row)) continue;
+        item.row->etag = sent_mark::of(item.says);
+        if (mpStore->updateItem(*item.row) != kOk) return kFailed;
     }
     return transaction.commit();
 }
@@ -184,52 +176,75 @@ int CalUploader::sendDirty() {
     std::transform(dirty.begin(), dirty.end(), std::back_inserter(ids),
                    [](const Row* row) { return row->event_id; });
     mRecords.expect(std::move(ids));
-    for (Row* row : dirty) {
-        if (mEnd != End::kNone) break;
-        if (isStopped()) return kStopped;
-        sendItem(*row);
+    for (std::span<Row* const> rest(dirty); !rest.empty();) {
+        const std::span<Row* const> next = rest.first(std::min(rest.size(), kMarkedAtOnce));
+        rest = rest.subspan(next.size());
+        const std::vector<Outgoing> items = prepare(next);
+        if (markAsSent(items) != kOk) {
+            if (mResult == kOk) mFailure = kStoreFails;
+            return mResult != kOk ? mResult : kFailed;
+        }
+        for (const Outgoing& item : items) {
+            if (mEnd != End::kNone) return mResult;
+            if (isStopped()) return kStopped;
+            sendItem(item);
+        }
     }
     return mResult;
 }
 
-void CalUploader::sendItem(Row& row) {
-    if (waitsForList(row)) return;
-    CalendarRecord record;
-    if (const int code = mRecords.take(row.event_id, &record); code != PLATFORM_ERROR_NONE) {
-        // Deleted since the marks were set: the next walk finds that.
-        if (code != PLATFORM_ERROR_NOT_FOUND) SYNC_ERR("db_get_record fail");
-        return;
+std::vector<CalUploader::Outgoing> CalUploader::prepare(std::span<Row* const> rows) {
+    std::vector<Outgoing> items;
+    for (Row* row : rows) {
+        if (waitsForList(*row)) continue;
+        Outgoing item;
+        item.row = row;
+        if (const int code = mRecords.take(row->event_id, &item.record); code != PLATFORM_ERROR_NONE) {
+            // Deleted since the marks were set: the next walk finds that.
+            if (code != PLATFORM_ERROR_NOT_FOUND) SYNC_ERR("db_get_record fail");
+            continue;
+        }
+        item.isDue = row->dirty != 0 && !isParked(*row);
+        CalJsonObject body;
+        if (item.isDue && mKind.compose(item.record.get(), &body) == kOk) {
+            item.says = mKind.comparable(body.object());
+            item.body = std::move(body);
+        }
+        items.push_back(std::move(item));
     }
-    calendar_record_h raw = record.get();
-    if (row.dirty != 0 && !isParked(row)) {
-        const std::string body = mKind.build(raw);
-        if (body.empty()) {
+    return items;
+}
+
+void CalUploader::sendItem(const Outgoing& item) {
+    Row& row = *item.row;
+    if (item.isDue) {
+        if (!item.body) {
             UpReply unreadable;
             unreadable.isForGood = true;
             unreadable.reason = "the record cannot be written as JSON";
             return fail(row, unreadable);
         }
-        row.uri.empty() ? insertItem(row, raw, body) : updateItem(row, raw, body);
+        row.uri.empty() ? insertItem(item) : updateItem(item);
     }
-    if (mKind.hasSeries() && !row.uri.empty() && mEnd == End::kNone) sendInstances(row, raw);
+    if (mKind.hasSeries() && !row.uri.empty() && mEnd == End::kNone) sendInstances(row, item.record.get());
 }
 
-void CalUploader::insertItem(Row& row, calendar_record_h record, const std::string& body) {
-    UpReply reply = mTask.insert(mBook.uri, body);
+void CalUploader::insertItem(const Outgoing& item) {
+    Row& row = *item.row;
+    calendar_record_h record = item.record.get();
+    const UpReply reply = mTask.insert(mBook.uri, item.body->getJsonString());
     switch (reply.answer) {
         case UpAnswer::kAccepted:
             row.uri = reply.uri;
             row.etag = reply.etag;
             // A series stays marked until the server has its cancelled instances too.
             row.dirty = hasUnsentDates(row, record) ? 1 : 0;
-            compareWithSent(row, reply.item, record);
-            return store(row, seenVersion(row, record), seenVersion(row, record), std::move(reply.item));
-        case UpAnswer::kRefused: {
+            return storeAnswer(item, seenVersion(row, record), converted(reply));
+        case UpAnswer::kRefused:
             fail(row, reply);
             row.etag.clear();
             if (mpStore->updateItem(row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
             return;
-        }
         case UpAnswer::kGone:
         case UpAnswer::kUnclear:
         case UpAnswer::kNoAnswer:
@@ -237,7 +252,9 @@ void CalUploader::insertItem(Row& row, calendar_record_h record, const std::stri
     }
 }
 
-void CalUploader::updateItem(Row& row, calendar_record_h record, const std::string& body) {
+void CalUploader::updateItem(const Outgoing& item) {
+    Row& row = *item.row;
+    calendar_record_h record = item.record.get();
     const int version = seenVersion(row, record);
     const UpReply before = mTask.getEtag(mBook.uri, row.uri);
     if (before.answer == UpAnswer::kGone) return removeGone(row, version);
@@ -246,24 +263,32 @@ void CalUploader::updateItem(Row& row, calendar_record_h record, const std::stri
         SYNC_ERR("%s(%s) was changed on both sides, the device's change wins", mKind.itemName,
                  row.uri.c_str());
     }
-    JsonNodePtr item;
-    const UpAnswer answer = update(row, row.uri, body, &row.etag, &item);
+    CalendarRecord server;
+    const UpAnswer answer = update(row, row.uri, item.body->getJsonString(), &row.etag, &server);
     if (answer == UpAnswer::kGone) return removeGone(row, version);
     if (answer != UpAnswer::kAccepted) return;
     row.dirty = hasUnsentDates(row, record) ? 1 : 0;
-    compareWithSent(row, item, record);
-    store(row, version, version, std::move(item));
+    storeAnswer(item, version, std::move(server));
 }
 
-// What the server made of it must come down: then the etag stays behind.
-void CalUploader::compareWithSent(Row& row, const JsonNodePtr& item, calendar_record_h record) {
-    if (item == nullptr || mKind.saysTheSame(jsonObjectOf(item), record)) return;
-    SYNC_INFO("%s(%s) is not what was sent, it is compared again", mKind.itemName, row.uri.c_str());
-    row.etag.clear();
+CalendarRecord CalUploader::converted(const UpReply& reply) const {
+    CalendarRecord server;
+    if (reply.item != nullptr) (void)mKind.convert(jsonObjectOf(reply.item), &server);
+    return server;
+}
+
+void CalUploader::storeAnswer(const Outgoing& sent, int version, CalendarRecord server) {
+    Row& row = *sent.row;
+    if (server != nullptr && mKind.comparableOfConverted(server.get()) != sent.says) {
+        // What the server made of it must come down.
+        SYNC_INFO("%s(%s) is not what was sent, it is compared again", mKind.itemName, row.uri.c_str());
+        row.etag.clear();
+    }
+    store(row, version, version, std::move(server));
 }
 
 UpAnswer CalUploader::update(const Row& row, const std::string& uri, const std::string& body,
-                             std::string* etag, JsonNodePtr* item) {
+                             std::string* etag, CalendarRecord* server) {
     UpReply answer = mTask.update(mBook.uri, uri, body);
     if (answer.answer == UpAnswer::kGone) return answer.answer;
     if (answer.answer != UpAnswer::kAccepted) {
@@ -290,7 +315,7 @@ UpAnswer CalUploader::update(const Row& row, const std::string& uri, const std::
     // What somebody else wrote in between comes down with the next download, so the etag of our own write is kept.
     const std::string& known = !answer.etag.empty() ? answer.etag : after.etag;
     if (!known.empty()) *etag = known;
-    *item = std::move(answer.item);
+    *server = converted(answer);
     return UpAnswer::kAccepted;
 }
 
@@ -323,7 +348,7 @@ void CalUploader::sendDeleted(Row& row) {
     if (mpStore->updateItem(row) != kOk) SYNC_ERR("%s", mKind.texts.updateRow);
 }
 
-void CalUploader::store(Row& row, int version, int expectedVersion, JsonNodePtr item) {
+void CalUploader::store(Row& row, int version, int expectedVersion, CalendarRecord server) {
     row.version = version;
     ++mSent;
     mParked.forget(mKind.itemName, row.event_id);
@@ -335,7 +360,7 @@ void CalUploader::store(Row& row, int version, int expectedVersion, JsonNodePtr 
         mEnd = End::kAll;
         return;
     }
-    mSentItems.push_back({{row.event_id, expectedVersion, row.uri, row.etag}, std::move(item)});
+    mSentItems.push_back({{row.event_id, expectedVersion, row.uri, row.etag}, std::move(server)});
 }
 
 // The records learn what the server calls them, so that they can be recognised without their rows.
@@ -347,7 +372,7 @@ int CalUploader::writeBack() {
         return kFailed;
     }
     for (const Sent& sent : mSentItems) {
-        if (!::writeBack(mKind, sent.record, jsonObjectOf(sent.item))) return kFailed;
+        if (!::writeBack(mKind, sent.record, sent.server.get())) return kFailed;
     }
     if (!transaction.commit()) {
         SYNC_ERR("get svc fail");

@@ -8,6 +8,8 @@
 
 #include <list>
 #include <map>
+#include <optional>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -38,9 +40,18 @@ private:
     enum class End { kNone, kDirtyOfBook, kAll };
     using Row = CalEventMetaData;
 
+    // An item, or a series of which instances are marked.
+    struct Outgoing {
+        Row* row = nullptr;
+        CalendarRecord record;
+        bool isDue = false;  // itself
+        std::optional<CalJsonObject> body;
+        std::string says;  // comparable
+    };
+
     struct Sent {
         CalWriteBack record;
-        JsonNodePtr item;  // as the server has it, NULL when it did not say
+        CalendarRecord server;  // the item as the server has it, NULL when it did not say
     };
 
     [[nodiscard]] bool isStopped() const { return mpStopQuery != nullptr && mpStopQuery->isStopped(); }
@@ -58,7 +69,7 @@ private:
 
     // --- new items
     [[nodiscard]] int findSentItems();
-    [[nodiscard]] int markAsSent();
+    [[nodiscard]] int markAsSent(std::span<const Outgoing> items);
     [[nodiscard]] bool isNewToServer(const Row& row) const;
     // An item of an earlier run without an answer, while the list could not be read.
     [[nodiscard]] bool waitsForList(const Row& row) const;
@@ -66,16 +77,19 @@ private:
     // --- items
     [[nodiscard]] std::vector<Row*> dirtyItems();
     [[nodiscard]] int sendDirty();
-    void sendItem(Row& row);
-    void insertItem(Row& row, calendar_record_h record, const std::string& body);
-    void updateItem(Row& row, calendar_record_h record, const std::string& body);
+    // Reads and composes what goes out next.
+    [[nodiscard]] std::vector<Outgoing> prepare(std::span<Row* const> rows);
+    void sendItem(const Outgoing& item);
+    void insertItem(const Outgoing& item);
+    void updateItem(const Outgoing& item);
     void removeGone(Row& row, int version);
     void sendDeleted(Row& row);
     // PATCH between two looks at the etag: accepted with the etag that the row takes; gone; or anything else, which is noted.
     [[nodiscard]] UpAnswer update(const Row& row, const std::string& uri, const std::string& body,
-                                  std::string* etag, JsonNodePtr* item);
-    void compareWithSent(Row& row, const JsonNodePtr& item, calendar_record_h record);
-    void store(Row& row, int version, int expectedVersion, JsonNodePtr item);
+                                  std::string* etag, CalendarRecord* server);
+    [[nodiscard]] CalendarRecord converted(const UpReply& reply) const;
+    void storeAnswer(const Outgoing& sent, int version, CalendarRecord server);
+    void store(Row& row, int version, int expectedVersion, CalendarRecord server);
     // The records learn what the server calls them.
     [[nodiscard]] int writeBack();
 

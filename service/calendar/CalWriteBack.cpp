@@ -7,7 +7,7 @@
 
 using sync_result::kOk;
 
-bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* item) {
+bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, calendar_record_h server) {
     std::vector<unsigned> properties = {kind.id, kind.uid, kind.etag};
     properties.insert(properties.end(), kind.serverFields.begin(), kind.serverFields.end());
     CalendarList list;
@@ -18,9 +18,7 @@ bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* it
         return calendar_record_set_str(record, property, text.c_str()) == PLATFORM_ERROR_NONE;
     };
     if (found != PLATFORM_ERROR_NONE || !set(kind.uid, sent.uri) || !set(kind.etag, sent.etag)) return false;
-    CalendarRecord server;
-    if (item != nullptr && kind.convert(item, &server) == kOk && !kind.takeServerFields(server.get(), record))
-        return false;
+    if (server != nullptr && !kind.takeServerFields(server, record)) return false;
     const record_write_options_s options{.by_sync = true,
                                          .expected_versions = std::span(&sent.expectedVersion, 1)};
     const int code = calendar_db_update_record(record, options);

@@ -12,6 +12,6 @@ struct CalWriteBack {
     std::string etag;
 };
 
-// Writes it by the sync, inside the thread's open transaction. `item` is the item as the server has it, NULL when it did not say.
+// Writes it by the sync, inside the thread's open transaction. `server` is the item as the server has it, NULL when it did not say.
 // A record that was changed or deleted meanwhile is left alone. False when the store cannot be written.
-[[nodiscard]] bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, JsonObject* item);
+[[nodiscard]] bool writeBack(const CalItemKind& kind, const CalWriteBack& sent, calendar_record_h server);

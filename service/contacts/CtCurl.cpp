@@ -70,10 +70,6 @@ void logStatus(long status) {
     SYNC_ERR("UNCAUGHT EXCEPTION NUMBER %ld", status);
 }
 
-void logText(const std::string& text) {
-    for (size_t at = 0; at < text.size(); at += kLogSlice) SYNC_DBG("%s", text.substr(at, kLogSlice).c_str());
-}
-
 using CurlUrl = std::unique_ptr<CURLU, FreeWith<curl_url_cleanup>>;
 
 std::string partOf(CURLU* url, CURLUPart part) {
@@ -109,6 +105,10 @@ FileHandle openImage(const std::string& path, long* size) {
 }
 
 }  // namespace
+
+void logReply(const std::string& text) {
+    for (size_t at = 0; at < text.size(); at += kLogSlice) SYNC_DBG("%s", text.substr(at, kLogSlice).c_str());
+}
 
 std::string withPhotoSize(const std::string& imageUrl) {
     constexpr const char* kSize = "720";
@@ -178,7 +178,7 @@ int CtCurl::exchange(HttpTransfer& transfer) {
     const bool isAccounts = !transfer.headers.empty();
     if (transfer.retryAfter > 0 && isAccounts)
         mpAccount->retryGate(VANTOR_PIM_SYNC_TYPE_CONTACTS).askedToWait(transfer.retryAfter);
-    if (transfer.reply != nullptr) logText(*transfer.reply);
+    if (transfer.reply != nullptr) logReply(*transfer.reply);
     if (result == kTransferTimeout) return kTimedOut;
     return result == kOk ? kOk : kFailed;
 }

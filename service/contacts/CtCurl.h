@@ -91,5 +91,8 @@ private:
     long mTimeout = 30;        // seconds
 };
 
+// A reply in the debug log, in lines of a length that the journal takes whole.
+void logReply(const std::string& text);
+
 // The URL with its size parameter set to 720.
 std::string withPhotoSize(const std::string& imageUrl);

@@ -11,11 +11,10 @@ namespace {
 
 constexpr const char* kContactPages = "/contacts/default/full?alt=json";
 constexpr const char* kGroupPages = "/groups/default/full?alt=json";
-constexpr size_t kLogSlice = 900;
 
 void logSuspicious(const std::string& text) {
     SYNC_ERR("Server's response is suspicious. check full string");
-    for (size_t at = 0; at < text.size(); at += kLogSlice) SYNC_DBG("%s", text.substr(at, kLogSlice).c_str());
+    logReply(text);
 }
 
 int readContacts(int result, const std::string& text, CtContactPage* page) {

@@ -5,7 +5,7 @@
 
 namespace {
 
-constexpr const char* kSeries =
+constexpr const char* kTodoSeries =
     R"({"summary": "Daily", "start": "2014-05-01T10:00:00Z", "end": "2014-05-01T11:00:00Z", "rrule": "FREQ=DAILY",
         "location": "Room", "reminders": [10]})";
 
@@ -85,7 +85,7 @@ TEST(TodoTool, RefusesWhatIsNotRightAndLeavesTheRest) {
 
 TEST(EventTool, OneInstanceOfASeriesIsChangedAndCancelled) {
     ToolRoot tool;
-    const std::string series = std::to_string(tool.addEvent(ToolRoot::addCalendar(7, "Work"), kSeries));
+    const std::string series = std::to_string(tool.addEvent(ToolRoot::addCalendar(7, "Work"), kTodoSeries));
     ASSERT_EQ(tool.run({"event", "set", series, "--instance", "20140503T100000Z", "summary=Late"}).status, 0);
     ASSERT_EQ(tool.run({"event", "set", series, "--instance", "20140503T100000Z", "busy=false"}).status, 0);
     Json events = tool.json({"events", "list", "--json"});

@@ -1,4 +1,5 @@
 // Replies of the calendar and tasks services, as far as the records and back to the bodies of uploads.
+#include "calendar/CalItemKind.h"
 #include "calendar/CalJsonBuilder.h"
 #include "calendar/CalJsonParser.h"
 #include "common/JsonText.h"
@@ -10,21 +11,18 @@ using sync_result::kOk;
 
 namespace {
 
-using Convert = int (*)(JsonObject*, CalendarRecord*);
-using Body = std::string (*)(calendar_record_h);
-
 // What the device sends of a record is read to a record that is sent the same way. A first conversion may drop what the device has
 // no room for, so it is the second that must change nothing.
-void checkRoundTrip(JsonObject* item, Convert convert, Body bodyOf) {
+void checkRoundTrip(JsonObject* item, const CalItemKind& kind) {
     CalendarRecord record;
-    if (convert(item, &record) != kOk) return;
-    const std::string sent = bodyOf(record.get());
+    if (kind.convert(item, &record) != kOk) return;
+    const std::string sent = kind.build(record.get());
     if (sent.empty()) return;
     const JsonNodePtr read = json_text::parse(sent);
     require(read != nullptr, "a body is JSON", sent);
     CalendarRecord again;
-    require(convert(jsonObjectOf(read), &again) == kOk, "a body can be read", sent);
-    require(bodyOf(again.get()) == sent, "a body is read to the same", sent + "\n" + bodyOf(again.get()));
+    require(kind.convert(jsonObjectOf(read), &again) == kOk, "a body can be read", sent);
+    require(kind.build(again.get()) == sent, "a body is read to the same", sent + "\n" + kind.build(again.get()));
 }
 
 void checkItem(const CalListInfo& info) {
@@ -32,8 +30,8 @@ void checkItem(const CalListInfo& info) {
     JsonObject* item = jsonObjectOf(info.json);
     require(item != nullptr, "an entry is an object");
     require(json_text::parse(info.jsonText()) != nullptr, "an entry's text is JSON", info.jsonText());
-    checkRoundTrip(item, CalJsonParser::convertEvent, cal_json::eventBody);
-    checkRoundTrip(item, CalJsonParser::convertTodo, cal_json::todoBody);
+    checkRoundTrip(item, kEventKind);
+    checkRoundTrip(item, kTodoKind);
     ExceptionInfo exception;
     CalendarRecord record;
     if (CalJsonParser::checkException(item, &exception) != kOk || exception.recurrenceId.empty() ||

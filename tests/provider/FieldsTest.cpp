@@ -10,13 +10,13 @@ namespace {
 const char* const kValue =
     R"({"a":1,"b":{"c":2,"d":{"e":3,"f":4}},"items":[{"id":"1","x":{"y":5,"z":6}},{"id":"2"}]})";
 
-struct Row {
+struct FieldsRow {
     const char* fields;
     const char* selected;
 };
 
 TEST(Fields, SelectPartsOfAValue) {
-    const Row rows[] = {
+    const FieldsRow rows[] = {
         {"", kValue},
         {"*", kValue},
         {"a", R"({"a":1})"},
@@ -32,7 +32,7 @@ TEST(Fields, SelectPartsOfAValue) {
         {"items/id", R"({"items":[{"id":"1"},{"id":"2"}]})"},
     };
     const Json value = Json::parse(kValue);
-    for (const Row& row : rows) {
+    for (const FieldsRow& row : rows) {
         const Fields fields = Fields::parse(row.fields);
         EXPECT_EQ(fields.apply(value), Json::parse(row.selected)) << row.fields;
         std::string text;

@@ -11,7 +11,7 @@ namespace {
 
 using Strictness = ProviderFixture;
 
-struct Row {
+struct StrictRow {
     const char* method;
     const char* path;
     const char* body;
@@ -20,7 +20,7 @@ struct Row {
 };
 
 TEST_F(Strictness, MalformedRequestsFailLoudly) {
-    const Row rows[] = {
+    const StrictRow rows[] = {
         {"POST", kEvents, "{}", "application/json", 400},
         {"POST", kEvents, "[]", "application/json", 400},
         {"POST", kEvents, "{\"start\":", "application/json", 400},
@@ -45,7 +45,7 @@ TEST_F(Strictness, MalformedRequestsFailLoudly) {
         {"DELETE", kEvents, "", "", 405},
         {"GET", "/o/oauth2/token", "", "", 405},
     };
-    for (const Row& row : rows) {
+    for (const StrictRow& row : rows) {
         httplib::Headers headers = {{"Authorization", "Bearer " + mToken}};
         if (*row.type != '\0') headers.emplace("Content-Type", row.type);
         const Answer answer = send(row.method, row.path, row.body, headers);

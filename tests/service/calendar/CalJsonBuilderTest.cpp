@@ -42,7 +42,7 @@ CalendarRecord timed() {
 }
 
 Json bodyOf(const CalendarRecord& record) {
-    return Json::parse(cal_json::eventBody(record.get()));
+    return Json::parse(kEventKind.build(record.get()));
 }
 
 void set(const CalendarRecord& record, unsigned property, int value) {
@@ -181,12 +181,12 @@ TEST(CalJsonBuilder, TasksComeBackAsTheyWent) {
 
     // Only a due time that the server has is taken away there.
     const CalendarRecord todo = make(_calendar_todo);
-    EXPECT_FALSE(Json::parse(cal_json::todoBody(todo.get())).contains("due"));
+    EXPECT_FALSE(Json::parse(kTodoKind.build(todo.get())).contains("due"));
     set(todo, CALENDAR_TODO_SYNC_DATA1, "due");
-    EXPECT_TRUE(Json::parse(cal_json::todoBody(todo.get()))["due"].is_null());
+    EXPECT_TRUE(Json::parse(kTodoKind.build(todo.get()))["due"].is_null());
     set(todo, CALENDAR_TODO_HAS_DUE, 1);
     EXPECT_EQ(calendar_record_set_caltime(todo.get(), CALENDAR_TODO_DUE, date(2026, 3, 1)), 0);
-    EXPECT_EQ(Json::parse(cal_json::todoBody(todo.get()))["due"], "2026-03-01T00:00:00Z");
+    EXPECT_EQ(Json::parse(kTodoKind.build(todo.get()))["due"], "2026-03-01T00:00:00Z");
 }
 
 TEST(CalItemKind, WhatSaysTheSameComparesEqual) {

@@ -15,7 +15,7 @@ using Json = nlohmann::json;
 
 namespace {
 
-constexpr const char* kTimes =
+constexpr const char* kHostileTimes =
     R"("start":{"dateTime":"2026-03-01T10:00:00Z"},"end":{"dateTime":"2026-03-01T11:00:00Z"})";
 
 // The first entry of a list of one, by way of its text.
@@ -30,7 +30,7 @@ CalListInfoPtr listed(const std::string& item) {
 CalendarRecord eventOf(const std::string& members) {
     CalendarRecord record;
     const CalListInfoPtr info =
-        listed(R"({"id":"e","etag":"1",)" + std::string(kTimes) + "," + members + "}");
+        listed(R"({"id":"e","etag":"1",)" + std::string(kHostileTimes) + "," + members + "}");
     EXPECT_EQ(CalJsonParser::convertEvent(jsonObjectOf(info->json), &record), kOk) << members;
     return record;
 }
@@ -89,14 +89,14 @@ TEST(CalHostileReply, AnyTextComesBackAsItWent) {
         ASSERT_EQ(CalJsonParser::convertEvent(jsonObjectOf(info->json), &record), kOk);
         EXPECT_EQ(textOf(record.get(), CALENDAR_EVENT_UID), "i" + text);
         EXPECT_EQ(textOf(record.get(), CALENDAR_EVENT_ORGANIZER_NAME), text);
-        const Json sent = Json::parse(cal_json::eventBody(record.get()));
+        const Json sent = Json::parse(kEventKind.build(record.get()));
         for (const char* member : {"summary", "description", "location", "start", "end"})
             EXPECT_EQ(sent[member], event[member]);
         EXPECT_EQ(sent["attendees"][0].value("email", ""), text);
 
         const Json task = {{"id", "i" + text}, {"etag", "e"}, {"title", text}, {"notes", text}};
         ASSERT_EQ(CalJsonParser::convertTodo(jsonObjectOf(listed(task.dump())->json), &record), kOk);
-        const Json sentTask = Json::parse(cal_json::todoBody(record.get()));
+        const Json sentTask = Json::parse(kTodoKind.build(record.get()));
         for (const char* member : {"title", "notes"}) EXPECT_EQ(sentTask[member], task[member]);
     }
 }

@@ -17,14 +17,14 @@ struct Destroy {
     }
 };
 using Data = std::unique_ptr<pims_ipc_data_s, Destroy>;
-using Account = std::unique_ptr<vantor_pim_sync_account_s, Destroy>;
+using OwnedAccount = std::unique_ptr<vantor_pim_sync_account_s, Destroy>;
 
 Data newData() {
     return Data(pims_ipc_data_create_with_size(1024, 0));
 }
 
-Account account(const char* text) {
-    Account record(static_cast<vantor_pim_sync_account_s*>(calloc(1, sizeof(vantor_pim_sync_account_s))));
+OwnedAccount account(const char* text) {
+    OwnedAccount record(static_cast<vantor_pim_sync_account_s*>(calloc(1, sizeof(vantor_pim_sync_account_s))));
     *record = {.account_id = 7,
                .access_token = nullptr,
                .refresh_token = nullptr,
@@ -69,12 +69,12 @@ Data dataOf(const std::vector<std::string>& items) {
 TEST(Marshal, RecordsComeBackAsTheyWent) {
     const std::string large(10'000, 'q');
     for (const char* text : {static_cast<const char*>(nullptr), "", "it's \"quoted\"\n", large.c_str()}) {
-        const Account sent = account(text);
+        const OwnedAccount sent = account(text);
         const Data data = newData();
         ASSERT_EQ(vantor_pim_sync_ipc_marshal_sync_account(sent.get(), data.get()), 0);
         vantor_pim_sync_account_s* raw = nullptr;
         ASSERT_EQ(vantor_pim_sync_ipc_unmarshal_sync_account(data.get(), &raw), 0);
-        const Account got(raw);
+        const OwnedAccount got(raw);
         EXPECT_EQ(got->account_id, 7);
         EXPECT_EQ(got->reserved, -3);
         EXPECT_TRUE(got->ssl && !got->calsync && got->ctsync);
@@ -87,7 +87,7 @@ TEST(Marshal, RecordsComeBackAsTheyWent) {
 }
 
 TEST(Marshal, TheWireOrderPutsTheAddressTwelfth) {
-    Account record = account(nullptr);
+    OwnedAccount record = account(nullptr);
     record->email = strdup("me");
     const Data data = newData();
     ASSERT_EQ(vantor_pim_sync_ipc_marshal_sync_account(record.get(), data.get()), 0);
@@ -105,7 +105,7 @@ TEST(Marshal, ATruncatedRecordIsAFailedReadWhereverItEnds) {
         const Data data = dataOf({items.begin(), items.begin() + static_cast<ptrdiff_t>(count)});
         vantor_pim_sync_account_s* raw = nullptr;
         const int result = vantor_pim_sync_ipc_unmarshal_sync_account(data.get(), &raw);
-        const Account got(raw);
+        const OwnedAccount got(raw);
         EXPECT_EQ(result, -1) << count;
         EXPECT_EQ(raw, nullptr) << count;
     }

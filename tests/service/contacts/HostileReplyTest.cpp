@@ -14,7 +14,7 @@ using sync_result::kOk;
 
 namespace {
 
-CtJsonEntryConverter converter() {
+CtJsonEntryConverter hostileConverter() {
     return CtJsonEntryConverter([](const std::string&) { return 0; });
 }
 
@@ -53,7 +53,7 @@ constexpr Reader kReaders[] = {
 int readProfile(const std::string& text) {
     std::string url;
     ContactsRecord record;
-    EXPECT_EQ(converter().convert("{}", &record, 1, false), kOk);
+    EXPECT_EQ(hostileConverter().convert("{}", &record, 1, false), kOk);
     const int result = CtJsonOrbitPeopleConverter::convert(text, record.get());
     EXPECT_EQ(CtJsonOrbitPeopleConverter::getPhotoUrl(text, "http://h", &url), result);
     return result;
@@ -87,7 +87,7 @@ TEST(CtHostileReply, NoFileOfTheSuiteIsTakenForAReply) {
         EXPECT_FALSE(isObject && body.name[0] == 'n') << body.name;
         ContactsRecord record;
         try {
-            EXPECT_EQ(converter().convert(body.text, &record, 1, true), kOk);
+            EXPECT_EQ(hostileConverter().convert(body.text, &record, 1, true), kOk);
             EXPECT_TRUE(isObject) << body.name;
         } catch (const JsonException&) {
             EXPECT_FALSE(isObject) << body.name;
@@ -120,7 +120,7 @@ TEST(CtHostileReply, AnyTextComesBackAsItWent) {
             EXPECT_EQ(Json::parse(page.entries[0]->jsonText()), listed);
         }
         ContactsRecord record;
-        ASSERT_EQ(converter().convert(entry.dump(), &record, 1, false), kOk);
+        ASSERT_EQ(hostileConverter().convert(entry.dump(), &record, 1, false), kOk);
         const Json sent = readAtom("<atom:entry>" + composer.composeFields(record.get()) + "</atom:entry>");
         EXPECT_EQ(sent["gd$name"]["gd$givenName"]["$t"], "g" + carried(text));
         EXPECT_EQ(sent["gd$name"]["gd$givenName"]["yomi"], "y" + carried(text));

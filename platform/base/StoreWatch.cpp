@@ -11,7 +11,7 @@ namespace platform {
 namespace {
 
 // A single write is told soon; a writer that writes page after page is looked at twenty times a second, not at each page.
-constexpr guint kGatherMs = 20;
+constexpr guint kGatherMs = 5;
 constexpr guint kBusyGatherMs = 50;
 constexpr gint64 kBusyUs = 200'000;  // since the look before
 constexpr guint kRetryMs = 1000;

@@ -49,6 +49,7 @@ function(vps_add_test name)
         set(ARG_TSAN_SUPPRESSIONS tsan.supp)
     endif()
     # Libraries that were not built for the thread sanitizer have locks that it cannot see.
-    gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 PROPERTIES TIMEOUT ${ARG_TIMEOUT}
+    # Those that may take long begin first.
+    gtest_discover_tests(${name} DISCOVERY_TIMEOUT 60 PROPERTIES TIMEOUT ${ARG_TIMEOUT} COST ${ARG_TIMEOUT}
                          ENVIRONMENT "TSAN_OPTIONS=suppressions=${CMAKE_SOURCE_DIR}/tests/${ARG_TSAN_SUPPRESSIONS}")
 endfunction()

@@ -16,7 +16,8 @@ constexpr KindName kKindNames[] = {{FaultKind::kStatus, "status"},
                                    {FaultKind::kCut, "cut"},
                                    {FaultKind::kCorruptGzip, "corrupt-gzip"},
                                    {FaultKind::kShortGzip, "short-gzip"},
-                                   {FaultKind::kBody, "body"}};
+                                   {FaultKind::kBody, "body"},
+                                   {FaultKind::kRewrite, "rewrite"}};
 
 int wholeNumber(const Json& body, const char* name, int fallback, int low, int high) {
     const auto found = body.find(name);
@@ -48,8 +49,8 @@ bool Match::fits(const Call& call) const {
 }
 
 Fault Fault::parse(const Json& body) {
-    constexpr std::string_view kKnown[] = {"method",  "path", "count",   "kind",         "status",
-                                           "delayMs", "body", "headers", "afterHandling"};
+    constexpr std::string_view kKnown[] = {"method", "path",    "count",         "kind", "status", "delayMs",
+                                           "body",   "headers", "afterHandling", "from", "to"};
     for (const auto& [name, value] : body.items()) {
         if (std::find(std::begin(kKnown), std::end(kKnown), name) == std::end(kKnown))
             invalid(name, "unknown");
@@ -79,8 +80,21 @@ Fault Fault::parse(const Json& body) {
     if (!after.is_boolean()) invalid("afterHandling", "must be a boolean");
     // These spoil a reply, so that there has to be one.
     fault.afterHandling = after.get<bool>() || fault.kind == FaultKind::kCut ||
-                          fault.kind == FaultKind::kCorruptGzip || fault.kind == FaultKind::kShortGzip;
+                          fault.kind == FaultKind::kCorruptGzip || fault.kind == FaultKind::kShortGzip ||
+                          fault.kind == FaultKind::kRewrite;
+    for (const auto& [name, text] : {std::pair("from", &fault.from), std::pair("to", &fault.to)}) {
+        const Json value = body.value(name, Json(""));
+        if (!value.is_string()) invalid(name, "must be a string");
+        *text = value.get<std::string>();
+    }
+    if (fault.kind == FaultKind::kRewrite && fault.from.empty()) invalid("from", "missing");
     return fault;
+}
+
+void Fault::rewrite(Call& call) const {
+    if (kind != FaultKind::kRewrite) return;
+    const std::size_t at = call.body.find(from);
+    if (at != std::string::npos) call.body.replace(at, from.size(), to);
 }
 
 Json Fault::json() const {

@@ -24,7 +24,7 @@ struct Match {
     [[nodiscard]] bool fits(const Call& call) const;
 };
 
-enum class FaultKind { kStatus, kDelay, kReset, kCut, kCorruptGzip, kShortGzip, kBody };
+enum class FaultKind { kStatus, kDelay, kReset, kCut, kCorruptGzip, kShortGzip, kBody, kRewrite };
 
 struct Fault {
     Match match;
@@ -35,9 +35,13 @@ struct Fault {
     std::optional<std::string> body;
     std::map<std::string, std::string> headers;
     bool afterHandling = false;
+    std::string from;  // what kRewrite looks for in the request's body, and puts there instead
+    std::string to;
 
     static Fault parse(const Json& body);
     [[nodiscard]] Json json() const;
+    // What the request becomes before it is carried out.
+    void rewrite(Call& call) const;
 };
 
 class Faults {

@@ -225,6 +225,7 @@ void ProviderServer::answer(Call& call, Outcome& outcome) {
     const auto fault = mContext.faults.take(call);
     const bool isDelay = fault && fault->kind == FaultKind::kDelay;
     if (isDelay && !fault->afterHandling) mContext.faults.pause(fault->delay);
+    if (fault) fault->rewrite(call);
     if (!fault || isDelay || fault->afterHandling) outcome.reply = run(call, route, missing);
     if (fault) spoil(*fault, outcome);
     outcome.isGzip = wantsGzip(call) && !outcome.reply.body.empty();
@@ -281,6 +282,8 @@ void ProviderServer::spoil(const Fault& fault, Outcome& outcome) {
             break;
         case FaultKind::kBody:
             reply.body.clear();
+            break;
+        case FaultKind::kRewrite:
             break;
     }
     if (fault.body) reply.body = *fault.body;

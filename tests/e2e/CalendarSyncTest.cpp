@@ -106,6 +106,12 @@ TEST(CalendarSync, AnExpiredTokenIsRenewedAndARevokedOneIsToldOnce) {
     pair.provider.admin("POST", "/tokens/expire");
     EXPECT_EQ(pair.device.sync(1).status, 0);
 
+    // A connection that the server has dropped without a word: the renewal changes nothing, so it is sent again.
+    pair.provider.admin("POST", "/tokens/expire");
+    pair.installFault({{"path", "oauth2/token"}, {"kind", "reset"}});
+    EXPECT_EQ(pair.device.sync(1).status, 0);
+    pair.expectFaultsUsed();
+
     // A token server in trouble says nothing about the authorisation.
     for (const int status : {429, 500, 503}) {
         pair.provider.admin("POST", "/tokens/expire");

@@ -130,6 +130,7 @@ TEST_F(Contacts, AKilledDaemonSendsNothingTwice) {
     ASSERT_EQ(kill(mPair.device.daemonPid(), SIGKILL), 0);
     mPair.provider.admin("DELETE", "/faults");
     run({"daemon", "start"});
+    EXPECT_TRUE(eventually([&] { return mPair.isNoted("POST /m8/feeds/contacts"); }));
     expectSameAndQuiet();
     EXPECT_EQ(contactsNamed("Xenia").size(), 1U);
 }

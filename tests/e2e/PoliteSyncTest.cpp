@@ -17,7 +17,7 @@ struct Kind {
     const char* path;  // of the requests that write items
     std::function<int(SyncPair&, const std::string& text)> add;
     const char* noun;
-    const char* field;
+    const char* member;  // of the device's item, that holds the text
     const char* list;    // the requests that read items
     const char* update;  // the method of those that change one
     // The items' path for the admin services, and the member that holds the text.
@@ -47,12 +47,12 @@ int addContact(SyncPair& pair, const std::string& text) {
 }
 
 const Kind kKinds[] = {
-    {"calendar", "/events", addEvent, "event", "summary=", "/events\\?", "PATCH",
+    {"calendar", "/events", addEvent, "event", "summary", "/events\\?", "PATCH",
      [](SyncPair& pair) { return "/calendars/" + pathText(pair.firstCalendar(1)) + "/events"; },
      [](const std::string& text) {
          return Json({{"summary", text}});
      }},
-    {"contacts", "contacts/.*/full", addContact, "contact", "nickname=", "contacts/.*/full\\?", "PUT",
+    {"contacts", "contacts/.*/full", addContact, "contact", "nickname", "contacts/.*/full\\?", "PUT",
      [](SyncPair& pair) { return pair.peoplePath(1, "contacts"); },
      [](const std::string& text) {
          return Json({{"gContact$nickname", {{"$t", text}}}});
@@ -68,7 +68,7 @@ protected:
     int add(const std::string& text) { return GetParam().add(mPair, text); }
     void edit(int id, const std::string& text) {
         const CommandResult done =
-            mPair.device.tool({GetParam().noun, "set", std::to_string(id), GetParam().field + text});
+            mPair.device.tool({GetParam().noun, "set", std::to_string(id), GetParam().member + ("=" + text)});
         EXPECT_EQ(done.status, 0) << done.error;
     }
     // The server's ids of the items with this text.
@@ -231,6 +231,35 @@ TEST_P(Polite, OneWrongAnswerIsNeitherSuccessNorTheEndOfAnItem) {
         EXPECT_EQ(mPair.sync(1).status, 0);
         EXPECT_EQ(idsOf("edited").size(), 0U);
     }
+    mPair.expectQuiet(1);
+}
+
+// A server may keep something else than it was sent, and tells so in its answer only.
+TEST_P(Polite, WhatTheServerMakesOfAnItemComesDown) {
+    const auto textOf = [&](int id) {
+        for (const Json& item : mPair.device.json({std::string(GetParam().noun) + "s", "list"})) {
+            if (item.at("id") == id) return item.at(GetParam().member).get<std::string>();
+        }
+        return std::string();
+    };
+    const auto rewrite = [&](const char* method) {
+        mPair.installFault({{"method", method},
+                            {"path", GetParam().path},
+                            {"kind", "rewrite"},
+                            {"from", "sent"},
+                            {"to", "kept"}});
+    };
+    rewrite("POST");
+    const int id = add("sent");
+    ASSERT_TRUE(eventually([&] { return idsOf("kept").size() == 1; }));
+    EXPECT_EQ(mPair.sync(1).status, 0);
+    EXPECT_EQ(textOf(id), "kept");
+    rewrite(GetParam().update);
+    edit(id, "sent again");
+    ASSERT_TRUE(eventually([&] { return idsOf("kept again").size() == 1; }));
+    EXPECT_EQ(mPair.sync(1).status, 0);
+    EXPECT_EQ(textOf(id), "kept again");
+    mPair.expectFaultsUsed();
     mPair.expectQuiet(1);
 }
 

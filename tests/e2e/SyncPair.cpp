@@ -169,6 +169,14 @@ std::map<std::string, int> SyncPair::requestCounts() {
     return counts;
 }
 
+bool SyncPair::isNoted(const std::string& request) {
+    const Json counts = provider.admin("GET", "/requests").at("counts");
+    for (const auto& [name, count] : counts.items()) {
+        if (name.starts_with(request)) return true;
+    }
+    return false;
+}
+
 void SyncPair::expectFaultsUsed() {
     const Json left = provider.admin("GET", "/faults").at("faults");
     EXPECT_TRUE(left.empty()) << "unused: " << left.dump();

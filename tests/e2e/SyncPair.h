@@ -48,6 +48,8 @@ public:
     [[nodiscard]] std::map<std::string, int> requestCounts();
     void installFault(const Json& fault) { provider.admin("POST", "/faults", fault); }
     void expectFaultsUsed();
+    // Whether the provider has noted such a request, by method and the path's begin; it does when it has answered.
+    bool isNoted(const std::string& request);
 
     Provider provider;
     Device device;

@@ -253,6 +253,7 @@ TEST_F(TwoWay, AKilledDaemonSendsNothingTwice) {
     ASSERT_EQ(kill(mPair.device.daemonPid(), SIGKILL), 0);
     mPair.provider.admin("DELETE", "/faults");
     run({"daemon", "start"});
+    expectSoon("the late answer", [&] { return mPair.isNoted("POST /calendar"); });
     expectSameAndQuiet();
     EXPECT_EQ(eventsNamed("Meeting").size(), 1U);
 }

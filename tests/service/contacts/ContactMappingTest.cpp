@@ -229,6 +229,10 @@ TEST_F(ContactMapping, AnyTextIsWellFormedAndTheSame) {
         for (const auto& [member, value] : entry.items())
             EXPECT_EQ(back.value(member, Json()), value) << text;
     }
+    const Json bare = {{"gContact$userDefinedField", {{{"key", "size"}}}}};
+    const Json wanted = {{{"key", "size"}, {"value", ""}}};
+    EXPECT_EQ(sentFromTables(recordOf(bare).get())["gContact$userDefinedField"], wanted)
+        << "the wire wants a value";
     EXPECT_EQ(ctXmlEscape("a\x01\x1F\xEF\xBF\xBE\x08z"), "az") << "what XML cannot carry is left out";
     EXPECT_FALSE(readAtom("<atom:entry>" + ctXmlEscape("\xC3\x28 broken \xFF") + "</atom:entry>").is_null());
 }

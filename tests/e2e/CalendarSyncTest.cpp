@@ -106,7 +106,7 @@ TEST(CalendarSync, AnExpiredTokenIsRenewedAndARevokedOneIsToldOnce) {
     pair.provider.admin("POST", "/tokens/expire");
     EXPECT_EQ(pair.device.sync(1).status, 0);
 
-    // A connection that the server has dropped without a word: the renewal changes nothing, so it is sent again.
+    // A renewal changes nothing: where its connection breaks it is sent again.
     pair.provider.admin("POST", "/tokens/expire");
     pair.installFault({{"path", "oauth2/token"}, {"kind", "reset"}});
     EXPECT_EQ(pair.device.sync(1).status, 0);

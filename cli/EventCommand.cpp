@@ -126,10 +126,11 @@ void deleteEvent(int id) {
 // --- instances ------------------------------------------------------------------------------------------------------
 
 constexpr const char* kInstanceHelp =
-    "One instance of the series ID, by its recurrence id (20140503T100000Z, 20140503)";
+    "One instance of the series ID, by its original start (20140503T100000Z, 2014-05-03T10:00:00Z, 20140503)";
 
-void checkInstance(const std::string& instance) {
-    if (instance.empty() || time_text::parseCompact(instance)) return;
+std::string recurrenceIdOf(const std::string& instance) {
+    if (instance.empty() || time_text::parseCompact(instance)) return instance;
+    if (const auto time = time_text::parseRfc3339(instance)) return time_text::composeCompact(*time);
     throw Misuse("\"" + instance + "\" is no recurrence id as 20140503T100000Z or 20140503");
 }
 
@@ -200,10 +201,10 @@ Action buildEventSet(CLI::App& app) {
     app.add_option("--instance", options->instance, kInstanceHelp);
     return [options] {
         const auto assignments = record_json::readAssignments(event_json::scalars(), options->assignments);
-        checkInstance(options->instance);
+        const std::string instance = recurrenceIdOf(options->instance);
         const CalendarStore store;
-        if (!options->instance.empty()) {
-            setInstance(options->id, options->instance, assignments);
+        if (!instance.empty()) {
+            setInstance(options->id, instance, assignments);
         } else {
             item_command::write("changing " + named(options->id),
                                 [&] { return tryToSet(options->id, assignments); });
@@ -217,9 +218,9 @@ Action buildEventDelete(CLI::App& app) {
     command::addId(app, "ID", options->id, "The event")->required();
     app.add_option("--instance", options->instance, kInstanceHelp);
     return [options] {
-        checkInstance(options->instance);
+        const std::string instance = recurrenceIdOf(options->instance);
         const CalendarStore store;
-        options->instance.empty() ? deleteEvent(options->id) : cancelInstance(options->id, options->instance);
+        instance.empty() ? deleteEvent(options->id) : cancelInstance(options->id, instance);
         return kExitDone;
     };
 }

@@ -2,8 +2,8 @@
 // Owner: an upload run.   Threads: one worker.
 //
 // A mark is cleared when the server took the change, or no longer has what was to be deleted; whatever else happens it stays for the
-// next run. A contact's fields and its photo have a mark each. A new item is marked as sent before it goes out, in the store: should its answer be lost, the next run looks for it in
-// the server's list before it is sent again.
+// next run. A contact's fields and its photo have a mark each. A new item is marked as sent before it goes out, in the store: should
+// its answer be lost, the next run looks for it in the server's list before it is sent again.
 #pragma once
 
 #include <memory>

@@ -2,7 +2,6 @@
 
 #include <glib.h>
 
-#include <algorithm>
 #include <charconv>
 #include <cmath>
 #include <string>
@@ -37,9 +36,17 @@ private:
         return true;
     }
 
+    // Every page goes through here, so the lengths are counted in plain loops.
+    template <class Is>
+    size_t skip(Is is) {
+        size_t length = 0;
+        while (length < mRest.size() && is(mRest[length])) ++length;
+        mRest.remove_prefix(length);
+        return length;
+    }
+
     void skipSpace() {
-        const size_t length = mRest.find_first_not_of(" \t\n\r");
-        mRest.remove_prefix(length == std::string_view::npos ? mRest.size() : length);
+        skip([](char c) { return c == ' ' || c == '\t' || c == '\n' || c == '\r'; });
     }
 
     bool value(int depth) {
@@ -80,15 +87,22 @@ private:
         return take(close);
     }
 
+    // Beyond ASCII nothing is allowed outside of strings.
     bool string() {
         if (!take('"')) return false;
-        while (!mRest.empty()) {
-            const auto c = static_cast<unsigned char>(mRest.front());
-            mRest.remove_prefix(1);
-            if (c == '"') return true;
-            if (c < 0x20) return false;
-            if (c == '\\' && !escape()) return false;
-        }
+        constexpr unsigned char kFirstText = 0x20;
+        constexpr unsigned char kFirstBeyondAscii = 0x80;
+        const char* const begin = mRest.data();
+        unsigned char bits = 0;
+        do {
+            skip([&bits](char c) {
+                bits |= static_cast<unsigned char>(c);
+                return c != '"' && c != '\\' && static_cast<unsigned char>(c) >= kFirstText;
+            });
+            const char* const end = mRest.data();
+            if (take('"'))
+                return bits < kFirstBeyondAscii || g_utf8_validate(begin, end - begin, nullptr) != FALSE;
+        } while (take('\\') && escape());
         return false;
     }
 
@@ -130,9 +144,7 @@ private:
     }
 
     bool digits() {
-        const size_t length = std::min(mRest.find_first_not_of("0123456789"), mRest.size());
-        mRest.remove_prefix(length);
-        return length > 0;
+        return skip([](char c) { return c >= '0' && c <= '9'; }) > 0;
     }
 
     bool number() {
@@ -169,9 +181,7 @@ private:
 }  // namespace
 
 bool isValid(std::string_view text, std::vector<size_t>* lone) {
-    // A zero byte inside is no valid UTF-8 here either.
-    return g_utf8_validate(text.data(), static_cast<gssize>(text.size()), nullptr) != FALSE &&
-           Checker(text, lone).document();
+    return Checker(text, lone).document();
 }
 
 }  // namespace json_syntax

@@ -109,12 +109,13 @@ int CalCurl::updateTodo(const std::string& listId, const std::string& taskId, co
 }
 
 int CalCurl::removeTodo(const std::string& listId, const std::string& taskId, std::string* response) {
-    return checked("removeTodo", performCurl(taskPath(cal_path::kLists, listId, taskId), "DELETE", nullptr, response));
+    return checked("removeTodo",
+                   performCurl(taskPath(cal_path::kLists, listId, taskId), "DELETE", nullptr, response));
 }
 
 int CalCurl::getTodoEtagUri(const std::string& listId, const std::string& taskId, std::string* response) {
-    return checked("getTodoEtagUri",
-                   performCurl(taskPath(cal_path::kLists, listId, taskId) + kEtagFields, "GET", nullptr, response));
+    return checked("getTodoEtagUri", performCurl(taskPath(cal_path::kLists, listId, taskId) + kEtagFields,
+                                                 "GET", nullptr, response));
 }
 
 int CalCurl::get(const std::string& path, std::string* response) {

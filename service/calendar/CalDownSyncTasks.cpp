@@ -84,9 +84,10 @@ int CalDownSyncEventListTask::getListPage(const std::string& calendarId, const s
 
 int CalDownSyncEventListTask::getAllPage(const std::string& calendarId, const std::string& pageToken,
                                          CalListPage* page) {
-    return fetch(&CalCurl::get,
-                 withToken(cal_path::kCalendars + url_text::segment(calendarId) + "/events?maxResults=50", pageToken),
-                 "set string fail", &CalJsonParser::getEventAllPage, page);
+    return fetch(
+        &CalCurl::get,
+        withToken(cal_path::kCalendars + url_text::segment(calendarId) + "/events?maxResults=50", pageToken),
+        "set string fail", &CalJsonParser::getEventAllPage, page);
 }
 
 int CalDownSyncTodoBookListTask::getList(const std::string& pageToken, CalListPage* page) {
@@ -103,7 +104,8 @@ int CalDownSyncTodoListTask::getListPage(const std::string& listId, const std::s
 }
 
 int CalDownSyncTodoTask::get(const std::string& listId, const std::string& taskId, JsonNodePtr* task) {
-    const std::string path = cal_path::kLists + url_text::segment(listId) + "/tasks/" + url_text::segment(taskId);
+    const std::string path =
+        cal_path::kLists + url_text::segment(listId) + "/tasks/" + url_text::segment(taskId);
     if (const int result = request(&CalCurl::getTodo, path, "setString fail"); result != kOk) return result;
     *task = mParser.takeRoot();
     return kOk;

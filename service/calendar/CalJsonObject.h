@@ -29,6 +29,5 @@ public:
     [[nodiscard]] JsonObject* object() const { return json_node_get_object(mpNode.get()); }
 
 private:
-
     JsonNodePtr mpNode;
 };

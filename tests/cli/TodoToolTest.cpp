@@ -87,7 +87,9 @@ TEST(EventTool, OneInstanceOfASeriesIsChangedAndCancelled) {
     ToolRoot tool;
     const std::string series = std::to_string(tool.addEvent(ToolRoot::addCalendar(7, "Work"), kTodoSeries));
     ASSERT_EQ(tool.run({"event", "set", series, "--instance", "20140503T100000Z", "summary=Late"}).status, 0);
-    ASSERT_EQ(tool.run({"event", "set", series, "--instance", "2014-05-03T12:00:00+02:00", "busy=false"}).status, 0);
+    ASSERT_EQ(
+        tool.run({"event", "set", series, "--instance", "2014-05-03T12:00:00+02:00", "busy=false"}).status,
+        0);
     Json events = tool.json({"events", "list", "--json"});
     ASSERT_EQ(events.size(), 2U) << "one exception, however often it is changed";
     EXPECT_EQ(events[1]["summary"], "Late");

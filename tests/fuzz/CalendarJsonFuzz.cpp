@@ -22,7 +22,8 @@ void checkRoundTrip(JsonObject* item, const CalItemKind& kind) {
     require(read != nullptr, "a body is JSON", sent);
     CalendarRecord again;
     require(kind.convert(jsonObjectOf(read), &again) == kOk, "a body can be read", sent);
-    require(kind.build(again.get()) == sent, "a body is read to the same", sent + "\n" + kind.build(again.get()));
+    require(kind.build(again.get()) == sent, "a body is read to the same",
+            sent + "\n" + kind.build(again.get()));
 }
 
 void checkItem(const CalListInfo& info) {

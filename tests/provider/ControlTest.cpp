@@ -115,8 +115,9 @@ TEST_F(Control, FaultsSpoilRepliesInEveryWay) {
     EXPECT_GE(std::chrono::steady_clock::now() - begin, std::chrono::milliseconds(60));
     fault(R"({"kind":"rewrite","from":"lunch","to":"dinner"})");
     EXPECT_EQ(insert({{"summary", "lunch"}}).at("summary"), "dinner");
-    for (const char* bad : {R"({"kind":"boom"})", R"({"kind":"rewrite"})", R"({"count":0})", R"({"path":"("})", R"({"status":"500"})",
-                            R"({"typo":1})", R"({"delayMs":-1})", R"({"headers":[]})", R"({"method":1})"}) {
+    for (const char* bad : {R"({"kind":"boom"})", R"({"kind":"rewrite"})", R"({"count":0})",
+                            R"({"path":"("})", R"({"status":"500"})", R"({"typo":1})", R"({"delayMs":-1})",
+                            R"({"headers":[]})", R"({"method":1})"}) {
         EXPECT_EQ(send("POST", "/admin/faults", bad).status, 400) << bad;
     }
 }

@@ -24,7 +24,8 @@ Data newData() {
 }
 
 OwnedAccount account(const char* text) {
-    OwnedAccount record(static_cast<vantor_pim_sync_account_s*>(calloc(1, sizeof(vantor_pim_sync_account_s))));
+    OwnedAccount record(
+        static_cast<vantor_pim_sync_account_s*>(calloc(1, sizeof(vantor_pim_sync_account_s))));
     *record = {.account_id = 7,
                .access_token = nullptr,
                .refresh_token = nullptr,

@@ -29,8 +29,8 @@ struct CalItemKind {
     // The server's JSON as a new record, and a record as the body of a request; 0 or -1.
     int (*convert)(JsonObject* json, CalendarRecord* out);
     int (*compose)(calendar_record_h record, CalJsonObject* body);
-    int (*composeComparable)(calendar_record_h record,
-                             CalJsonObject* body);  // without what servers fill in on their own
+    // Without what servers fill in on their own.
+    int (*composeComparable)(calendar_record_h record, CalJsonObject* body);
 
     // What is not sent, or what the server fills in; read from its answer to an upload. False when a value cannot be set.
     std::span<const unsigned> serverFields;

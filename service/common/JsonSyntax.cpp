@@ -87,21 +87,12 @@ private:
         return take(close);
     }
 
-    // Beyond ASCII nothing is allowed outside of strings.
     bool string() {
         if (!take('"')) return false;
         constexpr unsigned char kFirstText = 0x20;
-        constexpr unsigned char kFirstBeyondAscii = 0x80;
-        const char* const begin = mRest.data();
-        unsigned char bits = 0;
         do {
-            skip([&bits](char c) {
-                bits |= static_cast<unsigned char>(c);
-                return c != '"' && c != '\\' && static_cast<unsigned char>(c) >= kFirstText;
-            });
-            const char* const end = mRest.data();
-            if (take('"'))
-                return bits < kFirstBeyondAscii || g_utf8_validate(begin, end - begin, nullptr) != FALSE;
+            skip([](char c) { return c != '"' && c != '\\' && static_cast<unsigned char>(c) >= kFirstText; });
+            if (take('"')) return true;
         } while (take('\\') && escape());
         return false;
     }
